@@ -1,0 +1,11 @@
+// How hard a flush request presses the flushable memory clients.
+#pragma once
+
+namespace ZYRPublic {
+
+enum eFlushMemorySeverity : int {
+    eFlushMemorySeverityNormal = 0, // only clients that can give back the amount are asked
+    eFlushMemorySeverityUrgent = 1, // every client is asked, whatever it holds
+};
+
+} // namespace ZYRPublic

@@ -1,0 +1,44 @@
+// Class-level allocation of library objects through the front.
+#include "zyr/std/CZYRClientBase.h"
+
+#include <algorithm>
+#include <new>
+
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/ZYRMem.h"
+
+namespace ZYRStd {
+
+namespace {
+void* allocateClient(std::size_t size) {
+    const auto n = static_cast<unsigned int>(std::max<std::size_t>(size, 1));
+    for (;;) {
+        if (void* block = ZYRMalloc(n))
+            return block;
+        const std::new_handler handler = std::get_new_handler();
+        if (!handler)
+            throw ZYROutOfMemoryError("source/zyr/std/CZYRClientBase", 92);
+        handler();
+    }
+}
+} // namespace
+
+CZYRClientBase::~CZYRClientBase() = default;
+
+void* CZYRClientBase::operator new(std::size_t size) {
+    return allocateClient(size);
+}
+
+void* CZYRClientBase::operator new[](std::size_t size) {
+    return allocateClient(size);
+}
+
+void CZYRClientBase::operator delete(void* p) noexcept {
+    ZYRFree(p);
+}
+
+void CZYRClientBase::operator delete[](void* p) noexcept {
+    ZYRFree(p);
+}
+
+} // namespace ZYRStd

@@ -1,0 +1,34 @@
+// Client identifiers and notification bookkeeping.
+#include "zyr/std/CZYRClientRegistry.h"
+
+#include <algorithm>
+#include <atomic>
+
+#include "zyr/std/CZYRError.h"
+
+namespace ZYRStd {
+
+namespace {
+constinit std::atomic<unsigned int> lastClientID{0};
+}
+
+CZYRClientRegistry::~CZYRClientRegistry() = default;
+
+bool CZYRClientRegistry::notificationReceived(unsigned int id) const {
+    const auto found = clients_.find(id);
+    if (found == clients_.end())
+        throw CZYRError(ZYRPublic::kZYRErrorBadParam, "CZYRClientRegistry:: Unknown clientID",
+                        "source/zyr/std/CZYRClientRegistry", 61);
+    return found->second;
+}
+
+bool CZYRClientRegistry::allNotificationsReceived() const {
+    return std::all_of(clients_.begin(), clients_.end(),
+                       [](const Entry& entry) { return entry.second; });
+}
+
+unsigned int CZYRClientRegistrar::makeID(const void*) {
+    return lastClientID.fetch_add(1, std::memory_order_relaxed) + 1;
+}
+
+} // namespace ZYRStd

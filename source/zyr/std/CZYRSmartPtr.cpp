@@ -1,0 +1,53 @@
+// Reference counting on bare words and storage for smart-pointer containers.
+#include "zyr/std/CZYRSmartPtr.h"
+
+#include <atomic>
+
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/ZYRMem.h"
+
+namespace ZYRStd {
+
+namespace {
+std::atomic_ref<unsigned int> countOf(unsigned int* count) {
+    return std::atomic_ref<unsigned int>(*count);
+}
+std::atomic_ref<unsigned int> countOf(const unsigned int* count) {
+    // atomic_ref needs a non-const referent even for loads.
+    return std::atomic_ref<unsigned int>(*const_cast<unsigned int*>(count));
+}
+} // namespace
+
+void ZYRIncrementRefCnt_ThreadSafe(unsigned int* count) {
+    countOf(count).fetch_add(1, std::memory_order_relaxed);
+}
+
+unsigned int ZYRDecrementRefCnt_ThreadSafe(unsigned int* count) {
+    return countOf(count).fetch_sub(1, std::memory_order_acq_rel) - 1;
+}
+
+bool ZYRIsShared_ThreadSafe(const unsigned int* count) {
+    return countOf(count).load(std::memory_order_acquire) > 1;
+}
+
+unsigned int ZYRPeekValue_ThreadSafe(const unsigned int* count) {
+    return countOf(count).load(std::memory_order_acquire);
+}
+
+void* czyrsmartptralloc(unsigned int size) {
+    void* p = ZYRMalloc(size == 0 ? 1 : size);
+    if (!p)
+        throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "allocating smart ptr container",
+                        "source/zyr/std/CZYRSmartPtr", 242);
+    return p;
+}
+
+void czyrsmartptrfree(void* p) {
+    if (p)
+        ZYRFree(p);
+}
+
+CZYRBaseRefCnt::~CZYRBaseRefCnt() = default;
+CZYRPublicRefCountBase::~CZYRPublicRefCountBase() = default;
+
+} // namespace ZYRStd

@@ -1,0 +1,208 @@
+// Reference counting: the internal count base, the public count member, and their pointers.
+#pragma once
+
+#include <atomic>
+#include <utility>
+
+#include "C_SmartPtr.h"
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRClientBase.h"
+
+namespace ZYRStd {
+
+// Counts on a bare word, atomic so they never tear (the word must be 4-byte aligned).
+ZYRSTD_API void ZYRIncrementRefCnt_ThreadSafe(unsigned int* count);
+ZYRSTD_API unsigned int ZYRDecrementRefCnt_ThreadSafe(unsigned int* count);
+ZYRSTD_API bool ZYRIsShared_ThreadSafe(const unsigned int* count);
+ZYRSTD_API unsigned int ZYRPeekValue_ThreadSafe(const unsigned int* count);
+
+// Storage for smart-pointer containers, from the front; throws on failure.
+ZYRSTD_API void* czyrsmartptralloc(unsigned int size);
+ZYRSTD_API void czyrsmartptrfree(void* p);
+
+// Base of internally shared objects; created with one reference held by its creator.
+class ZYRSTD_API CZYRBaseRefCnt {
+public:
+    CZYRBaseRefCnt() noexcept = default;
+    // Copies carry the count word over unchanged, as a memberwise copy would.
+    CZYRBaseRefCnt(const CZYRBaseRefCnt& other) noexcept
+        : count_(other.count_.load(std::memory_order_relaxed)) {}
+    CZYRBaseRefCnt& operator=(const CZYRBaseRefCnt& other) noexcept {
+        count_.store(other.count_.load(std::memory_order_relaxed), std::memory_order_relaxed);
+        return *this;
+    }
+    virtual ~CZYRBaseRefCnt();
+
+    // A new reference is taken from one already held, so no ordering is needed.
+    void addRef() const noexcept { count_.fetch_add(1, std::memory_order_relaxed); }
+    void release() const noexcept {
+        if (decrementRefCnt() == 0)
+            delete this;
+    }
+    bool isShared() const noexcept { return count_.load(std::memory_order_acquire) > 1; }
+    int peekRefCnt() const noexcept {
+        return static_cast<int>(count_.load(std::memory_order_acquire));
+    }
+
+private:
+    // Release publishes this owner's writes; acquire on the last one makes them visible
+    // to the destructor.
+    unsigned int decrementRefCnt() const noexcept {
+        return count_.fetch_sub(1, std::memory_order_acq_rel) - 1;
+    }
+
+    mutable std::atomic<unsigned int> count_{1};
+};
+
+// The count member behind every library implementation of a public interface.
+class ZYRSTD_API CZYRPublicRefCountBase : public CZYRClientBase {
+public:
+    CZYRPublicRefCountBase() noexcept = default;
+    CZYRPublicRefCountBase(const CZYRPublicRefCountBase& other) noexcept
+        : CZYRClientBase(), count_(other.count_.load(std::memory_order_relaxed)) {}
+    CZYRPublicRefCountBase& operator=(const CZYRPublicRefCountBase& other) noexcept {
+        count_.store(other.count_.load(std::memory_order_relaxed), std::memory_order_relaxed);
+        return *this;
+    }
+    ~CZYRPublicRefCountBase() override;
+
+    void addRef() const noexcept { count_.fetch_add(1, std::memory_order_relaxed); }
+    // True exactly for the call that took the count from 1 to 0; the owner deletes.
+    bool release() const noexcept { return count_.fetch_sub(1, std::memory_order_acq_rel) == 1; }
+    // A count of 0 also answers true.
+    bool isShared() const noexcept { return count_.load(std::memory_order_acquire) != 1; }
+    unsigned int debugGetRefCount() const noexcept {
+        return count_.load(std::memory_order_acquire);
+    }
+    const unsigned int* debugGetRefCountAddr() const noexcept {
+        static_assert(sizeof(std::atomic<unsigned int>) == sizeof(unsigned int));
+        return reinterpret_cast<const unsigned int*>(&count_);
+    }
+
+private:
+    mutable std::atomic<unsigned int> count_{1};
+};
+
+// Shared pointer over CZYRBaseRefCnt objects.
+template <class T> class CZYRSmartZYRRefPtr {
+public:
+    CZYRSmartZYRRefPtr() noexcept = default;
+    // Adopts the creator's reference unless `addRef` asks for a new one.
+    explicit CZYRSmartZYRRefPtr(T* p, bool addRef = false) noexcept : p_(p) {
+        if (p_ && addRef)
+            p_->addRef();
+    }
+    CZYRSmartZYRRefPtr(const CZYRSmartZYRRefPtr& other) noexcept : p_(other.p_) {
+        if (p_)
+            p_->addRef();
+    }
+    CZYRSmartZYRRefPtr(CZYRSmartZYRRefPtr&& other) noexcept
+        : p_(std::exchange(other.p_, nullptr)) {}
+    template <class U>
+    CZYRSmartZYRRefPtr(const CZYRSmartZYRRefPtr<U>& other) noexcept : p_(other.get()) {
+        if (p_)
+            p_->addRef();
+    }
+    CZYRSmartZYRRefPtr& operator=(const CZYRSmartZYRRefPtr& other) noexcept {
+        assign(other.p_);
+        return *this;
+    }
+    CZYRSmartZYRRefPtr& operator=(CZYRSmartZYRRefPtr&& other) noexcept {
+        if (this != &other) {
+            T* old = std::exchange(p_, std::exchange(other.p_, nullptr));
+            if (old)
+                old->release();
+        }
+        return *this;
+    }
+    ~CZYRSmartZYRRefPtr() { reset(); }
+
+    void reset() noexcept {
+        if (T* old = std::exchange(p_, nullptr))
+            old->release();
+    }
+    T* get() const noexcept { return p_; }
+    T* operator->() const noexcept { return p_; }
+    T& operator*() const noexcept { return *p_; }
+    explicit operator bool() const noexcept { return p_ != nullptr; }
+    // Gives up the reference without releasing it.
+    T* detach() noexcept { return std::exchange(p_, nullptr); }
+
+private:
+    // The new object gains its reference before the old one may be deleted.
+    void assign(T* p) noexcept {
+        if (p == p_)
+            return;
+        if (p)
+            p->addRef();
+        T* old = std::exchange(p_, p);
+        if (old)
+            old->release();
+    }
+
+    T* p_ = nullptr;
+};
+
+// Sole owner; deletes its object through the object's virtual destructor.
+template <class T> class CZYRSmartPtr {
+public:
+    CZYRSmartPtr() noexcept = default;
+    explicit CZYRSmartPtr(T* p) noexcept : p_(p) {}
+    CZYRSmartPtr(const CZYRSmartPtr&) = delete;
+    CZYRSmartPtr& operator=(const CZYRSmartPtr&) = delete;
+    virtual ~CZYRSmartPtr() { delete p_; }
+
+    void reset(T* p = nullptr) noexcept {
+        if (p != p_)
+            delete std::exchange(p_, p);
+    }
+    T* get() const noexcept { return p_; }
+    T* operator->() const noexcept { return p_; }
+    T& operator*() const noexcept { return *p_; }
+    explicit operator bool() const noexcept { return p_ != nullptr; }
+
+private:
+    T* p_ = nullptr;
+};
+
+// Marks classes that are never copied.
+class CZYRPolicyNoCopy {
+public:
+    CZYRPolicyNoCopy() = default;
+    CZYRPolicyNoCopy(const CZYRPolicyNoCopy&) = delete;
+    CZYRPolicyNoCopy& operator=(const CZYRPolicyNoCopy&) = delete;
+};
+
+// Lends a count to an object that has none; the box's storage comes from the front.
+template <class T> class CZYRSmartRefPtrContainer : public CZYRBaseRefCnt {
+public:
+    using Deleter = void (*)(T*);
+
+    static CZYRSmartRefPtrContainer* create(T* object, Deleter deleter = nullptr) {
+        void* where = czyrsmartptralloc(sizeof(CZYRSmartRefPtrContainer));
+        return ::new (where) CZYRSmartRefPtrContainer(object, deleter);
+    }
+
+    T* getObject() const noexcept { return object_; }
+
+    ~CZYRSmartRefPtrContainer() override {
+        if (object_) {
+            if (deleter_)
+                deleter_(object_);
+            else
+                delete object_;
+        }
+    }
+
+    // The storage came from czyrsmartptralloc, so it goes back there.
+    static void operator delete(void* p) noexcept { czyrsmartptrfree(p); }
+
+private:
+    CZYRSmartRefPtrContainer(T* object, Deleter deleter) noexcept
+        : object_(object), deleter_(deleter) {}
+
+    T* object_;
+    Deleter deleter_;
+};
+
+} // namespace ZYRStd

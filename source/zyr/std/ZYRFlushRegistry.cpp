@@ -1,0 +1,18 @@
+// The process-wide registry of flushable memory clients.
+#include "zyr/std/ZYRFlushRegistry.h"
+
+#include "zyr/std/ZYRNoDestructor.h"
+
+namespace ZYRStd {
+
+I_FlushableMemoryClient::~I_FlushableMemoryClient() = default;
+
+namespace detail {
+
+FlushRegistry& flushRegistry() {
+    static NoDestructor<FlushRegistry> instance;
+    return *instance;
+}
+
+} // namespace detail
+} // namespace ZYRStd

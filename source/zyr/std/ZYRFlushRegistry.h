@@ -1,0 +1,20 @@
+// The registry of flushable memory clients; not exported.
+#pragma once
+
+#include <mutex>
+#include <vector>
+
+#include "zyr/std/I_FlushableMemoryClient.h"
+
+namespace ZYRStd::detail {
+
+struct FlushRegistry {
+    // Held for a whole flush, calls into the clients included.
+    std::recursive_mutex mutex;
+    std::vector<I_FlushableMemoryClient*> main;       // every client, in registration order
+    std::vector<I_FlushableMemoryClient*> threadSafe; // clients callable from any thread
+};
+
+FlushRegistry& flushRegistry();
+
+} // namespace ZYRStd::detail

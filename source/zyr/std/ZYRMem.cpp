@@ -1,0 +1,611 @@
+// The allocation front: plain and guarded variants, the memory limit, the tracker and
+// the leak report.
+#include "zyr/std/ZYRMem.h"
+
+#include <algorithm>
+#include <atomic>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <ctime>
+#include <fstream>
+#include <map>
+#include <mutex>
+#include <string>
+
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/IStackWalker.h"
+#include "zyr/std/ZYRMemInternal.h"
+#include "zyr/std/ZYRNoDestructor.h"
+#include "zyr/std/ZYRThread.h"
+
+namespace ZYRStd {
+
+namespace {
+
+constexpr const char* kSource = "source/zyr/std/ZYRMem";
+constexpr uint32_t kGuardWord = 0xDEADBEEF;
+// Plain blocks carry the requested size in a 16-byte header so that any host allocator
+// works (there is no portable usable-size query) and the user pointer stays 16-aligned.
+constexpr size_t kPlainHeader = 16;
+// Guarded blocks: size, stack identifier, padding, head guard, user bytes, tail guard.
+constexpr size_t kGuardHeader = 16;
+constexpr size_t kGuardOverhead = kGuardHeader + sizeof(uint32_t);
+
+struct GuardHeader {
+    uint32_t size;
+    uint32_t stackId;
+    uint32_t padding;
+    uint32_t headGuard;
+};
+static_assert(sizeof(GuardHeader) == kGuardHeader);
+
+constexpr uint64_t round8(uint64_t n) {
+    return (n + 7) & ~uint64_t{7};
+}
+constexpr uint64_t guardedAccounted(uint32_t requested) {
+    return round8(uint64_t{requested} + kGuardOverhead);
+}
+
+void* crtAlloc(size_t size, void*) {
+    return std::malloc(size);
+}
+void* crtRealloc(void* block, size_t size, void*) {
+    return std::realloc(block, size);
+}
+void crtFree(void* block, void*) {
+    std::free(block);
+}
+
+constinit tZYRMemMgr host{crtAlloc, crtRealloc, crtFree, nullptr};
+constinit int statLevel = 0;
+
+constinit std::atomic<uint64_t> memLimitBytes{0};
+constinit std::atomic<uint64_t> memReserveBytes{detail::kDefaultMemReserve};
+constinit std::atomic<uint64_t> totalUsage{0};
+constinit std::atomic<int> usageCheckCounter{1};
+constinit std::atomic<bool> testAvailablePhysical{true};
+
+bool usageCheckOn() {
+    return usageCheckCounter.load(std::memory_order_relaxed) >= 1;
+}
+
+struct Tracker {
+    std::recursive_mutex mutex; // guards every field below
+    unsigned int allocCount = 0;
+    unsigned int reallocCount = 0;
+    unsigned int freeCount = 0;
+    unsigned int currentBytes = 0;
+    unsigned int peakBytes = 0;
+    std::map<void*, unsigned int> allocations;   // block -> allocation serial
+    std::map<void*, unsigned int> virtualBlocks; // base -> stack identifier
+    CZYRSmartPtr<IStackWalker> walker{IImpStackWalkerStub::create()};
+    unsigned int breakAtSerial = ~0u;
+
+    void reset() {
+        allocCount = reallocCount = freeCount = currentBytes = peakBytes = 0;
+        allocations.clear();
+        virtualBlocks.clear();
+        breakAtSerial = ~0u;
+    }
+};
+
+Tracker& tracker() {
+    static detail::NoDestructor<Tracker> instance;
+    return *instance;
+}
+
+bool debuggerAttached() {
+    std::ifstream status("/proc/self/status");
+    std::string line;
+    while (std::getline(status, line))
+        if (line.rfind("TracerPid:", 0) == 0)
+            return std::atoi(line.c_str() + 10) != 0;
+    return false;
+}
+
+// Caller holds the tracker mutex.
+void recordAllocLocked(Tracker& t, void* block, uint64_t bytes) {
+    t.currentBytes += static_cast<unsigned int>(bytes);
+    t.allocCount += 1;
+    t.peakBytes = std::max(t.peakBytes, t.currentBytes);
+    if (t.allocCount == t.breakAtSerial && debuggerAttached())
+        std::raise(SIGTRAP);
+    if (statLevel >= 2 && block)
+        t.allocations[block] = t.allocCount;
+}
+
+bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) {
+    const uint64_t limit = memLimitBytes.load(std::memory_order_relaxed);
+    if (limit >= detail::kGuardedLimitCeiling)
+        return true;
+    return !(uint64_t{t.currentBytes} + add - sub > limit && usageCheckOn());
+}
+
+// ---- plain variants -------------------------------------------------------------------
+
+uint32_t& plainSize(void* block) {
+    return *static_cast<uint32_t*>(block);
+}
+void* plainBlock(void* p) {
+    return static_cast<unsigned char*>(p) - kPlainHeader;
+}
+void* plainUser(void* block) {
+    return static_cast<unsigned char*>(block) + kPlainHeader;
+}
+
+void* plainAlloc(unsigned int size) {
+    if (size == 0)
+        return nullptr;
+    void* block = host.allocProc(size + kPlainHeader, host.clientData);
+    if (!block)
+        return nullptr;
+    if (!detail::plainLimitTest(round8(size), 0, true)) {
+        host.freeProc(block, host.clientData);
+        detail::sendOutOfMemoryNotice();
+        return nullptr;
+    }
+    plainSize(block) = size;
+    return plainUser(block);
+}
+
+void plainFree(void* p) {
+    void* block = plainBlock(p);
+    const uint64_t accounted = round8(plainSize(block));
+    host.freeProc(block, host.clientData);
+    totalUsage.fetch_sub(accounted, std::memory_order_relaxed);
+}
+
+void* plainRealloc(void* p, unsigned int size) {
+    void* block = plainBlock(p);
+    const uint64_t oldAccounted = round8(plainSize(block));
+    const uint64_t newAccounted = round8(size);
+    if (!detail::plainLimitTest(newAccounted, oldAccounted, false)) {
+        detail::sendOutOfMemoryNotice();
+        return nullptr;
+    }
+    void* grown = host.reallocProc(block, size + kPlainHeader, host.clientData);
+    if (!grown)
+        return nullptr;
+    plainSize(grown) = size;
+    if (newAccounted >= oldAccounted)
+        totalUsage.fetch_add(newAccounted - oldAccounted, std::memory_order_relaxed);
+    else
+        totalUsage.fetch_sub(oldAccounted - newAccounted, std::memory_order_relaxed);
+    return plainUser(grown);
+}
+
+// ---- guarded variants -----------------------------------------------------------------
+
+GuardHeader* guardHeader(void* p) {
+    return reinterpret_cast<GuardHeader*>(static_cast<unsigned char*>(p) - kGuardHeader);
+}
+
+void writeGuards(unsigned char* block, uint32_t size) {
+    auto* header = reinterpret_cast<GuardHeader*>(block);
+    header->size = size;
+    header->padding = 0;
+    header->headGuard = kGuardWord;
+    std::memcpy(block + kGuardHeader + size, &kGuardWord, sizeof kGuardWord);
+}
+
+void* guardedAlloc(unsigned int size) {
+    const uint32_t n = std::max(size, 1u);
+    auto* block = static_cast<unsigned char*>(host.allocProc(n + kGuardOverhead, host.clientData));
+    if (!block)
+        return nullptr;
+    const uint64_t accounted = guardedAccounted(n);
+    Tracker& t = tracker();
+    {
+        std::lock_guard lock(t.mutex);
+        if (trackerLimitTestLocked(t, accounted, 0)) {
+            recordAllocLocked(t, block, accounted);
+            writeGuards(block, n);
+            reinterpret_cast<GuardHeader*>(block)->stackId = t.walker->capture(10, 2, 32, n);
+            return block + kGuardHeader;
+        }
+    }
+    host.freeProc(block, host.clientData);
+    detail::sendOutOfMemoryNotice();
+    return nullptr;
+}
+
+void guardedFree(void* p) {
+    GuardHeader* header = guardHeader(p);
+    Tracker& t = tracker();
+    {
+        std::lock_guard lock(t.mutex);
+        t.freeCount += 1;
+        t.currentBytes -= static_cast<unsigned int>(guardedAccounted(header->size));
+        if (statLevel >= 2)
+            t.allocations.erase(header);
+        if (header->stackId != 0) {
+            t.walker->release(header->stackId, header->size);
+            header->stackId = 0;
+        }
+    }
+    host.freeProc(header, host.clientData);
+}
+
+void* guardedRealloc(void* p, unsigned int size) {
+    GuardHeader* header = guardHeader(p);
+    const uint32_t oldSize = header->size;
+    const uint64_t oldAccounted = guardedAccounted(oldSize);
+    const uint64_t newAccounted = guardedAccounted(size);
+    Tracker& t = tracker();
+    bool withinLimit;
+    {
+        std::lock_guard lock(t.mutex);
+        withinLimit = trackerLimitTestLocked(t, newAccounted, oldAccounted);
+    }
+    if (!withinLimit) {
+        detail::sendOutOfMemoryNotice();
+        return nullptr;
+    }
+    auto* grown = static_cast<unsigned char*>(
+        host.reallocProc(header, size + kGuardOverhead, host.clientData));
+    if (!grown)
+        return nullptr;
+    {
+        std::lock_guard lock(t.mutex);
+        t.reallocCount += 1;
+        t.currentBytes += static_cast<unsigned int>(newAccounted - oldAccounted);
+        t.peakBytes = std::max(t.peakBytes, t.currentBytes);
+        if (statLevel >= 2) {
+            if (auto node = t.allocations.extract(header)) {
+                node.key() = grown;
+                t.allocations.insert(std::move(node));
+            }
+        }
+        auto* grownHeader = reinterpret_cast<GuardHeader*>(grown);
+        if (grownHeader->stackId != 0)
+            t.walker->resize(grownHeader->stackId, oldSize, size);
+    }
+    writeGuards(grown, size);
+    return grown + kGuardHeader;
+}
+
+// ---- the table the front calls through ------------------------------------------------
+
+struct FrontTable {
+    void* (*allocate)(unsigned int);
+    void (*free)(void*);
+    void* (*reallocate)(void*, unsigned int);
+};
+
+constexpr FrontTable kPlainFront{plainAlloc, plainFree, plainRealloc};
+constexpr FrontTable kGuardedFront{guardedAlloc, guardedFree, guardedRealloc};
+// Filled with the plain variants at load so that a call before start-up is still sound.
+constinit FrontTable front = kPlainFront;
+
+void* sureResult(void* p, int line) {
+    if (!p)
+        throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, nullptr, kSource, line);
+    return p;
+}
+
+thread_local bool sendingNotice = false;
+
+} // namespace
+
+// ---- front ------------------------------------------------------------------------------
+
+void* ZYRMalloc(unsigned int size) {
+    return front.allocate(size);
+}
+
+void* ZYRCalloc(unsigned int count, unsigned int size) {
+    const unsigned int bytes = count * size; // 32-bit product, as callers were promised
+    void* p = front.allocate(bytes);
+    if (p)
+        std::memset(p, 0, bytes);
+    return p;
+}
+
+void* ZYRRealloc(void* p, unsigned int size) {
+    if (size == 0)
+        return p;
+    if (!p)
+        return front.allocate(size);
+    return front.reallocate(p, size);
+}
+
+void ZYRFree(void* p) {
+    if (p)
+        front.free(p);
+}
+
+unsigned int ZYRMemSize(void* p) {
+    if (!p)
+        return 0;
+    return statLevel != 0 ? guardHeader(p)->size : plainSize(plainBlock(p));
+}
+
+void* ZYRSureMalloc(unsigned int size) {
+    return sureResult(ZYRMalloc(size), 2042);
+}
+void* ZYRSureCalloc(unsigned int count, unsigned int size) {
+    return sureResult(ZYRCalloc(count, size), 2050);
+}
+void* ZYRSureRealloc(void* p, unsigned int size) {
+    return sureResult(ZYRRealloc(p, size), 2058);
+}
+
+void ZYRDbgCheckZYRMemAllocPtr(void* p) {
+    if (!p)
+        return;
+    const GuardHeader* header = guardHeader(p);
+    uint32_t tail;
+    std::memcpy(&tail, static_cast<unsigned char*>(p) + header->size, sizeof tail);
+    if (header->headGuard != kGuardWord || tail != kGuardWord)
+        throw CZYRError(ZYRPublic::kZYRErrorFatal, "ZYRCheckZYRMemAllocPtr:: ptr is invalid",
+                        kSource, 2012);
+}
+
+sZYRDbgMemState ZYRMemMgr_dbgMemState() {
+    if (statLevel < 1)
+        return {};
+    const Tracker& t = tracker();
+    return {t.allocCount, t.reallocCount, t.freeCount, t.currentBytes, t.peakBytes};
+}
+
+void EnableMemUsageCheck() {
+    int current = usageCheckCounter.load(std::memory_order_relaxed);
+    while (current < 1 && !usageCheckCounter.compare_exchange_weak(current, current + 1,
+                                                                   std::memory_order_relaxed)) {
+    }
+}
+
+void DisableMemUsageCheck() {
+    usageCheckCounter.fetch_sub(1, std::memory_order_relaxed);
+}
+
+unsigned long long GetMemUsage() {
+    if (statLevel != 0)
+        return detail::trackerCurrentBytes();
+    return totalUsage.load(std::memory_order_relaxed);
+}
+
+void* Memcpy(void* dst, const void* src, unsigned int n) {
+    return std::memcpy(dst, src, n);
+}
+void* Memmove(void* dst, const void* src, unsigned int n) {
+    return std::memmove(dst, src, n);
+}
+void* Memset(void* dst, int value, unsigned int n) {
+    return std::memset(dst, value, n);
+}
+int Memcmp(const void* a, const void* b, unsigned int n) {
+    const int order = std::memcmp(a, b, n);
+    return (order > 0) - (order < 0);
+}
+
+void ZYRSetMemLimit(unsigned long long limit) {
+    if (limit >= memLimitBytes.load())
+        return;
+    if (limit < detail::kMinimumMemLimit) {
+        memLimitBytes.store(detail::kMinimumMemLimit);
+        memReserveBytes.store(detail::kDefaultMemReserve);
+        return;
+    }
+    memLimitBytes.store(limit);
+    if (memReserveBytes.load() > limit)
+        memReserveBytes.store(limit);
+}
+
+unsigned long long ZYRGetMemLimit() {
+    return memLimitBytes.load();
+}
+unsigned long long ZYRGetMemReserve() {
+    return memReserveBytes.load();
+}
+void ZYRSetTestAvailablePhysicalMemory(bool test) {
+    testAvailablePhysical.store(test);
+}
+bool ZYRGetTestAvailablePhysicalMemory() {
+    return testAvailablePhysical.load();
+}
+
+void ZYRSetBreakOnAllocationCount(unsigned int serial) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    t.breakAtSerial = serial;
+}
+
+int ZYRGetMemStatLevel() {
+    return statLevel;
+}
+
+// ---- accounting shared with start-up and virtual memory ----------------------------------
+
+namespace detail {
+
+void configureFront(int level, const tZYRMemMgr& hostRecord) {
+    Tracker& t = tracker();
+    {
+        std::lock_guard lock(t.mutex);
+        t.reset();
+        if (level > 2)
+            t.walker.reset(IImpStackWalkerStub::create());
+    }
+    statLevel = level;
+    host = hostRecord;
+    front = level != 0 ? kGuardedFront : kPlainFront;
+}
+
+void setMemLimitRaw(uint64_t limit) {
+    memLimitBytes.store(limit);
+}
+void setMemReserveRaw(uint64_t reserve) {
+    memReserveBytes.store(reserve);
+}
+int memStatLevel() {
+    return statLevel;
+}
+uint64_t memLimit() {
+    return memLimitBytes.load();
+}
+uint64_t memReserve() {
+    return memReserveBytes.load();
+}
+
+bool plainLimitTest(uint64_t add, uint64_t sub, bool move) {
+    // One compare-exchange makes the test and the move indivisible without a lock.
+    uint64_t current = totalUsage.load(std::memory_order_relaxed);
+    for (;;) {
+        const uint64_t next = current + add - sub;
+        if (next > memLimitBytes.load(std::memory_order_relaxed) && usageCheckOn())
+            return false;
+        if (!move)
+            return true;
+        if (totalUsage.compare_exchange_weak(current, next, std::memory_order_relaxed))
+            return true;
+    }
+}
+
+void plainUsageAdd(uint64_t bytes) {
+    totalUsage.fetch_add(bytes, std::memory_order_relaxed);
+}
+void plainUsageSub(uint64_t bytes) {
+    totalUsage.fetch_sub(bytes, std::memory_order_relaxed);
+}
+uint64_t plainUsage() {
+    return totalUsage.load(std::memory_order_relaxed);
+}
+
+bool trackerLimitTest(uint64_t add, uint64_t sub) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    return trackerLimitTestLocked(t, add, sub);
+}
+
+void trackerRecordAlloc(void* block, uint64_t bytes) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    recordAllocLocked(t, block, bytes);
+}
+
+void trackerRecordFree(void* block, uint64_t bytes) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    t.freeCount += 1;
+    t.currentBytes -= static_cast<unsigned int>(bytes);
+    if (statLevel >= 2)
+        t.allocations.erase(block);
+}
+
+void trackerAddVirtualBlock(void* base, unsigned int stackId) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    t.virtualBlocks[base] = stackId;
+}
+
+unsigned int trackerEraseVirtualBlock(void* base) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    const auto found = t.virtualBlocks.find(base);
+    if (found == t.virtualBlocks.end())
+        return 0;
+    const unsigned int id = found->second;
+    t.virtualBlocks.erase(found);
+    return id;
+}
+
+unsigned int trackerVirtualBlockId(void* base) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    const auto found = t.virtualBlocks.find(base);
+    return found == t.virtualBlocks.end() ? 0 : found->second;
+}
+
+uint64_t trackerCurrentBytes() {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    return t.currentBytes;
+}
+
+IStackWalker& stackWalker() {
+    return *tracker().walker;
+}
+
+void sendOutOfMemoryNotice() {
+    // Reporting allocates, and that allocation may itself fail the limit test: one
+    // notice per thread at a time.
+    if (sendingNotice)
+        return;
+    sendingNotice = true;
+    // The error stack takes the "Insufficient Memory.\n" record here once it exists.
+    sendingNotice = false;
+}
+
+void dumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data) {
+    if (statLevel < 1 || !proc)
+        return;
+    const CZYRThreadSpecificPtr* thread = GetCZYRThreadSpecificPtr();
+    char line[1024];
+    auto emit = [&](int32_t level, uint32_t srcLine) {
+        ZYRPublic::sZYRTraceMsg msg{line, nullptr};
+        ZYRPublic::sZYRTraceMsgDetail detail{
+            level,
+            kSource,
+            srcLine,
+            thread ? thread->getThreadName() : nullptr,
+            thread ? thread->getThreadId() : 0,
+            static_cast<uint32_t>(std::clock() / (CLOCKS_PER_SEC / 1000)),
+        };
+        proc(&msg, &detail, data);
+    };
+
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    if (statLevel >= 2) {
+        std::map<unsigned int, void*> bySerial;
+        for (const auto& [block, serial] : t.allocations)
+            bySerial.emplace(serial, block);
+        uint32_t largestSize = 0;
+        uint32_t largestSerial = 0;
+        for (const auto& [serial, block] : bySerial) {
+            const auto virtualBlock = t.virtualBlocks.find(block);
+            const bool isVirtual = virtualBlock != t.virtualBlocks.end();
+            const auto size = isVirtual ? static_cast<uint32_t>(virtualRegionSize(block))
+                                        : static_cast<const GuardHeader*>(block)->size;
+            const uint32_t stackId =
+                isVirtual ? virtualBlock->second : static_cast<const GuardHeader*>(block)->stackId;
+            std::snprintf(line, sizeof line,
+                          "ZYRMem: Leaked %8u bytes at Memory Ptr:: %#lx, Allocation Count = %8u\n",
+                          size, static_cast<unsigned long>(reinterpret_cast<uintptr_t>(block)),
+                          serial);
+            emit(6, 1421);
+            if (stackId != 0) {
+                line[0] = '\0';
+                t.walker->describe(stackId, line, sizeof line);
+                line[sizeof line - 1] = '\0';
+                emit(8, 1434);
+            }
+            if (size > largestSize) {
+                largestSize = size;
+                largestSerial = serial;
+            }
+        }
+        std::snprintf(line, sizeof line,
+                      "ZYRMem: Largest leak %8u bytes at Allocation Count = %8u\n", largestSize,
+                      largestSerial);
+        emit(6, 1446);
+    }
+    std::snprintf(line, sizeof line, "ZYRMem: Total Leaked: %u bytes\n", t.currentBytes);
+    emit(3, 1461);
+    std::snprintf(line, sizeof line, "ZYRMem: Peak memory consumption: %u bytes\n", t.peakBytes);
+    emit(4, 1473);
+}
+
+} // namespace detail
+
+IStackWalker::~IStackWalker() = default;
+IImpStackWalkerStub::~IImpStackWalkerStub() = default;
+IStackWalker* IImpStackWalkerStub::create() {
+    return new IImpStackWalkerStub;
+}
+
+} // namespace ZYRStd

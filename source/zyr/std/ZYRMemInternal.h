@@ -1,0 +1,54 @@
+// Accounting shared by the heap front, virtual memory and start-up; not exported.
+#pragma once
+
+#include <cstdint>
+
+#include "sZYRTraceMsg.h"
+#include "zyr/std/ZYRStdInit.h"
+
+namespace ZYRStd {
+class IStackWalker;
+}
+
+namespace ZYRStd::detail {
+
+constexpr uint64_t kDefaultMemReserve = 314572800;    // 300 MiB
+constexpr uint64_t kMinimumMemLimit = 419430400;      // 400 MiB
+constexpr uint64_t kGuardedLimitCeiling = 1ull << 32; // guarded tests pass at 4 GiB or more
+
+// Start-up: resets the tracker to `level`, installs `host` and picks the front variants.
+void configureFront(int level, const tZYRMemMgr& host);
+void setMemLimitRaw(uint64_t limit);
+void setMemReserveRaw(uint64_t reserve);
+
+int memStatLevel();
+uint64_t memLimit();
+uint64_t memReserve();
+
+// Plain accounting: the test and the move of the total are one atomic step.
+bool plainLimitTest(uint64_t add, uint64_t sub, bool move);
+void plainUsageAdd(uint64_t bytes);
+void plainUsageSub(uint64_t bytes);
+uint64_t plainUsage();
+
+// Tracker accounting (statistics level 1 or more).
+bool trackerLimitTest(uint64_t add, uint64_t sub);
+// Counts one allocation of `bytes` and at level 2 enters `block` into the allocation map.
+void trackerRecordAlloc(void* block, uint64_t bytes);
+void trackerRecordFree(void* block, uint64_t bytes);
+void trackerAddVirtualBlock(void* base, unsigned int stackId);
+// Removes the block from the virtual-block map and returns its stack identifier.
+unsigned int trackerEraseVirtualBlock(void* base);
+unsigned int trackerVirtualBlockId(void* base);
+uint64_t trackerCurrentBytes();
+IStackWalker& stackWalker();
+
+// The one place the front reports "Insufficient Memory.\n" when a limit test fails.
+void sendOutOfMemoryNotice();
+
+void dumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data);
+
+// Size of a virtual-memory block as the region table records it (0 when unknown).
+uint64_t virtualRegionSize(const void* base);
+
+} // namespace ZYRStd::detail

@@ -1,0 +1,43 @@
+// Per-thread records over Boost.Thread's thread-specific storage.
+#include "zyr/std/ZYRThread.h"
+
+#include <boost/thread/tss.hpp>
+#include <sys/syscall.h>
+#include <unistd.h>
+
+#include "zyr/std/CZYRHash.h"
+
+namespace ZYRStd {
+
+namespace {
+boost::thread_specific_ptr<CZYRThreadSpecificPtr>& threadRecordSlot() {
+    static boost::thread_specific_ptr<CZYRThreadSpecificPtr> slot;
+    return slot;
+}
+} // namespace
+
+CZYRThreadSpecificPtr::CZYRThreadSpecificPtr(const char* name, bool blockable)
+    : name_(name), id_(createUniqueID()), blockable_(blockable) {}
+
+CZYRThreadSpecificPtr::~CZYRThreadSpecificPtr() = default;
+
+CZYRThreadSpecificPtr* GetCZYRThreadSpecificPtr() {
+    return threadRecordSlot().get();
+}
+
+void SetCZYRThreadSpecificPtr(CZYRThreadSpecificPtr* record) {
+    auto& slot = threadRecordSlot();
+    if (slot.get() != record)
+        slot.reset(record);
+}
+
+bool ZYRSingleThreadProcess() {
+    // The option store arrives later; until then every process counts as multi-threaded.
+    return false;
+}
+
+uint32_t ZYRGetCurrentThreadId() {
+    return static_cast<uint32_t>(::syscall(SYS_gettid));
+}
+
+} // namespace ZYRStd

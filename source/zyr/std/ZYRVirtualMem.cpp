@@ -1,0 +1,241 @@
+// Virtual memory over mmap, with the library's own region table, and memory status from
+// /proc, rlimits and the cgroup.
+#include "zyr/std/ZYRVirtualMem.h"
+
+#include <sys/mman.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <fstream>
+#include <map>
+#include <mutex>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "zyr/std/IStackWalker.h"
+#include "zyr/std/ZYRMem.h"
+#include "zyr/std/ZYRMemInternal.h"
+#include "zyr/std/ZYRNoDestructor.h"
+
+namespace ZYRStd {
+
+namespace {
+
+constexpr uint64_t kPageFileCushion = 314572800;
+
+struct Region {
+    uint64_t size;               // reserved bytes, whole pages
+    std::vector<bool> committed; // one flag a page
+    uint64_t committedBytes;
+};
+
+struct RegionTable {
+    std::mutex mutex; // guards regions
+    std::map<const void*, Region> regions;
+};
+
+RegionTable& regionTable() {
+    static detail::NoDestructor<RegionTable> instance;
+    return *instance;
+}
+
+uint64_t pageSize() {
+    static const uint64_t size = static_cast<uint64_t>(::sysconf(_SC_PAGESIZE));
+    return size;
+}
+
+uint64_t roundUpToPage(uint64_t n) {
+    return (n + pageSize() - 1) / pageSize() * pageSize();
+}
+
+// Reads "Key: value kB" lines; returns bytes, or `fallback` when the key is missing.
+uint64_t procField(const char* path, const std::string& key, uint64_t fallback) {
+    std::ifstream in(path);
+    std::string line;
+    while (std::getline(in, line)) {
+        if (line.rfind(key + ":", 0) != 0)
+            continue;
+        std::istringstream fields(line.substr(key.size() + 1));
+        uint64_t value = 0;
+        std::string unit;
+        fields >> value >> unit;
+        return unit == "kB" ? value * 1024 : value;
+    }
+    return fallback;
+}
+
+uint64_t cgroupLimit() {
+    std::ifstream in("/sys/fs/cgroup/memory.max");
+    std::string text;
+    if (!(in >> text) || text == "max")
+        return UINT64_MAX;
+    try {
+        return std::stoull(text);
+    } catch (...) {
+        return UINT64_MAX;
+    }
+}
+
+} // namespace
+
+void* VirtualMemAlloc(unsigned int size) {
+    if (size == 0)
+        return nullptr;
+    const uint64_t bytes = roundUpToPage(size);
+    const int level = detail::memStatLevel();
+    const bool withinLimit =
+        level == 0 ? detail::plainLimitTest(bytes, 0, false) : detail::trackerLimitTest(bytes, 0);
+    if (!withinLimit) {
+        detail::sendOutOfMemoryNotice();
+        return nullptr;
+    }
+    void* base = ::mmap(nullptr, bytes, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    if (base == MAP_FAILED)
+        return nullptr;
+    {
+        RegionTable& table = regionTable();
+        std::lock_guard lock(table.mutex);
+        table.regions[base] = Region{bytes, std::vector<bool>(bytes / pageSize(), true), bytes};
+    }
+    if (level == 0) {
+        detail::plainUsageAdd(bytes);
+    } else {
+        detail::trackerRecordAlloc(base, bytes);
+        detail::trackerAddVirtualBlock(base, detail::stackWalker().capture(10, 2, 32, size));
+    }
+    return base;
+}
+
+void VirtualMemFree(void* p) {
+    if (!p)
+        return;
+    uint64_t reserved = 0;
+    uint64_t committed = 0;
+    {
+        RegionTable& table = regionTable();
+        std::lock_guard lock(table.mutex);
+        const auto found = table.regions.find(p);
+        if (found == table.regions.end())
+            return; // not ours: releasing it would corrupt the accounting
+        reserved = found->second.size;
+        committed = found->second.committedBytes;
+        table.regions.erase(found);
+    }
+    if (detail::memStatLevel() == 0) {
+        detail::plainUsageSub(committed);
+    } else {
+        const unsigned int id = detail::trackerEraseVirtualBlock(p);
+        if (id != 0)
+            detail::stackWalker().release(id, static_cast<unsigned int>(committed));
+        detail::trackerRecordFree(p, committed);
+    }
+    ::munmap(p, reserved);
+}
+
+void VirtualMemDecommit(void* base, void* addr, unsigned int size) {
+    if (!base || size == 0)
+        return;
+    RegionTable& table = regionTable();
+    uint64_t before = 0;
+    uint64_t after = 0;
+    {
+        std::lock_guard lock(table.mutex);
+        const auto found = table.regions.find(base);
+        if (found == table.regions.end())
+            return;
+        Region& region = found->second;
+        const auto start = static_cast<const unsigned char*>(base);
+        const auto from = static_cast<const unsigned char*>(addr);
+        if (from < start || from >= start + region.size)
+            return;
+        // Only whole pages inside the range are given back.
+        const uint64_t offset = static_cast<uint64_t>(from - start);
+        const uint64_t firstPage = (offset + pageSize() - 1) / pageSize();
+        const uint64_t endPage =
+            std::min<uint64_t>((offset + size) / pageSize(), region.committed.size());
+        before = region.committedBytes;
+        for (uint64_t page = firstPage; page < endPage; ++page) {
+            if (!region.committed[page])
+                continue;
+            region.committed[page] = false;
+            region.committedBytes -= pageSize();
+            ::madvise(const_cast<unsigned char*>(start) + page * pageSize(), pageSize(),
+                      MADV_DONTNEED);
+        }
+        after = region.committedBytes;
+    }
+    if (detail::memStatLevel() == 0) {
+        detail::plainUsageSub(before - after);
+    } else {
+        detail::trackerRecordFree(nullptr, before);
+        if (before != after)
+            detail::trackerRecordAlloc(nullptr, after);
+        const unsigned int id = detail::trackerVirtualBlockId(base);
+        if (id != 0)
+            detail::stackWalker().resize(id, static_cast<unsigned int>(before),
+                                         static_cast<unsigned int>(after));
+    }
+}
+
+unsigned int VirtualMemAllocUnitSize() {
+    return std::max<unsigned int>(GetPageSize(), 65536);
+}
+
+unsigned int GetPageSize() {
+    return static_cast<unsigned int>(pageSize());
+}
+
+void VirtualMemStatus(tZYRVirtualMemoryInfo* info) {
+    if (!info)
+        return;
+    const uint64_t totalPhys = procField("/proc/meminfo", "MemTotal", 0);
+    const uint64_t availPhys = procField("/proc/meminfo", "MemAvailable", totalPhys);
+    const uint64_t swapTotal = procField("/proc/meminfo", "SwapTotal", 0);
+    const uint64_t swapFree = procField("/proc/meminfo", "SwapFree", 0);
+    rlimit addressSpace{};
+    uint64_t totalVirtual = totalPhys + swapTotal;
+    if (::getrlimit(RLIMIT_AS, &addressSpace) == 0 && addressSpace.rlim_cur != RLIM_INFINITY)
+        totalVirtual = std::min<uint64_t>(totalVirtual, addressSpace.rlim_cur);
+    totalVirtual = std::min(totalVirtual, cgroupLimit());
+    const uint64_t vmSize = procField("/proc/self/status", "VmSize", 0);
+    const uint64_t availVirtual = totalVirtual > vmSize ? totalVirtual - vmSize : 0;
+    const uint64_t availPageFile = availPhys + swapFree;
+
+    info->totalPhysical = totalPhys;
+    info->totalVirtual = totalVirtual;
+
+    const uint64_t used =
+        detail::memStatLevel() >= 1 ? detail::trackerCurrentBytes() : detail::plainUsage();
+    const uint64_t limit = detail::memLimit();
+    const uint64_t headroom = limit > used ? limit - used : 0;
+    const uint64_t reachable = std::min(headroom, availVirtual);
+    const uint64_t reserve = detail::memReserve();
+    uint64_t available = reachable > reserve ? reachable - reserve : 0;
+    const uint64_t pageFileCap =
+        availPageFile > kPageFileCushion ? availPageFile - kPageFileCushion : 0;
+    info->availableForAllocation = std::min(available, pageFileCap);
+
+    if (!ZYRGetTestAvailablePhysicalMemory()) {
+        info->availablePhysical = totalPhys;
+    } else {
+        // Private committed memory of the process: anonymous resident pages and swap.
+        const uint64_t privateUsage = procField("/proc/self/status", "RssAnon", 0) +
+                                      procField("/proc/self/status", "VmSwap", 0);
+        info->availablePhysical =
+            privateUsage > totalPhys ? 0 : std::min(availPhys, totalPhys - privateUsage);
+    }
+}
+
+namespace detail {
+
+uint64_t virtualRegionSize(const void* base) {
+    RegionTable& table = regionTable();
+    std::lock_guard lock(table.mutex);
+    const auto found = table.regions.find(base);
+    return found == table.regions.end() ? 0 : found->second.committedBytes;
+}
+
+} // namespace detail
+} // namespace ZYRStd
