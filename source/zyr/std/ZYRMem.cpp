@@ -15,6 +15,7 @@
 #include <string>
 
 #include "zyr/std/CZYRError.h"
+#include "zyr/std/CZYRErrorStk.h"
 #include "zyr/std/CZYRSmartPtr.h"
 #include "zyr/std/IStackWalker.h"
 #include "zyr/std/ZYRMemInternal.h"
@@ -536,7 +537,13 @@ void sendOutOfMemoryNotice() {
     if (sendingNotice)
         return;
     sendingNotice = true;
-    // The error stack takes the "Insufficient Memory.\n" record here once it exists.
+    try {
+        CZYRErrorStk stack;
+        stack.reportUniqueError(
+            ZYRMakeErrorInfo(static_cast<short>(0xFFFF), u"Insufficient Memory.\n"));
+    } catch (...) {
+        // The notice is advice; the caller already gets its null.
+    }
     sendingNotice = false;
 }
 
