@@ -1,9 +1,72 @@
 // zyrstd: the command-line host of the library.
 #include <cstdio>
+#include <cstdlib>
+#include <exception>
+#include <string_view>
 
+#include "Commands.h"
 #include "ZYRStd.h"
 
-int main() {
-    std::puts("zyrstd");
-    return 0;
+namespace {
+
+struct Command {
+    std::string_view name;
+    int (*run)(int argc, char** argv);
+    std::string_view help;
+};
+
+constexpr Command kCommands[] = {
+    {"md5", zyrtool::runMd5,
+     "md5 [FILE...]   print the MD5 digest of each FILE (standard input for - or none)"},
+    {"demo", zyrtool::runDemo,
+     "demo            run a host start-up, allocation under a limit and the leak report"},
+};
+
+constexpr int kUsageError = 2;
+
+void printUsage(std::FILE* out) {
+    std::fputs("usage: zyrstd COMMAND [ARGUMENT...]\n\ncommands:\n", out);
+    for (const Command& command : kCommands)
+        std::fprintf(out, "  %.*s\n", static_cast<int>(command.help.size()), command.help.data());
+    std::fputs("  help            print this help\n", out);
+}
+
+void installHostMemory() {
+    ZYRStd::tZYRMemMgr host{[](size_t n, void*) { return std::malloc(n); },
+                            [](void* p, size_t n, void*) { return std::realloc(p, n); },
+                            [](void* p, void*) { std::free(p); }, nullptr};
+    // The front copies the record, so a local one is enough.
+    ZYRStd::ZYRStdInit_ZYRMemMgrSet(&host);
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    installHostMemory();
+
+    if (argc < 2) {
+        std::fputs("zyrstd: no command given\nTry 'zyrstd --help'.\n", stderr);
+        return kUsageError;
+    }
+    const std::string_view name = argv[1];
+    if (name == "help" || name == "--help" || name == "-h") {
+        printUsage(stdout);
+        return 0;
+    }
+    for (const Command& command : kCommands) {
+        if (command.name != name)
+            continue;
+        try {
+            return command.run(argc - 1, argv + 1);
+        } catch (const ZYRStd::CZYRError& e) {
+            std::fprintf(stderr, "zyrstd: %s: %s (error %d at %s:%d)\n", argv[1],
+                         e.getMessage() ? e.getMessage() : "error", static_cast<int>(e.getError()),
+                         e.getSrcFileName() ? e.getSrcFileName() : "?", e.getSrcLineNumber());
+        } catch (const std::exception& e) {
+            std::fprintf(stderr, "zyrstd: %s: %s\n", argv[1], e.what());
+        }
+        return 1;
+    }
+    std::fprintf(stderr, "zyrstd: unknown command '%s'\nTry 'zyrstd --help'.\n", argv[1]);
+    return kUsageError;
 }

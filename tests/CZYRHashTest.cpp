@@ -1,0 +1,221 @@
+// Tests of the MD5 digest and the unique-identifier counter.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <functional>
+#include <memory>
+#include <random>
+#include <set>
+#include <string>
+#include <string_view>
+#include <thread>
+#include <vector>
+
+#include "TestSupport.h"
+#include "ZYRStd.h"
+
+using ZYRStd::CZYRHash;
+using ZYRStd::ZYRDigest;
+
+namespace {
+
+using HashPtr = std::unique_ptr<CZYRHash>;
+
+std::string hex(const ZYRDigest& digest) {
+    static constexpr char digits[] = "0123456789abcdef";
+    std::string out;
+    for (unsigned char byte : digest) {
+        out += digits[byte >> 4];
+        out += digits[byte & 15];
+    }
+    return out;
+}
+
+std::string md5Of(std::string_view text) {
+    HashPtr hash(ZYRStd::createMD5Hash());
+    hash->update(text.data(), static_cast<unsigned int>(text.size()));
+    return hex(hash->getDigest());
+}
+
+std::string md5Via(std::string_view text) {
+    std::string copy(text);
+    HashPtr hash(ZYRStd::createMD5Hash(reinterpret_cast<unsigned char*>(copy.data()),
+                                       static_cast<unsigned int>(copy.size())));
+    return hex(hash->getDigest());
+}
+
+constexpr const char* kEmptyDigest = "d41d8cd98f00b204e9800998ecf8427e";
+
+} // namespace
+
+TEST(CZYRHashTest, RFC1321Suite) {
+    struct Vector {
+        const char* message;
+        const char* digest;
+    };
+    static constexpr Vector suite[] = {
+        {"", "d41d8cd98f00b204e9800998ecf8427e"},
+        {"a", "0cc175b9c0f1b6a831c399e269772661"},
+        {"abc", "900150983cd24fb0d6963f7d28e17f72"},
+        {"message digest", "f96b697d7cb7938d525a2f31aaf161d0"},
+        {"abcdefghijklmnopqrstuvwxyz", "c3fcd3d76192e4007dfb496cca67e13b"},
+        {"ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789",
+         "d174ab98d277d9f5a5611c2c9f419d9f"},
+        {"1234567890123456789012345678901234567890"
+         "1234567890123456789012345678901234567890",
+         "57edf4a22be3c955ac49da2e2107b67a"},
+    };
+    for (const Vector& v : suite) {
+        EXPECT_EQ(md5Of(v.message), v.digest) << "update of \"" << v.message << '"';
+        EXPECT_EQ(md5Via(v.message), v.digest) << "createMD5Hash of \"" << v.message << '"';
+    }
+
+    HashPtr untouched(ZYRStd::createMD5Hash());
+    ASSERT_NE(untouched, nullptr);
+    EXPECT_EQ(hex(untouched->getDigest()), kEmptyDigest);
+}
+
+TEST(CZYRHashTest, PaddingAtBlockBoundaries) {
+    // 55 bytes still leave room for the length in the last block, 56 do not.
+    struct Vector {
+        std::size_t count;
+        const char* digest;
+    };
+    static constexpr Vector suite[] = {
+        {55, "ef1772b6dff9a122358552954ad0df65"},  {56, "3b0c8ac703f828b04c6c197006d17218"},
+        {57, "652b906d60af96844ebd21b674f35e93"},  {63, "b06521f39153d618550606be297466d5"},
+        {64, "014842d480b571495a4a0363793f7367"},  {65, "c743a45e0d2e6a95cb859adae0248435"},
+        {119, "8a7bd0732ed6a28ce75f6dabc90e1613"}, {120, "5f61c0ccad4cac44c75ff505e1f1e537"},
+        {128, "e510683b3f5ffe4093d021808bc6ff70"},
+    };
+    for (const Vector& v : suite)
+        EXPECT_EQ(md5Of(std::string(v.count, 'a')), v.digest) << v.count << " times 'a'";
+}
+
+TEST(CZYRHashTest, SplitUpdatesMatchOneUpdate) {
+    const std::string million(1000000, 'a');
+    const std::string expected = "7707d6ae4e027c70eea2a935c2296f21";
+    EXPECT_EQ(md5Of(million), expected);
+
+    std::mt19937 random(20240607);
+    for (int round = 0; round < 20; ++round) {
+        // Mostly short pieces so that the buffered path is taken often, with some long ones.
+        std::uniform_int_distribution<std::size_t> piece(0, round % 2 ? 200 : 70000);
+        HashPtr hash(ZYRStd::createMD5Hash());
+        std::string splits;
+        for (std::size_t at = 0; at < million.size();) {
+            const std::size_t n = std::min(piece(random), million.size() - at);
+            hash->update(million.data() + at, static_cast<unsigned int>(n));
+            at += n;
+            if (splits.size() < 200)
+                splits += std::to_string(n) + ' ';
+        }
+        EXPECT_EQ(hex(hash->getDigest()), expected) << "pieces: " << splits;
+    }
+
+    // Unaligned starting addresses must not matter either.
+    std::vector<unsigned char> bytes(4096 + 64);
+    std::uniform_int_distribution<int> byte(0, 255);
+    for (auto& b : bytes)
+        b = static_cast<unsigned char>(byte(random));
+    HashPtr reference(ZYRStd::createMD5Hash());
+    reference->update(bytes.data() + 3, 4096);
+    const ZYRDigest whole = reference->getDigest();
+    HashPtr pieces(ZYRStd::createMD5Hash());
+    pieces->update(bytes.data() + 3, 1);
+    pieces->update(bytes.data() + 4, 130);
+    pieces->update(bytes.data() + 134, 4096 - 131);
+    EXPECT_EQ(pieces->getDigest(), whole);
+}
+
+TEST(CZYRHashTest, BitCountCarriesIntoHighWord) {
+    // 2^29 bytes are 2^32 bits: the low word of the bit count wraps here.
+    const std::vector<unsigned char> zeros(1 << 20, 0);
+    HashPtr hash(ZYRStd::createMD5Hash());
+    for (int i = 0; i < 512; ++i)
+        hash->update(zeros.data(), static_cast<unsigned int>(zeros.size()));
+    hash->update(zeros.data(), 1000);
+    EXPECT_EQ(hex(hash->getDigest()), "b0b9022bf39b2600fd66892a61a628c7");
+}
+
+TEST(CZYRHashTest, NullAndEmptyInputChangeNothing) {
+    HashPtr hash(ZYRStd::createMD5Hash());
+    hash->update(nullptr, 10);
+    hash->update("abc", 0);
+    EXPECT_EQ(hex(hash->getDigest()), kEmptyDigest);
+
+    unsigned char bytes[] = {'a', 'b', 'c'};
+    HashPtr noData(ZYRStd::createMD5Hash(nullptr, 3));
+    ASSERT_NE(noData, nullptr);
+    EXPECT_EQ(hex(noData->getDigest()), kEmptyDigest);
+    HashPtr noLength(ZYRStd::createMD5Hash(bytes, 0));
+    ASSERT_NE(noLength, nullptr);
+    EXPECT_EQ(hex(noLength->getDigest()), kEmptyDigest);
+    HashPtr abc(ZYRStd::createMD5Hash(bytes, 3));
+    abc->update(nullptr, 0);
+    EXPECT_EQ(hex(abc->getDigest()), "900150983cd24fb0d6963f7d28e17f72");
+}
+
+TEST(CZYRHashTest, DigestIsFinal) {
+    HashPtr hash(ZYRStd::createMD5Hash());
+    hash->update("message ", 8);
+    hash->update("digest", 6);
+    const ZYRDigest first = hash->getDigest();
+    EXPECT_EQ(hex(first), "f96b697d7cb7938d525a2f31aaf161d0");
+    EXPECT_EQ(hash->getDigest(), first) << "a second getDigest must not pad again";
+
+    for (const char* data : {"more", static_cast<const char*>(nullptr)}) {
+        try {
+            hash->update(data, 4);
+            ADD_FAILURE() << "update after getDigest did not throw";
+        } catch (const ZYRStd::CZYRError& e) {
+            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInvalidFuncCall);
+            EXPECT_EQ(static_cast<int>(e.getError()), 20);
+            EXPECT_STREQ(e.getMessage(), "Can't Update MD5Hash after finalized");
+            EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRHash");
+            EXPECT_GT(e.getSrcLineNumber(), 0);
+        }
+    }
+    EXPECT_EQ(hash->getDigest(), first);
+}
+
+TEST(CZYRHashTest, CreateReturnsNullWhenAllocationFails) {
+    zyrtest::FailingHost host;
+    host.failAll = true;
+    ZYRStd::tZYRMemMgr record = host.record();
+    zyrtest::installFront(0, &record);
+    unsigned char bytes[] = {1, 2, 3};
+    CZYRHash* plain = ZYRStd::createMD5Hash();
+    CZYRHash* withData = ZYRStd::createMD5Hash(bytes, 3);
+    const unsigned int calls = host.calls;
+    zyrtest::installFront(0);
+
+    EXPECT_EQ(plain, nullptr);
+    EXPECT_EQ(withData, nullptr);
+    EXPECT_GT(calls, 0u) << "the object was not allocated through the front";
+    delete plain;
+    delete withData;
+}
+
+TEST(CZYRHashTest, UniqueIDsAreDistinctAndIncreasing) {
+    constexpr int kPerThread = 1000;
+    std::vector<unsigned long long> ids[2];
+    auto draw = [](std::vector<unsigned long long>& out) {
+        for (int i = 0; i < kPerThread; ++i)
+            out.push_back(ZYRStd::createUniqueID());
+    };
+    std::thread first(draw, std::ref(ids[0]));
+    std::thread second(draw, std::ref(ids[1]));
+    first.join();
+    second.join();
+
+    std::set<unsigned long long> all;
+    for (const auto& list : ids) {
+        EXPECT_EQ(std::adjacent_find(list.begin(), list.end(), std::greater_equal<>()), list.end())
+            << "identifiers of one thread must increase";
+        all.insert(list.begin(), list.end());
+    }
+    EXPECT_EQ(all.size(), 2u * kPerThread);
+    EXPECT_GE(*all.begin(), 1u);
+    EXPECT_GT(ZYRStd::createUniqueID(), *all.rbegin());
+}
