@@ -1,6 +1,7 @@
-// The DMM log file and its peak statistics.
+// The DMM log file and its per-client statistics.
 #include "zyr/std/ZYRDMMLog.h"
 
+#include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -16,11 +17,18 @@ namespace {
 
 constexpr size_t kPathBufferSize = 260;
 
+struct ClientStat {
+    uint32_t current = 0;
+    uint32_t peak = 0;
+};
+
 struct DMMLog {
-    std::mutex mutex; // guards every field below and every write to the file
+    std::mutex mutex; // guards path, file and every write to the file
     char path[kPathBufferSize] = {};
     std::FILE* file = nullptr;
-    std::map<std::string, uint64_t> peaks; // ordered: the close lines go in name order
+
+    std::mutex statMutex;                    // guards stats
+    std::map<std::string, ClientStat> stats; // byte order: the close lines go in name order
 };
 
 DMMLog& dmmLog() {
@@ -34,7 +42,7 @@ void dmmLogOpenFromEnvironment() {
     DMMLog& log = dmmLog();
     std::lock_guard lock(log.mutex);
     const char* path = std::getenv("ZYR_DMM_LOG");
-    // A path that does not fit the buffer is refused rather than cut to another name.
+    // A path longer than the buffer is refused rather than cut to some other file's name.
     if (!path || std::strlen(path) >= kPathBufferSize)
         return;
     if (log.file)
@@ -48,14 +56,17 @@ void dmmLogClose() {
     std::lock_guard lock(log.mutex);
     if (!log.file)
         return;
-    for (const auto& [name, peak] : log.peaks) {
-        char line[512];
-        std::snprintf(line, sizeof line, "Client = %s Peak Memory Usage = %u \n", name.c_str(),
-                      static_cast<uint32_t>(peak));
-        std::fprintf(log.file, "%s\n", line);
-        std::fflush(log.file);
+    {
+        std::lock_guard statLock(log.statMutex);
+        for (const auto& [name, stat] : log.stats) {
+            char line[1024];
+            std::snprintf(line, sizeof line, "Client = %s Peak Memory Usage = %u \n", name.c_str(),
+                          stat.peak);
+            std::fprintf(log.file, "%s\n", line);
+            std::fflush(log.file);
+        }
+        log.stats.clear();
     }
-    log.peaks.clear();
     std::fclose(log.file);
     log.file = nullptr;
 }
@@ -66,26 +77,60 @@ bool dmmLogIsOpen() {
     return log.file != nullptr;
 }
 
-void dmmLogPrintf(const char* format, ...) {
+void dmmLogVPrintf(const char* format, va_list args) {
     DMMLog& log = dmmLog();
     std::lock_guard lock(log.mutex);
     if (!log.file)
         return;
-    va_list args;
-    va_start(args, format);
     std::vfprintf(log.file, format, args);
-    va_end(args);
     std::fflush(log.file);
 }
 
-void dmmLogNotePeak(const char* clientName, uint64_t bytes) {
-    DMMLog& log = dmmLog();
-    std::lock_guard lock(log.mutex);
-    if (!log.file)
+void dmmLogPrintf(const char* format, ...) {
+    va_list args;
+    va_start(args, format);
+    dmmLogVPrintf(format, args);
+    va_end(args);
+}
+
+void dmmStatUpdate(const char* name, uint32_t bytes, bool add) {
+    if (!dmmLogIsOpen())
         return;
-    uint64_t& peak = log.peaks[clientName ? clientName : ""];
-    if (bytes > peak)
-        peak = bytes;
+    DMMLog& log = dmmLog();
+    std::lock_guard lock(log.statMutex);
+    const std::string key = name ? name : "";
+    const auto found = log.stats.find(key);
+    if (found == log.stats.end()) {
+        ClientStat& stat = log.stats[key];
+        if (add)
+            stat.current = stat.peak = bytes;
+        else
+            stat.current -= bytes; // unsigned: an unknown name starts from 0
+        return;
+    }
+    ClientStat& stat = found->second;
+    if (add) {
+        stat.current += bytes;
+        stat.peak = std::max(stat.peak, stat.current);
+    } else {
+        stat.current -= bytes;
+    }
+}
+
+void dmmStatUpdateMax(const char* name, uint32_t bytes) {
+    if (!dmmLogIsOpen())
+        return;
+    DMMLog& log = dmmLog();
+    std::lock_guard lock(log.statMutex);
+    ClientStat& stat = log.stats[name ? name : ""];
+    stat.peak = std::max(stat.peak, bytes);
+}
+
+uint32_t dmmStatPeak(const char* name) {
+    DMMLog& log = dmmLog();
+    std::lock_guard lock(log.statMutex);
+    const auto found = log.stats.find(name ? name : "");
+    return found == log.stats.end() ? 0 : found->second.peak;
 }
 
 } // namespace ZYRStd::detail

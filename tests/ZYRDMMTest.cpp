@@ -1,0 +1,413 @@
+// The dynamic memory manager: the recovery ladder, flush order, the log, client accounting.
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <sstream>
+#include <thread>
+#include <vector>
+
+#include "I_SurfaceQueue.h"
+#include "TestSupport.h"
+#include "zyr/std/CZYRStdAllocator.h"
+#include "zyr/std/ZYRDMM.h"
+#include "zyr/std/ZYRMem.h"
+#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/ZYRThread.h"
+
+using namespace ZYRStd;
+using ZYRPublic::eFlushMemorySeverityNormal;
+using ZYRPublic::eFlushMemorySeverityUrgent;
+
+namespace {
+
+// A cache that reports a size and answers flush requests as told.
+class FakeClient : public I_FlushableMemoryClient {
+public:
+    FakeClient(const char* name, unsigned int size, bool answer = false)
+        : name_(name), size_(size), answer_(answer) {}
+
+    bool flushMemory(unsigned int bytesNeeded, unsigned int reserved,
+                     eFlushMemorySeverity severity) override {
+        EXPECT_EQ(reserved, 0u);
+        requests.push_back(bytesNeeded);
+        severities.push_back(severity);
+        const bool freed = answerFor ? answerFor(bytesNeeded) : answer_;
+        if (freed && onFlush)
+            onFlush();
+        return freed;
+    }
+    unsigned int getFlushableMemorySize() override { return size_; }
+    const char* getClientName() override { return name_; }
+
+    std::vector<unsigned int> requests;
+    std::vector<eFlushMemorySeverity> severities;
+    std::function<bool(unsigned int)> answerFor;
+    std::function<void()> onFlush;
+
+private:
+    const char* name_;
+    unsigned int size_;
+    bool answer_;
+};
+
+class FakeQueue : public ZYRPublic::I_SurfaceQueue {
+public:
+    bool synchronize(bool noWait) override {
+        EXPECT_FALSE(noWait);
+        ++calls;
+        if (onSync)
+            onSync();
+        return true;
+    }
+    int calls = 0;
+    std::function<void()> onSync;
+};
+
+class ZYRDMMTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        record_ = host_.record();
+        zyrtest::installFront(0, &record_);
+        SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("interpreter", true));
+        logPath_ = dir_.file("dmm.log");
+        ::setenv("ZYR_DMM_LOG", logPath_.c_str(), 1);
+        tZYRMemMgr any{};
+        ZYRStdInit_ZYRDMMEnv_set(&any);
+    }
+    void TearDown() override {
+        for (FakeClient* client : registered_)
+            UnregisterFlushableMemoryClient(client);
+        RegisterSurfaceQueueInstance(nullptr);
+        tOEMFlushCB none{nullptr, nullptr};
+        ZYRStdInit_OEMFlushCBSet(&none);
+        ZYRStdInit_ZYRDMMEnv_set(nullptr);
+        ::unsetenv("ZYR_DMM_LOG");
+        SetCZYRThreadSpecificPtr(nullptr);
+        zyrtest::installFront(0);
+    }
+
+    void add(FakeClient& client, bool threadSafe = false) {
+        RegisterFlushableMemoryClient(&client, threadSafe);
+        registered_.push_back(&client);
+    }
+
+    // Closes the log and returns everything written to it.
+    std::string closeLog() {
+        ZYRStdInit_ZYRDMMEnv_set(nullptr);
+        std::ifstream in(logPath_, std::ios::binary);
+        std::stringstream text;
+        text << in.rdbuf();
+        return text.str();
+    }
+
+    zyrtest::FailingHost host_;
+    tZYRMemMgr record_{};
+    zyrtest::TempDir dir_;
+    std::string logPath_;
+    std::vector<FakeClient*> registered_;
+};
+
+size_t count(const std::string& text, const std::string& what) {
+    size_t n = 0;
+    for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + 1))
+        ++n;
+    return n;
+}
+
+} // namespace
+
+TEST_F(ZYRDMMTest, FlushWithNobodyToAsk) {
+    EXPECT_FALSE(ZYRFlushMemory(nullptr, 100, eFlushMemorySeverityNormal));
+    EXPECT_EQ(closeLog(), "Client unknown is asking for 100 bytes with severity <0>\n"
+                          "-- Status : <No eligible flushable client> : severity = 0 : none has "
+                          "max avail flushable size = 0\n");
+}
+
+TEST_F(ZYRDMMTest, NormalFlushAsksOnlyClientsLargeEnoughLargestFirst) {
+    FakeClient small("small", 10), large("large", 50), middle("middle", 30);
+    add(small);
+    add(large);
+    add(middle);
+    EXPECT_FALSE(ZYRFlushMemory(nullptr, 40, eFlushMemorySeverityNormal));
+    EXPECT_EQ(large.requests, std::vector<unsigned int>{40});
+    EXPECT_TRUE(middle.requests.empty());
+    EXPECT_TRUE(small.requests.empty());
+
+    middle.answerFor = [](unsigned int) { return true; };
+    EXPECT_TRUE(ZYRFlushMemory(nullptr, 40, eFlushMemorySeverityUrgent));
+    EXPECT_EQ(large.requests.size(), 2u);
+    EXPECT_EQ(middle.requests.size(), 1u);
+    EXPECT_TRUE(small.requests.empty()) << "the walk stops at the first success";
+
+    const std::string log = closeLog();
+    EXPECT_NE(log.find("-- Calling flushing client : <large> to arrange memory with severity <0> "
+                       "[memory need to be flushed = 40 bytes]\n"
+                       "-- Status :<flushing : Failed> \n"
+                       "---- flushable client\x92s total memory (before call): <50 bytes> "
+                       "\t\t\t\t\t\t   \n"
+                       "---- flushable client\x92s total memory (after call): <50 bytes> \n"
+                       "-- Status : <No eligible flushable client> : severity = 0 : large has "
+                       "max avail flushable size = 50\n"),
+              std::string::npos)
+        << log;
+    EXPECT_NE(log.find("-- Calling flushing client : <middle> to arrange memory with severity <1> "
+                       "\n-- Status :<flushing : succeed> \n"),
+              std::string::npos)
+        << log;
+}
+
+TEST_F(ZYRDMMTest, RequesterIsNeverAskedAndNinthClientIsIgnored) {
+    std::vector<std::unique_ptr<FakeClient>> clients;
+    for (unsigned int i = 0; i < 10; ++i) {
+        clients.push_back(std::make_unique<FakeClient>("c", 100 + i));
+        add(*clients.back());
+    }
+    // clients[9] is the largest and the requester; clients[8] is the ninth eligible one.
+    EXPECT_FALSE(ZYRFlushMemory(clients[9].get(), 1, eFlushMemorySeverityUrgent));
+    EXPECT_TRUE(clients[9]->requests.empty());
+    EXPECT_TRUE(clients[8]->requests.empty());
+    for (unsigned int i = 0; i < 8; ++i)
+        EXPECT_EQ(clients[i]->requests.size(), 1u) << i;
+    EXPECT_EQ(count(closeLog(), "-- Too many flushable clients \n"), 1u);
+}
+
+TEST_F(ZYRDMMTest, LadderDoublesTheDemandThenTriesOneUrgentFlush) {
+    FakeClient cache("cache", 1u << 30);
+    cache.answerFor = [](unsigned int need) { return need < 800; };
+    add(cache);
+    host_.failAll = true;
+    EXPECT_EQ(ZYRDMMMalloc(100, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
+              nullptr);
+    EXPECT_EQ(cache.requests, (std::vector<unsigned int>{100, 200, 400, 800, 100}));
+    EXPECT_EQ(cache.severities.back(), eFlushMemorySeverityUrgent);
+
+    const std::string log = closeLog();
+    EXPECT_EQ(log.rfind("Memory Allocation Failed for Client : <TEST>, [memory needed = 100 bytes "
+                        "] \n",
+                        0),
+              0u);
+    EXPECT_EQ(count(log, "----  Memory allocation failed after flushing for Client : <TEST> , "
+                         "[memory needed = 100 bytes ] \n"),
+              3u);
+    EXPECT_NE(log.find("---- Memory allocation failed after SyncRendererThread for Client : <TEST> "
+                       ", [memory needed = 100 bytes ]  \n"),
+              std::string::npos);
+    const std::string closing = "------ Memory can not be flushed anymore, \n------ Client might "
+                                "have some fallback mechanism to arrange memory\n";
+    EXPECT_EQ(log.substr(log.size() - closing.size()), closing);
+}
+
+TEST_F(ZYRDMMTest, ClientThatLiesCannotKeepTheLadderGoing) {
+    FakeClient liar("liar", ~0u, true);
+    add(liar);
+    host_.failAll = true;
+    EXPECT_EQ(ZYRDMMMalloc(64, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
+              nullptr);
+    EXPECT_LE(liar.requests.size(), 40u);
+}
+
+TEST_F(ZYRDMMTest, SuccessfulFlushLetsTheRetrySucceed) {
+    FakeClient cache("cache", 4096);
+    cache.answerFor = [](unsigned int) { return true; };
+    cache.onFlush = [this] { host_.failAll = false; };
+    add(cache);
+    host_.failAll = true;
+    void* p = ZYRDMMMalloc(100, "TEST", nullptr, nullptr, &cache, eFlushMemorySeverityNormal);
+    EXPECT_EQ(p, nullptr) << "the requester is the only client and is skipped";
+    void* q = ZYRDMMMalloc(100, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal);
+    ASSERT_NE(q, nullptr);
+    ZYRDMMFree(q, "TEST", nullptr);
+    EXPECT_NE(closeLog().find("----  Memory allocation succeed after flushing for Client : <TEST> "
+                              ", [memory needed = 100 bytes ] \n"),
+              std::string::npos);
+}
+
+TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
+    void* bands = ZYRMalloc(1 << 20);
+    FakeQueue queue;
+    queue.onSync = [&] {
+        ZYRFree(bands);
+        host_.failAll = false;
+    };
+    RegisterSurfaceQueueInstance(&queue);
+    FakeClient cache("cache", 1 << 30, true);
+    add(cache);
+    host_.failAll = true;
+    void* p = ZYRDMMMalloc(1000, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal);
+    ASSERT_NE(p, nullptr);
+    EXPECT_EQ(queue.calls, 1);
+    EXPECT_TRUE(cache.requests.empty());
+    ZYRFree(p);
+    EXPECT_NE(closeLog().find("---- Memory allocation succeed after SyncRendererThread for Client "
+                              ": <TEST> , [memory needed = 1000 bytes ]  \n"),
+              std::string::npos);
+}
+
+TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
+    FakeQueue queue;
+    RegisterSurfaceQueueInstance(&queue);
+    FakeClient cache("cache", 1 << 30, true);
+    add(cache);
+    host_.failAll = true;
+    std::thread([this] {
+        EXPECT_EQ(ZYRDMMMalloc(10, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
+                  nullptr);
+        host_.failAll = false;
+        SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("host", false));
+        host_.failAll = true;
+        EXPECT_EQ(ZYRDMMMalloc(10, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
+                  nullptr);
+        EXPECT_FALSE(ZYRFlushMemory(nullptr, 10, eFlushMemorySeverityUrgent));
+    }).join();
+    EXPECT_EQ(queue.calls, 0);
+    EXPECT_TRUE(cache.requests.empty());
+    EXPECT_EQ(count(closeLog(), "Memory can not be arranged for this thread \n"), 3u);
+}
+
+TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
+    EXPECT_EQ(ZYRDMMMalloc(0, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
+              nullptr);
+    static std::vector<unsigned int> oemRequests;
+    tOEMFlushCB oem{[](unsigned int need, unsigned int reserved, eFlushMemorySeverity, void* data) {
+                        EXPECT_EQ(reserved, 0u);
+                        EXPECT_EQ(data, reinterpret_cast<void*>(0x42));
+                        oemRequests.push_back(need);
+                        return need == 7;
+                    },
+                    reinterpret_cast<void*>(0x42)};
+    ZYRStdInit_OEMFlushCBSet(&oem);
+    EXPECT_TRUE(ZYRFlushMemory(nullptr, 7, eFlushMemorySeverityNormal));
+    EXPECT_FALSE(ZYRFlushMemory(nullptr, 8, eFlushMemorySeverityUrgent));
+    EXPECT_EQ(oemRequests, (std::vector<unsigned int>{7, 8}));
+    EXPECT_EQ(closeLog(),
+              "Client unknown is asking for 7 bytes with severity <0>\n"
+              "-- Calling flushing client : <OEM> to arrange memory with severity <0> "
+              "[memory need to be flushed = 7 bytes] \n"
+              "-- Status :<flushing : succeed> \n"
+              "Client unknown is asking for 8 bytes with severity <1>\n"
+              "-- Calling flushing client : <OEM> to arrange memory with severity <1> \n"
+              "-- Status :<flushing : failed> \n"
+              "-- Status : <No eligible flushable client> : severity = 1 : none has "
+              "max avail flushable size = 0\n");
+}
+
+TEST_F(ZYRDMMTest, ThreadSafeFlushUsesItsOwnListAndStoredSizes) {
+    FakeClient everywhere("everywhere", 100, true), mainOnly("mainOnly", 500, true);
+    add(everywhere, true);
+    add(mainOnly);
+    EXPECT_TRUE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
+    EXPECT_TRUE(mainOnly.requests.empty());
+    EXPECT_EQ(everywhere.requests.size(), 1u);
+    EXPECT_FALSE(ZYRFlushMemoryThreadSafe(&everywhere, 50, eFlushMemorySeverityNormal));
+
+    UnregisterFlushableMemoryClient(&everywhere);
+    EXPECT_FALSE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
+    EXPECT_NE(
+        closeLog().find("ZYRFlushMemoryThreadSafe: Client unknown is asking for 50 bytes with "
+                        "severity <0>\n-- Calling flushing client : <everywhere> to arrange "
+                        "memory with severity <0> [memory need to be flushed = 50 bytes]\n"
+                        "-- Status :<flushing : succeeded> \n---- flushable client\x92s total "
+                        "memory (before call): <100 bytes> \t\t\t\t   \n"),
+        std::string::npos);
+}
+
+TEST_F(ZYRDMMTest, EngineClientsCountPerThread) {
+    DMM_SetMemoryClientThreadID(eZYRMemoryClientInterp, GetCZYRThreadSpecificPtr()->getThreadId());
+    void* tuma = DMM_TUMAAlloc(nullptr, 100);
+    void* jov = DMM_JOVAlloc(0);
+    ASSERT_NE(tuma, nullptr);
+    ASSERT_NE(jov, nullptr);
+    EXPECT_EQ(DMM_JOVMemSize(jov), 1u);
+    void* other = nullptr;
+    std::thread([&] { other = DMM_TUMAAlloc(nullptr, 50); }).join();
+
+    unsigned long long peak = 0;
+    EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &peak), 100u);
+    EXPECT_EQ(peak, 100u);
+    EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientAll, nullptr), 150u);
+    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientInterp), 101u);
+    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientOthers), 50u);
+    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientAll), 151u);
+
+    tuma = DMM_TUMAReAlloc(nullptr, tuma, 300);
+    EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &peak), 300u);
+    EXPECT_EQ(peak, 300u);
+
+    // Freed by the interpreter although another thread allocated it: "others" clamps at 0.
+    DMM_TUMAFree(nullptr, other);
+    DMM_TUMAFree(nullptr, tuma);
+    EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, nullptr), 0u);
+    DMM_JOVFree(jov);
+    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientAll), 0u);
+    DMM_SetMemoryClientThreadID(eZYRMemoryClientInterp, ~0ull);
+}
+
+TEST_F(ZYRDMMTest, OversizedJovBlockIsRefusedSilently) {
+    ZYRSetMemLimit(400ull << 20);
+    EXPECT_EQ(DMM_JOVAlloc(DMM_GetJOVAllocMaxSingleBlockSize() + 1), nullptr);
+    EXPECT_EQ(closeLog(), "");
+}
+
+TEST_F(ZYRDMMTest, TumaLadderFlushesThenGivesUp) {
+    FakeClient cache("cache", 1 << 30);
+    cache.answerFor = [](unsigned int) { return true; };
+    add(cache);
+    host_.failAll = true;
+    EXPECT_EQ(DMM_TUMAAlloc(nullptr, 64), nullptr);
+    EXPECT_EQ(cache.requests, (std::vector<unsigned int>{64, 128}));
+    const std::string log = closeLog();
+    EXPECT_EQ(
+        log.rfind("Memory Allocation Failed : Client = <TUMA> [memory needed = 64 bytes ]  \n", 0),
+        0u);
+    EXPECT_EQ(count(log, "----  Memory allocation failed after flushing for Client: <TUMA> "
+                         "[memory needed = 64 bytes ] \n"),
+              2u);
+}
+
+TEST_F(ZYRDMMTest, ClientTotalsAndLimit) {
+    FakeClient a("a", 100), b("b", 23);
+    add(a);
+    add(b);
+    unsigned long long flushable = 0, limit = 0, used = 0;
+    GetClientsMemoryUsedAndMemoryLimit(flushable, limit, used);
+    EXPECT_EQ(flushable, 123u);
+    EXPECT_EQ(used, GetMemUsage());
+    tZYRVirtualMemoryInfo info{};
+    VirtualMemStatus(&info);
+    EXPECT_EQ(limit, std::min<unsigned long long>(ZYRGetMemLimit(), info.totalPhysical));
+}
+
+TEST_F(ZYRDMMTest, PerNameStatisticsAreWrittenAtClose) {
+    UpdateClientMemoryStat("zeta", 100, true);
+    UpdateClientMemoryStat("zeta", 50, true);
+    UpdateClientMemoryStat("zeta", 120, false);
+    UpdateClientMemoryStat("zeta", 10, true);
+    UpdateClientMaxMemoryStat("alpha", 7);
+    UpdateClientMaxMemoryStat("alpha", 3);
+    LogDMMInfo("info %d\n", 5);
+    LogSubAlocInfo("sub");
+    EXPECT_EQ(closeLog(), "info 5\nsub\n"
+                          "Client = alpha Peak Memory Usage = 7 \n\n"
+                          "Client = zeta Peak Memory Usage = 150 \n\n");
+    UpdateClientMemoryStat("ignored", 1, true); // the log is closed: nothing is kept
+    LogDMMInfo("lost");
+}
+
+TEST_F(ZYRDMMTest, StdAllocatorServesContainersAndReportsFailure) {
+    std::vector<int, CZYRStdAllocator<int>> values;
+    const unsigned long long before = GetMemUsage();
+    for (int i = 0; i < 1000; ++i)
+        values.push_back(i);
+    EXPECT_GT(GetMemUsage(), before);
+    host_.failAll = true;
+    try {
+        std::vector<int, CZYRStdAllocator<int>> fresh;
+        fresh.resize(10);
+        ADD_FAILURE() << "must throw";
+    } catch (const CZYRBadAlloc& e) {
+        EXPECT_STREQ(e.what(), "bad allocation");
+        EXPECT_STREQ(e.getMessage(), "Mem error in ZYRStdAllocator");
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStdAllocator");
+        EXPECT_EQ(e.getSrcLineNumber(), 94);
+    }
+}
