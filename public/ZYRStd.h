@@ -3,6 +3,8 @@
 
 #include "C_SmartPtr.h"
 #include "I_Error.h"
+#include "I_ErrorStk.h"
+#include "I_SurfaceQueue.h"
 #include "ZYRStdExport.h"
 #include "eFlushMemorySeverity.h"
 #include "eZYRErrorType.h"
@@ -11,6 +13,7 @@
 #include "zyr/std/CZYRClientBase.h"
 #include "zyr/std/CZYRClientRegistry.h"
 #include "zyr/std/CZYRError.h"
+#include "zyr/std/CZYRErrorStk.h"
 #include "zyr/std/CZYRHash.h"
 #include "zyr/std/CZYRSmartPtr.h"
 #include "zyr/std/CZYRStdAllocator.h"

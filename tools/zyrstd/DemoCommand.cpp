@@ -1,8 +1,212 @@
-// zyrstd demo: a host start-up, allocation under a limit, and the leak report.
+// zyrstd demo: how a host embeds the library. It starts the library up, allocates under a
+// memory limit, follows one allocation under memory pressure through the renderer and the
+// flushable caches, and ends with the leak report.
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <string>
+#include <vector>
+
 #include "Commands.h"
+#include "I_SurfaceQueue.h"
+#include "ZYRStd.h"
 
 namespace zyrtool {
 
-int runDemo(int, char**) { return 0; }
+namespace {
+
+using namespace ZYRStd;
+
+constexpr unsigned int kMiB = 1024 * 1024;
+
+// The host's allocator: plain malloc, counting the calls the library makes.
+struct HostHeap {
+    unsigned long allocations = 0;
+    unsigned long frees = 0;
+};
+
+tZYRMemMgr hostRecord(HostHeap& heap) {
+    return {[](size_t n, void* data) {
+                ++static_cast<HostHeap*>(data)->allocations;
+                return std::malloc(n);
+            },
+            [](void* p, size_t n, void*) { return std::realloc(p, n); },
+            [](void* p, void* data) {
+                ++static_cast<HostHeap*>(data)->frees;
+                std::free(p);
+            },
+            &heap};
+}
+
+void section(const char* title) {
+    std::printf("\n== %s\n", title);
+}
+
+void printUsage(const char* when) {
+    std::printf("   memory in use %s: %llu bytes of a %llu MiB limit\n", when, GetMemUsage(),
+                ZYRGetMemLimit() / kMiB);
+}
+
+// Trace callback: the library hands each report line to the host this way.
+void printTrace(ZYRPublic::sZYRTraceMsg* msg, ZYRPublic::sZYRTraceMsgDetail* detail, void*) {
+    if (msg->text)
+        std::printf("   [level %d, %s:%u] %s", detail->level, detail->srcFile, detail->srcLine,
+                    msg->text);
+}
+
+// An engine cache that can give its memory back when asked.
+class Cache : public I_FlushableMemoryClient {
+public:
+    Cache(const char* name, unsigned int bytes) : name_(name) {
+        block_ = ZYRMalloc(bytes);
+        size_ = block_ ? bytes : 0;
+    }
+    ~Cache() override { ZYRFree(block_); }
+
+    bool flushMemory(unsigned int bytesNeeded, unsigned int, eFlushMemorySeverity) override {
+        std::printf("   %s is asked to give back %u bytes: frees %u\n", name_, bytesNeeded, size_);
+        if (!block_)
+            return false;
+        ZYRFree(block_);
+        block_ = nullptr;
+        size_ = 0;
+        return true;
+    }
+    unsigned int getFlushableMemorySize() override { return size_; }
+    const char* getClientName() override { return name_; }
+
+private:
+    const char* name_;
+    void* block_;
+    unsigned int size_;
+};
+
+// Stands in for the renderer: catching up frees the bands it has printed.
+class Renderer : public ZYRPublic::I_SurfaceQueue {
+public:
+    explicit Renderer(unsigned int bandBytes) : bands_(ZYRMalloc(bandBytes)) {}
+    ~Renderer() { ZYRFree(bands_); }
+    bool synchronize(bool) override {
+        std::puts("   the renderer catches up and frees 8 MiB of printed bands");
+        ZYRFree(bands_);
+        bands_ = nullptr;
+        return true;
+    }
+
+private:
+    void* bands_;
+};
+
+std::string tempPath(const char* name) {
+    const char* dir = std::getenv("TMPDIR");
+    return std::string(dir && *dir ? dir : "/tmp") + "/" + name;
+}
+
+void allocationUnderPressure() {
+    section("One allocation under memory pressure");
+    const std::string logPath = tempPath("zyrstd-demo-dmm.log");
+    ::setenv("ZYR_DMM_LOG", logPath.c_str(), 1);
+    tZYRMemMgr any{};
+    ZYRStdInit_ZYRDMMEnv_set(&any); // opens the DMM log named by ZYR_DMM_LOG
+    ZYRStdInit_InitializeFlushableMemoryClientRegistry();
+
+    // Only blockable threads may wait for the renderer or ask caches to flush.
+    SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("interpreter", true));
+
+    Cache fonts("FontCache", 40 * kMiB), images("ImageCache", 120 * kMiB),
+        paths("PathCache", 20 * kMiB);
+    for (Cache* cache : {&fonts, &images, &paths})
+        RegisterFlushableMemoryClient(cache, false);
+    Renderer renderer(8 * kMiB);
+    RegisterSurfaceQueueInstance(&renderer);
+
+    // Fill memory up to the limit, leaving 30 MiB free.
+    const unsigned long long room = ZYRGetMemLimit() - GetMemUsage();
+    void* pages = ZYRMalloc(static_cast<unsigned int>(room - 30 * kMiB));
+    printUsage("with the caches full");
+
+    std::puts("   the interpreter asks for 64 MiB:");
+    void* block = ZYRDMMMalloc(64 * kMiB, "Interpreter", nullptr, nullptr, nullptr,
+                               ZYRPublic::eFlushMemorySeverityNormal);
+    std::printf("   -> %s\n", block ? "granted after recovery" : "refused");
+    printUsage("after recovery");
+
+    ZYRFree(block);
+    ZYRFree(pages);
+    RegisterSurfaceQueueInstance(nullptr);
+    for (Cache* cache : {&fonts, &images, &paths})
+        UnregisterFlushableMemoryClient(cache);
+    SetCZYRThreadSpecificPtr(nullptr);
+    ZYRStdInit_ZYRDMMEnv_set(nullptr); // writes the peak lines and closes the log
+
+    std::printf("   the DMM log (%s) tells the story:\n", logPath.c_str());
+    std::ifstream log(logPath);
+    for (std::string line; std::getline(log, line);) {
+        // The log writes its apostrophe as the Windows-1252 byte 0x92; show it readably.
+        for (size_t at; (at = line.find('\x92')) != std::string::npos;)
+            line.replace(at, 1, "\u2019");
+        std::printf("   | %s\n", line.c_str());
+    }
+    std::remove(logPath.c_str());
+}
+
+} // namespace
+
+int runDemo(int argc, char**) {
+    if (argc > 1) {
+        std::fputs("zyrstd: demo takes no arguments\n", stderr);
+        return 2;
+    }
+    section("Start-up");
+    // Level 2 keeps every block with its allocation number, so that leaks can be named.
+    ::setenv("ZYR_MEMORY_STAT", "2", 1);
+    HostHeap heap;
+    tZYRMemMgr record = hostRecord(heap);
+    ZYRStdInit_ZYRMemMgrSet(&record);
+    std::printf("   host memory procedures installed; statistics level %d\n", ZYRGetMemStatLevel());
+    ZYRSetMemLimit(400ull * kMiB);
+    printUsage("at start");
+
+    section("Allocation under the limit");
+    std::vector<void*> blocks;
+    for (unsigned int size : {64u, 4096u, 1u << 20})
+        blocks.push_back(ZYRMalloc(size));
+    printUsage("after three blocks");
+    const unsigned long long room = ZYRGetMemLimit() - GetMemUsage();
+    void* tooBig = ZYRMalloc(static_cast<unsigned int>(room));
+    std::printf("   asking for all %llu free bytes (plus the block's bookkeeping): %s\n", room,
+                tooBig ? "granted" : "refused");
+    std::u16string notice;
+    CZYRErrorStk errors;
+    if (errors.getErrorMessage(notice))
+        std::printf("   the error stack says: %s",
+                    std::string(notice.begin(), notice.end()).c_str());
+    ZYRFree(blocks.back());
+    blocks.pop_back();
+    void* retry = ZYRMalloc(static_cast<unsigned int>(room - 2 * kMiB));
+    std::printf("   after freeing the 1 MiB block, asking for %llu bytes: %s\n", room - 2 * kMiB,
+                retry ? "granted" : "refused");
+    ZYRFree(retry);
+    ZYRFree(tooBig);
+
+    allocationUnderPressure();
+    TerminateErrorStk();
+
+    section("Memory state and leak report");
+    const sZYRDbgMemState state = ZYRMemMgr_dbgMemState();
+    std::printf("   %u allocations, %u resizes, %u frees; %u bytes held, peak %u bytes\n",
+                state.allocCount, state.reallocCount, state.freeCount, state.currentBytes,
+                state.peakBytes);
+    std::puts("   two blocks are still held, so the report names them:");
+    ZYRStdInit_ZYRMemMgrDumpMemList(printTrace, nullptr);
+    for (void* p : blocks)
+        ZYRFree(p);
+    std::puts("   after freeing them:");
+    ZYRStdInit_ZYRMemMgrDumpMemList(printTrace, nullptr);
+    std::printf("   the host allocator saw %lu allocations and %lu frees\n", heap.allocations,
+                heap.frees);
+    ZYRStdInit_TerminateFlushableMemoryClientRegistry();
+    return 0;
+}
 
 } // namespace zyrtool
