@@ -1,12 +1,19 @@
-// Test entry point: every suite starts with the C runtime heap behind the front.
+// Test entry point: every suite starts with the C runtime heap behind the front and the
+// shared string tables built, as a host would set them up.
 #include <gtest/gtest.h>
 
 #include "TestSupport.h"
+#include "zyr/std/CZYRCommonUniStrings.h"
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);
     // Death tests fork; "threadsafe" re-executes so that threads started earlier are safe.
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     zyrtest::installFront(0);
-    return RUN_ALL_TESTS();
+    ZYRStd::InitCommonUniStrings();
+    ZYRStd::InitDynamicUniStringCache();
+    const int result = RUN_ALL_TESTS();
+    ZYRStd::ReleaseDynamicUniStringCache();
+    ZYRStd::ReleaseCommonUniStrings();
+    return result;
 }

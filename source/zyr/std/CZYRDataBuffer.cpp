@@ -1,0 +1,108 @@
+// Immutable byte buffers.
+#include "zyr/std/CZYRDataBuffer.h"
+
+#include <utility>
+
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/CZYRHash.h"
+#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/ZYRErrorBoundary.h"
+#include "zyr/std/ZYRMem.h"
+
+namespace ZYRStd {
+
+namespace {
+
+constexpr const char* kSource = "source/zyr/std/CZYRDataBuffer";
+
+class IImp_ZYRDataBuffer final : public I_DataBuffer, public CZYRClientBase {
+public:
+    IImp_ZYRDataBuffer(const char* data, unsigned int length, ZYRPublic::I_Error& err)
+        : id_(createUniqueID()) {
+        ZYRErrorBoundaryVoid(err, "Error in IImp_ZYRDataBuffer constructor", kSource, __LINE__,
+                             [&] {
+                                 if (!data || length == 0)
+                                     return;
+                                 data_ = static_cast<char*>(ZYRSureMalloc(length));
+                                 Memcpy(data_, data, length);
+                                 length_ = length;
+                             });
+    }
+    ~IImp_ZYRDataBuffer() override { ZYRFree(data_); }
+
+    void addRef() override { rc_.addRef(); }
+    void release() override {
+        if (rc_.release())
+            delete this;
+    }
+    bool isShared() const override { return rc_.isShared(); }
+    unsigned int debugGetRefCount() const override { return rc_.debugGetRefCount(); }
+    const unsigned int* debugGetRefCountAddr() const override { return rc_.debugGetRefCountAddr(); }
+    uint64_t getUniqueID() const override { return id_; }
+    const char* getBuffer() const override { return data_; }
+    unsigned int getLength() const override { return length_; }
+
+private:
+    CZYRPublicRefCountBase rc_;
+    uint64_t id_;
+    char* data_ = nullptr;
+    unsigned int length_ = 0;
+};
+
+} // namespace
+
+I_DataBuffer* createDataBuffer(const char* data, unsigned int length, ZYRPublic::I_Error& err) {
+    return ZYRErrorBoundary<I_DataBuffer*>(
+        err, nullptr, "Error in IImp_ZYRDataBuffer::create", kSource, __LINE__,
+        [&]() -> I_DataBuffer* { return new IImp_ZYRDataBuffer(data, length, err); });
+}
+
+CZYRDataBuffer::CZYRDataBuffer(const CZYRDataBuffer& other) : CZYRClientBase(), impl_(other.impl_) {
+    if (impl_)
+        impl_->addRef();
+}
+
+CZYRDataBuffer::CZYRDataBuffer(const C_SmartPtr<I_DataBuffer>& buffer) : impl_(buffer.get()) {
+    if (impl_)
+        impl_->addRef();
+}
+
+CZYRDataBuffer::CZYRDataBuffer(I_DataBuffer* buffer, bool addRef) : impl_(buffer) {
+    if (impl_ && addRef)
+        impl_->addRef();
+}
+
+CZYRDataBuffer::CZYRDataBuffer(const char* data, unsigned int length) {
+    C_Error err;
+    impl_ = createDataBuffer(data, length, err);
+    if (err.errorOccurred()) {
+        if (impl_)
+            std::exchange(impl_, nullptr)->release();
+        throwCZYRErrorIfErrorOccurred(err);
+    }
+}
+
+CZYRDataBuffer& CZYRDataBuffer::operator=(const CZYRDataBuffer& other) {
+    if (other.impl_ != impl_) {
+        if (other.impl_)
+            other.impl_->addRef();
+        I_DataBuffer* old = std::exchange(impl_, other.impl_);
+        if (old)
+            old->release();
+    }
+    return *this;
+}
+
+CZYRDataBuffer::~CZYRDataBuffer() {
+    if (impl_)
+        impl_->release();
+}
+
+unsigned long long CZYRDataBuffer::getUniqueID() const {
+    if (!impl_)
+        throw CZYRError(ZYRPublic::kZYRErrorInvalidObject,
+                        "CZYRDataBuffer::getUniqueID invalid object", kSource, __LINE__);
+    return impl_->getUniqueID();
+}
+
+} // namespace ZYRStd

@@ -1,0 +1,67 @@
+// A growable scratch buffer of elements whose storage comes from the dynamic memory manager.
+#pragma once
+
+#include <type_traits>
+
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/ZYRDMM.h"
+
+namespace ZYRStd {
+
+// Allocation policy: blocks from the dynamic memory manager under one client tag.
+template <class T> struct CZYRMemBufferAlloc {
+    static constexpr const char* kClientName = "CZYRMemBufferAlloc";
+    static T* allocate(unsigned int count) {
+        const unsigned long long bytes = static_cast<unsigned long long>(count) * sizeof(T);
+        void* p = bytes > 0xFFFFFFFFull
+                      ? nullptr
+                      : ZYRDMMMalloc(static_cast<unsigned int>(bytes), kClientName, nullptr,
+                                     nullptr, nullptr, ZYRPublic::eFlushMemorySeverityNormal);
+        if (!p)
+            throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, nullptr,
+                            "source/zyr/std/CZYRMemBuffer", __LINE__);
+        return static_cast<T*>(p);
+    }
+    static void free(T* p) { ZYRDMMFree(p, kClientName, nullptr); }
+};
+
+template <class T, class Alloc> class CZYRBaseMemBuffer : public CZYRClientBase {
+    static_assert(std::is_trivially_copyable_v<T>, "elements are raw storage");
+
+public:
+    CZYRBaseMemBuffer() = default;
+    CZYRBaseMemBuffer(const CZYRBaseMemBuffer&) = delete;
+    CZYRBaseMemBuffer& operator=(const CZYRBaseMemBuffer&) = delete;
+    ~CZYRBaseMemBuffer() override {
+        if (data_)
+            Alloc::free(data_);
+    }
+
+    // Replaces the block by one of `count` elements; the old contents are discarded.
+    void grow(unsigned int count) {
+        T* fresh = count ? Alloc::allocate(count) : nullptr;
+        if (data_)
+            Alloc::free(data_);
+        data_ = fresh;
+        count_ = count;
+    }
+    // Checked access: throws kZYRErrorBadParam "invalid index" past the end.
+    T& operator[](unsigned int index) {
+        if (index >= count_)
+            throw CZYRError(ZYRPublic::kZYRErrorBadParam, "invalid index",
+                            "source/zyr/std/CZYRMemBuffer", __LINE__);
+        return data_[index];
+    }
+    unsigned int count() const { return count_; }
+    T* data() { return data_; }
+    const T* data() const { return data_; }
+
+private:
+    unsigned int count_ = 0;
+    T* data_ = nullptr;
+};
+
+template <class T> class CZYRMemBuffer : public CZYRBaseMemBuffer<T, CZYRMemBufferAlloc<T>> {};
+
+} // namespace ZYRStd

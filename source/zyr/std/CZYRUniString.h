@@ -1,0 +1,101 @@
+// Unicode strings on ICU behind I_UniString, the interning value class CZYRUniString, and
+// the conversions to narrow, UTF-8, host-encoded, 16-bit and path forms.
+#pragma once
+
+#include <cstdint>
+
+#include "C_SmartPtr.h"
+#include "I_Error.h"
+#include "I_UniString.h"
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRMemBuffer.h"
+
+namespace ZYRStd {
+
+using ZYRPublic::C_SmartPtr;
+using ZYRPublic::I_UniString;
+
+class CZYRString;
+class CZYRWString;
+
+// New strings with one reference for the caller, never interned. Null when `err` already
+// holds an error or the text is null (the encoding overload records the null text).
+ZYRSTD_API I_UniString* createUniString(const char* text, const char* encoding,
+                                        ZYRPublic::I_Error& err);
+ZYRSTD_API I_UniString* createUniString(const char* text, ZYRPublic::I_Error& err);
+ZYRSTD_API I_UniString* createUniString(const char* text, unsigned int length, const char* encoding,
+                                        ZYRPublic::I_Error& err);
+ZYRSTD_API I_UniString* createUniString(const char16_t* text, ZYRPublic::I_Error& err);
+
+// A shared, immutable Unicode string; null inside means invalid. Built from text, equal
+// texts share one interned object.
+class ZYRSTD_API CZYRUniString : public CZYRClientBase {
+public:
+    CZYRUniString() = default;
+    CZYRUniString(const CZYRUniString& other);
+    CZYRUniString(CZYRUniString&& other) noexcept;
+    CZYRUniString(const C_SmartPtr<I_UniString>& s);
+    explicit CZYRUniString(I_UniString* s, bool addRef = false);
+    CZYRUniString(const char* text, const char* encoding);
+    CZYRUniString(const char* text);
+    CZYRUniString(const char* text, unsigned int length, const char* encoding);
+    CZYRUniString(const char16_t* text);
+    CZYRUniString& operator=(const CZYRUniString& other);
+    CZYRUniString& operator=(CZYRUniString&& other) noexcept;
+    ~CZYRUniString() override;
+
+    // An invalid left-hand value equals nothing and is less than everything.
+    bool operator==(const CZYRUniString& other) const;
+    bool operator==(const I_UniString* other) const;
+    bool operator!=(const CZYRUniString& other) const { return !(*this == other); }
+    bool operator<(const CZYRUniString& other) const;
+    bool operator<(const I_UniString* other) const;
+
+    operator C_SmartPtr<I_UniString>() const { return C_SmartPtr<I_UniString>(impl_, true); }
+
+    void append(const CZYRUniString& other);
+    CZYRUniString concat(const CZYRUniString& other) const;
+    // `*size` is the capacity in bytes on entry and the needed length in bytes on return.
+    void convert(char* buffer, unsigned int* size, const char* encoding) const;
+    void convert(char16_t* buffer, unsigned int* size) const;
+
+    const char* getUTF16LEBuffer(unsigned int* sizeInBytes) const;
+    // Throws kZYRErrorInvalidObject for an invalid value.
+    unsigned long long getUniqueID() const;
+    uint32_t hashCode() const { return impl_ ? impl_->hashCode() : 0; }
+    bool isEmpty() const { return !impl_ || impl_->isEmpty(); }
+    bool isValid() const { return impl_ != nullptr; }
+    unsigned int debugRefCount() const { return impl_ ? impl_->debugGetRefCount() : 0; }
+    I_UniString* getImpl() const { return impl_; }
+
+private:
+    void intern(I_UniString* created, const ZYRPublic::I_Error& err);
+
+    I_UniString* impl_ = nullptr;
+};
+
+// Hash and equality by text, for unordered containers of strings.
+struct CZYRUniStringHash {
+    size_t operator()(const CZYRUniString& s) const noexcept { return s.hashCode(); }
+};
+
+// Two-pass conversions into a scratch buffer: units written, without the terminator.
+ZYRSTD_API unsigned int UniStringToChar(const CZYRUniString& s, CZYRMemBuffer<char>& out);
+ZYRSTD_API unsigned int UniStringToUTF8(const CZYRUniString& s, CZYRMemBuffer<char>& out);
+ZYRSTD_API unsigned int UniStringToWChar_t(const CZYRUniString& s, CZYRMemBuffer<char16_t>& out);
+ZYRSTD_API CZYRString UniStringToString(const CZYRUniString& s);
+ZYRSTD_API CZYRString UniStringToUTF8String(const CZYRUniString& s);
+ZYRSTD_API CZYRString UniStringToHostEncodingString(const CZYRUniString& s);
+ZYRSTD_API CZYRWString UniStringToWString(const CZYRUniString& s);
+// ICU's default converter name, "UTF-8" when it has none.
+ZYRSTD_API const char* GetDefaultCodePage();
+
+// Zero-terminated UTF-16 copies from ZYRMalloc, freed by the caller with ZYRFree.
+ZYRSTD_API unsigned short* UniStringToUTF16Path(CZYRUniString s, ZYRPublic::I_Error& err);
+ZYRSTD_API unsigned short* ASCII2UTF16Path(const char* path, ZYRPublic::I_Error& err);
+ZYRSTD_API unsigned short* UniURL2UTF16Path(const CZYRUniString& url, ZYRPublic::I_Error& err);
+// "file://" URLs to POSIX paths ("file:///tmp/a%20b" -> "/tmp/a b"); other texts unchanged.
+ZYRSTD_API CZYRWString DecodeFileURL(const CZYRWString& url);
+
+} // namespace ZYRStd
