@@ -1,0 +1,17 @@
+// The out-of-line parts of CZYRRect: its key function and the throwing setter.
+#include "zyr/std/CZYRRect.h"
+
+#include "zyr/std/CZYRError.h"
+
+namespace ZYRStd {
+
+CZYRRect::~CZYRRect() = default;
+
+void CZYRRect::setBoundingBox(const sZYRRect& r) {
+    r_ = r;
+    if (!isBoundingBox())
+        throw CZYRError(ZYRPublic::kZYRErrorBadParam, "Invalid bounding box set",
+                        "source/zyr/std/CZYRRect", __LINE__);
+}
+
+} // namespace ZYRStd
