@@ -1,0 +1,164 @@
+// Dictionary printing, copying through enumeration, and the interface registry.
+#include <gtest/gtest.h>
+
+#include <sstream>
+
+#include "zyr/std/CZYRDict.h"
+#include "zyr/std/CZYRInterfaceRegistry.h"
+#include "zyr/std/ZYRDictEnumProcs.h"
+
+using namespace ZYRStd;
+
+namespace {
+std::string print(const CZYRDict& dict, unsigned int depth, unsigned int indent = 0) {
+    std::ostringstream out;
+    ZYRDictEnumProcs procs(out, depth, indent);
+    C_Error err;
+    dict.getImpl()->enumerate(&procs, err);
+    EXPECT_FALSE(err.errorOccurred());
+    return out.str();
+}
+} // namespace
+
+TEST(ZYRDictEnumProcsTest, SingleEntriesAndDepth) {
+    CZYRDict dict;
+    dict.set(CZYRUniString("n"), 7u);
+    EXPECT_EQ(print(dict, 2), "n  [ZYRUINT]: 7\n");
+    EXPECT_EQ(print(dict, 2, 2), "\t\tn  [ZYRUINT]: 7\n");
+    std::ostringstream out;
+    ZYRDictEnumProcs shallow(out);
+    C_Error err;
+    dict.getImpl()->enumerate(&shallow, err);
+    EXPECT_EQ(out.str(), "") << "depth 1 prints nothing";
+
+    CZYRDict buffers;
+    const char twenty[] = "\x00\x01\x02\x03\x04\x05\x06\x07\x08\x09\x0a\x0b\x0c\x0d\x0e\x0f"
+                          "\x10\x11\x12\x13";
+    buffers.set(CZYRUniString("buf"), CZYRDataBuffer(twenty, 20));
+    EXPECT_EQ(print(buffers, 2), "buf [ZYRDataBuffer]: <000102030405060708090a0b0c0d0e0f>\n");
+}
+
+TEST(ZYRDictEnumProcsTest, NestedDictionaryPrintsExactly) {
+    CZYRDict inner;
+    inner.set(CZYRUniString("flag"), true);
+    CZYRArray list;
+    list.set(0, int32_t{-3});
+    list.set(2, CZYRUniString("two"));
+    CZYRArray deeper;
+    deeper.set(0, 1.5);
+    list.set(3, deeper);
+    list.set(4, inner);
+    list.set(5, CZYRDataBuffer("\xff", 1));
+    CZYRDict outer;
+    outer.set(CZYRUniString("inner"), inner);
+    outer.set(CZYRUniString("list"), list);
+    outer.set(CZYRUniString("name"), CZYRUniString("job"));
+
+    // Entries come in the dictionary's own enumeration order, so print each alone.
+    CZYRDict one;
+    one.set(CZYRUniString("inner"), inner);
+    EXPECT_EQ(print(one, 3), "inner  [ZYRDict]: \n"
+                             "\tflag  [ZYRBool]: 1\n");
+    EXPECT_EQ(print(one, 2), "inner  [ZYRDict]: \n") << "the nested level is cut off";
+
+    CZYRDict two;
+    two.set(CZYRUniString("list"), list);
+    EXPECT_EQ(print(two, 4), "list  [ZYRArray]: \n"
+                             "\t[0]  [ZYRINT]: -3\n"
+                             "\t[1] ???\n"
+                             "\t[2]  [ZYRUniString]: two \n"
+                             "\t[3] \t\t[0]  [ZYRDouble]: 1.5\n"
+                             "\t[4] [ZYRDict]\n"
+                             "\t\tflag  [ZYRBool]: 1\n"
+                             "\t[5] <ff>\n");
+
+    CZYRDict three;
+    three.set(CZYRUniString("name"), CZYRUniString("job"));
+    EXPECT_EQ(print(three, 2), "name  [ZYRUniString]: job \n");
+    EXPECT_EQ(print(three, 2, 1), "\tname  [ZYRUniString]: \tjob \n");
+
+    const std::string all = print(outer, 4);
+    EXPECT_NE(all.find("name  [ZYRUniString]: job \n"), std::string::npos);
+    EXPECT_NE(all.find("inner  [ZYRDict]: \n\tflag  [ZYRBool]: 1\n"), std::string::npos);
+}
+
+TEST(ZYRDictEnumProcsTest, TracingCopiesEveryEntry) {
+    CZYRDict source, target;
+    source.set(CZYRUniString("a"), 1u);
+    CZYRDict nested;
+    source.set(CZYRUniString("d"), nested);
+    TracingEnumProcs copier(target);
+    source.enumerate(&copier);
+    EXPECT_EQ(target.getSize(), 2u);
+    CZYRDict shared;
+    target.get(CZYRUniString("d"), shared);
+    EXPECT_EQ(shared.getImpl(), nested.getImpl());
+}
+
+namespace {
+int destroyed = 0;
+struct Item : CZYRRegisterItemBase {
+    explicit Item(int id) : CZYRRegisterItemBase(id) {}
+    ~Item() override { ++destroyed; }
+};
+} // namespace
+
+TEST(ZYRDictEnumProcsTest, InterfaceRegistryOwnsWhatItIsGiven) {
+    destroyed = 0;
+    {
+        CZYRInterfaceRegistry registry;
+        EXPECT_EQ(registry.queryInterface(1), nullptr);
+        EXPECT_FALSE(registry.hasInterface(1));
+        EXPECT_EQ(registry.getNumInterfaces(), 0);
+        EXPECT_FALSE(registry.isShared());
+
+        auto* first = new Item(5);
+        registry.registerInterface(first, ZYRRegisterInterfaceDefaultDeleteProc, false);
+        auto* second = new Item(5);
+        registry.registerInterface(second, ZYRRegisterInterfaceDefaultDeleteProc, true);
+        EXPECT_EQ(destroyed, 1);
+        EXPECT_EQ(registry.getNumInterfaces(), 1);
+        EXPECT_EQ(registry.queryInterface(5), second);
+        // Registering the same item again keeps it alive.
+        registry.registerInterface(second, ZYRRegisterInterfaceDefaultDeleteProc, true);
+        EXPECT_EQ(destroyed, 1);
+
+        EXPECT_THROW(registry.registerInterface(nullptr, nullptr, false), CZYRError);
+        EXPECT_EQ(registry.getNumInterfaces(), 1);
+    }
+    EXPECT_EQ(destroyed, 2) << "the table's destruction deletes what it owns";
+}
+
+TEST(ZYRDictEnumProcsTest, InterfaceRegistryCopiesShareClonesDoNot) {
+    destroyed = 0;
+    {
+        CZYRInterfaceRegistry registry;
+        registry.registerInterface(new Item(1), ZYRRegisterInterfaceDefaultDeleteProc, false);
+        CZYRInterfaceRegistry copy = registry;
+        copy.registerInterface(new Item(2), ZYRRegisterInterfaceDefaultDeleteProc, false);
+        EXPECT_TRUE(registry.hasInterface(2));
+        EXPECT_TRUE(registry.isShared());
+        EXPECT_TRUE(copy.isShared());
+        EXPECT_THROW(registry.registerInterface(registry.queryInterface(1), nullptr, false),
+                     CZYRError);
+        EXPECT_EQ(registry.getNumInterfaces(), 2);
+
+        {
+            CZYRInterfaceRegistry clone = registry.clone();
+            EXPECT_EQ(clone.queryInterface(1), registry.queryInterface(1));
+            clone.deleteInterface(1);
+            EXPECT_TRUE(registry.hasInterface(1));
+        }
+        EXPECT_EQ(destroyed, 0) << "a clone owns nothing";
+        registry.deleteInterface(1);
+        EXPECT_EQ(destroyed, 1);
+        EXPECT_EQ(copy.getNumInterfaces(), 1);
+        registry.deleteInterface(1);
+        EXPECT_EQ(destroyed, 1);
+
+        CZYRCRegisterItem<int> value(3, 42);
+        EXPECT_EQ(*value.getInterface(), 42);
+        EXPECT_EQ(value.getInterfaceID(), 3);
+    }
+    EXPECT_EQ(destroyed, 2);
+}
