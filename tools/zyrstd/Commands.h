@@ -7,5 +7,10 @@ namespace zyrtool {
 int runDemo(int argc, char** argv);
 // md5 [FILE...]: one md5sum-style line per file; "-" or no file reads standard input.
 int runMd5(int argc, char** argv);
+// encode ascii85|asciihex [--prefix P] [--eod E] [--no-z] [IN [OUT]]: standard input and
+// output when not named; a failure leaves no output file.
+int runEncode(int argc, char** argv);
+// decode ascii85|asciihex [IN [OUT]]: the bytes of ASCII85 or ASCIIHex text.
+int runDecode(int argc, char** argv);
 
 } // namespace zyrtool

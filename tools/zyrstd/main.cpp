@@ -18,6 +18,13 @@ struct Command {
 constexpr Command kCommands[] = {
     {"md5", zyrtool::runMd5,
      "md5 [FILE...]   print the MD5 digest of each FILE (standard input for - or none)"},
+    {"encode", zyrtool::runEncode,
+     "encode ascii85|asciihex [--prefix P] [--eod E] [--no-z] [IN [OUT]]\n"
+     "                  encode IN (standard input) as ASCII85 or ASCIIHex text into OUT\n"
+     "                  (standard output)"},
+    {"decode", zyrtool::runDecode,
+     "decode ascii85|asciihex [IN [OUT]]\n"
+     "                  decode ASCII85 or ASCIIHex text from IN into OUT"},
     {"demo", zyrtool::runDemo,
      "demo            run a host start-up, allocation under a limit and the leak report"},
 };

@@ -1,0 +1,126 @@
+// POSIX file names and their factory.
+#include "ZYRHostKit.h"
+
+#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/ZYRFileSys_helper.h"
+
+namespace ZYRHostKit {
+
+using ZYRStd::CZYRString;
+using ZYRStd::CZYRWString;
+
+namespace {
+
+constexpr unsigned int kNone = ~0u;
+
+unsigned int lastSeparator(const CZYRWString& path) {
+    for (unsigned int i = path.length(); i > 0; --i)
+        if (path[i - 1] == u'/')
+            return i - 1;
+    return kNone;
+}
+
+class PosixFileNameFactory final : public ZYRFactory::IZYRFactory {
+public:
+    ZYRStd::CZYRSmartZYRRefPtr<ZYRFileName::IZYRFileName>
+    createFileName(const ZYRStd::CZYRUniString& path) override {
+        return ZYRStd::CZYRSmartZYRRefPtr<ZYRFileName::IZYRFileName>(
+            new CPosixFileName(ZYRStd::UniStringToWString(path)));
+    }
+};
+
+} // namespace
+
+CPosixFileName::CPosixFileName(const CZYRWString& path)
+    : path_(path), utf8_(ZYRFileSys::utf16ToUTF8(path)) {}
+
+CPosixFileName::~CPosixFileName() = default;
+
+CZYRWString CPosixFileName::getFileDirPath() const {
+    const unsigned int at = lastSeparator(path_);
+    if (at == kNone)
+        return CZYRWString();
+    return at == 0 ? CZYRWString(u"/") : CZYRWString(path_, 0, at);
+}
+
+CZYRString CPosixFileName::getFileDirPathInZYRString() const {
+    return ZYRFileSys::utf16ToUTF8(getFileDirPath());
+}
+
+CZYRWString CPosixFileName::getFileName() const {
+    const unsigned int at = lastSeparator(path_);
+    return at == kNone ? path_ : CZYRWString(path_, at + 1);
+}
+
+bool CPosixFileName::pathSpecTypeSupported(ZYRStd::eZYRPathSpecType type) const {
+    return type == kPathSpecUTF8 || type == kPathSpecUTF16;
+}
+
+const void* CPosixFileName::getPathSpec(ZYRStd::eZYRPathSpecType type, unsigned int* length) const {
+    if (type == kPathSpecUTF8) {
+        if (length)
+            *length = utf8_.length();
+        return utf8_.c_str();
+    }
+    if (type == kPathSpecUTF16) {
+        if (length)
+            *length = path_.length() * 2;
+        return path_.c_str();
+    }
+    if (length)
+        *length = 0;
+    return nullptr;
+}
+
+ZYRFactory::IZYRFactory* posixFileNameFactory() {
+    static PosixFileNameFactory factory;
+    return &factory;
+}
+
+CZYRWString utf8ToUTF16(const char* text) {
+    CZYRWString out;
+    const auto* p = reinterpret_cast<const unsigned char*>(text);
+    while (*p) {
+        const unsigned char lead = *p;
+        char32_t c = lead;
+        unsigned int extra = 0;
+        if (lead >= 0xC2 && lead <= 0xDF) {
+            c = lead & 0x1F;
+            extra = 1;
+        } else if (lead >= 0xE0 && lead <= 0xEF) {
+            c = lead & 0x0F;
+            extra = 2;
+        } else if (lead >= 0xF0 && lead <= 0xF4) {
+            c = lead & 0x07;
+            extra = 3;
+        } else if (lead >= 0x80) {
+            out += u'\uFFFD';
+            ++p;
+            continue;
+        }
+        ++p;
+        bool ok = true;
+        for (unsigned int i = 0; i < extra; ++i, ++p) {
+            if ((*p & 0xC0) != 0x80) {
+                ok = false;
+                break;
+            }
+            c = (c << 6) | (*p & 0x3F);
+        }
+        const char32_t lowest[] = {0, 0x80, 0x800, 0x10000};
+        if (!ok || c < lowest[extra] || c > 0x10FFFF || (c >= 0xD800 && c <= 0xDFFF)) {
+            out += u'\uFFFD';
+            continue;
+        }
+        if (c >= 0x10000) {
+            c -= 0x10000;
+            out += static_cast<char16_t>(0xD800 + (c >> 10));
+            out += static_cast<char16_t>(0xDC00 + (c & 0x3FF));
+        } else {
+            out += static_cast<char16_t>(c);
+        }
+    }
+    return out;
+}
+
+} // namespace ZYRHostKit

@@ -1,0 +1,51 @@
+// A small POSIX host for the library: file-name objects with their factory, and the host
+// file-procedure record filled with POSIX procedures. The library implements neither;
+// hosts, tests and zyrstd link this kit to have them.
+#pragma once
+
+#include "IZYRFileName.h"
+#include "ZYRPDLFileSysRec.h"
+#include "zyr/std/CZYRString.h"
+
+namespace ZYRHostKit {
+
+// The path specifications of this host's file names.
+constexpr ZYRStd::eZYRPathSpecType kPathSpecUTF8 = static_cast<ZYRStd::eZYRPathSpecType>(1);
+constexpr ZYRStd::eZYRPathSpecType kPathSpecUTF16 = static_cast<ZYRStd::eZYRPathSpecType>(2);
+
+// A POSIX path held as UTF-16 (the library's path text) and as UTF-8 (the bytes the
+// system is given).
+class CPosixFileName : public ZYRFileName::IZYRFileName {
+public:
+    explicit CPosixFileName(const ZYRStd::CZYRWString& path);
+    ~CPosixFileName() override;
+
+    bool isEmpty() const override { return path_.empty(); }
+    // The part before the last '/' ("/" for a file in the root, empty without a '/').
+    ZYRStd::CZYRWString getFileDirPath() const override;
+    ZYRStd::CZYRString getFileDirPathInZYRString() const override;
+    // The part after the last '/'.
+    ZYRStd::CZYRWString getFileName() const override;
+    ZYRStd::eZYRPathSpecType GetPathSpecDefaultType() const override { return kPathSpecUTF8; }
+    bool pathSpecTypeSupported(ZYRStd::eZYRPathSpecType type) const override;
+    // UTF-8 bytes or UTF-16 units, zero-terminated; `length` counts bytes without the zero.
+    const void* getPathSpec(ZYRStd::eZYRPathSpecType type, unsigned int* length) const override;
+    const ZYRStd::CZYRWString* getFullPath() const override { return &path_; }
+    IZYRFileName* clone() const override { return new CPosixFileName(path_); }
+
+private:
+    ZYRStd::CZYRWString path_;
+    ZYRStd::CZYRString utf8_;
+};
+
+// The factory, one per process; fits ZYRStdInit_SetZYRFactoryProc.
+ZYRFactory::IZYRFactory* posixFileNameFactory();
+
+// Host procedures over POSIX calls. DI paths are malloc'd UTF-8 strings, handles own a
+// descriptor; both go back through the record's `free` and `close`.
+ZYRPublic::_t_ZYRPDLFileSysRec posixFileProcs();
+
+// UTF-8 to UTF-16; malformed bytes become U+FFFD.
+ZYRStd::CZYRWString utf8ToUTF16(const char* text);
+
+} // namespace ZYRHostKit

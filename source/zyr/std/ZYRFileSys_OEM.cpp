@@ -1,0 +1,194 @@
+// A file through the host's procedure record.
+#include "zyr/std/ZYRFileSys_OEM.h"
+
+#include <cstring>
+
+#include "zyr/std/CZYRError.h"
+
+namespace ZYROEMFileSys {
+
+using namespace ZYRStreams;
+using ZYRStd::CZYRError;
+
+namespace {
+
+constexpr const char* kSource = "source/zyr/std/ZYRFileSys_OEM";
+
+[[noreturn]] void missing(const char* message, int line) {
+    throw CZYRError(ZYRPublic::kZYRErrorInvalidFuncCall, message, kSource, line);
+}
+
+[[noreturn]] void failed(const char* message, int line) {
+    throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, message, kSource, line);
+}
+
+uint32_t lowWord(unsigned long long v) {
+    return static_cast<uint32_t>(v);
+}
+
+uint32_t highWord(unsigned long long v) {
+    return static_cast<uint32_t>(v >> 32);
+}
+
+unsigned short hostMode(const ZYRFileSys::CStreamAccess& access) {
+    unsigned short mode = 0;
+    if (access.isReadable())
+        mode |= 0x1;
+    if (access.isWritable())
+        mode |= 0x2;
+    if (access.has(kZYRStreamTruncate))
+        mode |= 0x4;
+    if (access.has(kZYRStreamSequentialScan))
+        mode |= 0x8;
+    if (access.has(kZYRStreamRandomAccess))
+        mode |= 0x20;
+    return mode;
+}
+
+} // namespace
+
+CFile::CFile(void* diPath, unsigned int mode, ZYRPublic::_t_ZYRPDLFileSysRec* record)
+    : diPath_(diPath), access_(mode), record_(record) {
+    if (!record_ || !record_->diPathToPath) {
+        freeDIPath();
+        missing("diPathFromPath proc not defined", __LINE__);
+    }
+    try {
+        if (record_->diPathToWPath) {
+            char16_t* text = record_->diPathToWPath(diPath_, 0);
+            if (text) {
+                path_ = ZYRStd::CZYRUniString(text);
+                if (record_->free)
+                    record_->free(text);
+            }
+        } else {
+            char* text = record_->diPathToPath(diPath_, 0);
+            if (text) {
+                path_ = ZYRStd::CZYRUniString(text, static_cast<unsigned int>(std::strlen(text)),
+                                              "UTF-8");
+                if (record_->free)
+                    record_->free(text);
+            }
+        }
+    } catch (...) {
+        freeDIPath();
+        throw;
+    }
+}
+
+CFile::~CFile() {
+    try {
+        close();
+    } catch (...) {
+        // A destructor has no one to report to.
+    }
+    freeDIPath();
+}
+
+void CFile::freeDIPath() noexcept {
+    if (diPath_ && record_ && record_->free)
+        record_->free(diPath_);
+    diPath_ = nullptr;
+}
+
+void CFile::open() {
+    if (!record_->open64)
+        missing("open64 proc not defined", __LINE__);
+    void* handle = nullptr;
+    if (record_->open64(diPath_, hostMode(access_), &handle) != 0 || !handle)
+        failed("Error opening file", __LINE__);
+    handle_ = handle;
+}
+
+void CFile::close() {
+    if (!record_->close || !record_->remove)
+        missing("close or remove proc not defined", __LINE__);
+    if (!handle_)
+        return;
+    void* handle = handle_;
+    handle_ = nullptr; // closed or not, the handle is not used again
+    if (record_->close(handle) != 0)
+        failed("Error closing file", __LINE__);
+    if (access_.has(kZYRStreamDeleteOnClose) && record_->remove(diPath_) != 0)
+        missing("Error removing file", __LINE__);
+}
+
+unsigned long long CFile::setPos(const unsigned long long& pos) {
+    if (!record_->setpos64)
+        missing("setpos64 proc not defined", __LINE__);
+    if (record_->setpos64(handle_, lowWord(pos), highWord(pos)) != 0)
+        failed("Error setpos file", __LINE__);
+    return pos;
+}
+
+unsigned long long CFile::getPos() {
+    if (!record_->getpos64)
+        missing("getpos64 proc not defined", __LINE__);
+    unsigned long long pos = 0;
+    if (record_->getpos64(handle_, &pos) != 0)
+        failed("Error getpos file", __LINE__);
+    return pos;
+}
+
+unsigned long long CFile::setEOF() {
+    if (!record_->geteof64 || !record_->setpos64)
+        missing("geteof64 or setpos64 proc not defined", __LINE__);
+    unsigned long long eof = 0;
+    if (record_->geteof64(handle_, &eof) != 0 ||
+        record_->setpos64(handle_, lowWord(eof), highWord(eof)) != 0)
+        failed("Error seteof file", __LINE__);
+    return eof;
+}
+
+unsigned int CFile::read(void* buf, unsigned int bytes) {
+    if (!record_->read)
+        missing("read proc not defined", __LINE__);
+    int error = 0;
+    const size_t got = record_->read(buf, bytes, 1, handle_, &error);
+    if (error != 0)
+        failed("Error reading file", __LINE__);
+    return static_cast<unsigned int>(got);
+}
+
+unsigned int CFile::write(const void* buf, unsigned int bytes) {
+    if (!record_->write)
+        missing("write proc not defined", __LINE__);
+    int error = 0;
+    const size_t put = record_->write(buf, bytes, 1, handle_, &error);
+    if (error != 0)
+        failed("Error writing file", __LINE__);
+    return static_cast<unsigned int>(put);
+}
+
+unsigned long long CFile::getSize() {
+    if (!record_->geteof64)
+        missing("geteof proc not defined", __LINE__);
+    unsigned long long eof = 0;
+    if (record_->geteof64(handle_, &eof) != 0)
+        failed("Error getting size of file", __LINE__);
+    return eof;
+}
+
+void CFile::flush() {
+    if (!record_->flush)
+        missing("flush proc not defined", __LINE__);
+    if (record_->flush(handle_) != 0)
+        failed("error flushing file", __LINE__);
+}
+
+bool CFile::truncate() {
+    if (!record_->getpos64 || !record_->seteof)
+        missing("getpos64 or seteof proc not defined", __LINE__);
+    unsigned long long pos = 0;
+    return record_->getpos64(handle_, &pos) == 0 &&
+           record_->seteof(handle_, lowWord(pos), highWord(pos)) == 0;
+}
+
+void CFile::remove() {
+    if (!record_->remove)
+        missing("remove proc not defined", __LINE__);
+    if (record_->remove(diPath_) != 0)
+        missing("Error removing file", __LINE__);
+}
+
+} // namespace ZYROEMFileSys
