@@ -18,71 +18,48 @@ namespace {
     if (got.equal(want, eps))
         return ::testing::AssertionSuccess();
     const sZYRMatrix& g = got;
-    const sZYRMatrix& w = want;
-    return ::testing::AssertionFailure()
-           << "got (" << g.a << ", " << g.b << ", " << g.c << ", " << g.d << ", " << g.tx << ", "
-           << g.ty << ") want (" << w.a << ", " << w.b << ", " << w.c << ", " << w.d << ", " << w.tx
-           << ", " << w.ty << ")";
+    return ::testing::AssertionFailure() << "got (" << g.a << ", " << g.b << ", " << g.c << ", "
+                                         << g.d << ", " << g.tx << ", " << g.ty << ")";
 }
 
 const CZYRMatrix kA(1, 2, 3, 4, 5, 6);
 const CZYRMatrix kB(7, 8, 9, 10, 11, 12);
-
-CZYRMatrix randomInvertible(std::mt19937_64& rng) {
-    std::uniform_real_distribution<double> linear(-10.0, 10.0);
-    std::uniform_real_distribution<double> shift(-1000.0, 1000.0);
-    for (;;) {
-        CZYRMatrix m(linear(rng), linear(rng), linear(rng), linear(rng), shift(rng), shift(rng));
-        if (std::fabs(m.determinant()) > 0.5)
-            return m;
-    }
-}
+const double kNaN = std::numeric_limits<double>::quiet_NaN();
 
 } // namespace
 
-TEST(CZYRMatrixTest, IdentityValidityAndAccessors) {
-    CZYRMatrix m;
-    EXPECT_TRUE(m.isIdentity());
+TEST(CZYRMatrixTest, IdentityValidityAndComparisons) {
+    EXPECT_TRUE(CZYRMatrix().isIdentity());
     EXPECT_TRUE(CZYRMatrix(1, -0.0, 0, 1, 0, 0).isIdentity()) << "-0.0 compares equal to 0";
     EXPECT_FALSE(CZYRMatrix(1, 0, 0, 1, 0, 1e-300).isIdentity());
 
-    const double nan = std::numeric_limits<double>::quiet_NaN();
-    CZYRMatrix bad(1, 0, 0, 1, 0, nan);
+    const CZYRMatrix bad(1, 0, 0, 1, 0, kNaN);
     EXPECT_FALSE(bad.isValid());
     EXPECT_FALSE(bad.isIdentity());
     EXPECT_FALSE(bad == bad) << "a NaN entry makes equality false";
     EXPECT_FALSE(bad.equal(bad, 1.0));
     EXPECT_TRUE(kA.isValid());
+    EXPECT_TRUE(kA != kB);
 
-    const sZYRMatrix& rec = kA;
-    EXPECT_EQ(rec.a, 1);
-    EXPECT_EQ(rec.ty, 6);
-    EXPECT_TRUE(CZYRMatrix(rec) == kA);
+    const CZYRMatrix shifted(1, 2, 3, 4, 5.5, 6);
+    EXPECT_TRUE(kA.equal(shifted, 0.5)) << "eps is inclusive";
+    EXPECT_FALSE(kA.equal(shifted, 0.4999));
+    EXPECT_FALSE(kA.equal(CZYRMatrix(1, 2, 3, 4.25, 5, 6), 0.2)) << "every entry counts";
 
+    CZYRMatrix m;
     m.setMtxVals(0.1, 2, 3, 4, 1e40, -7);
     float fa, fb, fc, fd, ftx, fty;
     m.getMtxVals(fa, fb, fc, fd, ftx, fty);
     EXPECT_EQ(fa, 0.1f);
-    EXPECT_EQ(fd, 4.0f);
     EXPECT_TRUE(std::isinf(ftx)) << "values beyond float range narrow to infinity";
     EXPECT_EQ(fty, -7.0f);
-
-    m.setTransVals(8, 9);
-    double tx, ty;
-    m.getTransVals(tx, ty);
-    EXPECT_EQ(tx, 8);
-    EXPECT_EQ(ty, 9);
-    double a, b, c, d;
-    m.getMtxVals(a, b, c, d, tx, ty);
-    EXPECT_EQ(a, 0.1);
-    EXPECT_EQ(c, 3);
 
     EXPECT_EQ(kA.determinant(), -2.0);
     EXPECT_DOUBLE_EQ(kA.resolution(72), 72 * std::sqrt(2.0));
 }
 
 TEST(CZYRMatrixTest, ProductOrders) {
-    // Worked by hand: A applies first, then B.
+    // Worked by hand: in A times B, A applies first.
     const CZYRMatrix AB(25, 28, 57, 64, 100, 112);
     const CZYRMatrix BA(31, 46, 39, 58, 52, 76);
     EXPECT_TRUE(kA * kB == AB);
@@ -101,10 +78,6 @@ TEST(CZYRMatrixTest, ProductOrders) {
     double x = 1, y = 1;
     kA.transformPoint(x, y);
     kB.transformPoint(x, y);
-    double px = 1, py = 1;
-    AB.transformPoint(px, py);
-    EXPECT_EQ(x, px);
-    EXPECT_EQ(y, py);
     EXPECT_EQ(x, 182);
     EXPECT_EQ(y, 204);
 }
@@ -113,30 +86,24 @@ TEST(CZYRMatrixTest, PrefixAndPostfixForms) {
     CZYRMatrix m = kA;
     m.translate(2, 3);
     EXPECT_TRUE(m == CZYRMatrix(1, 2, 3, 4, 16, 22));
-    EXPECT_TRUE(m == CZYRMatrix(1, 0, 0, 1, 2, 3) * kA);
     m = kA;
     m.translateMTX(2, 3);
     EXPECT_TRUE(m == CZYRMatrix(1, 2, 3, 4, 7, 9));
-
     m = kA;
     m.scale(2, 3);
     EXPECT_TRUE(m == CZYRMatrix(2, 4, 9, 12, 5, 6));
     m = kA;
     m.scaleMTX(2, 3);
     EXPECT_TRUE(m == CZYRMatrix(2, 6, 6, 12, 10, 18));
-    EXPECT_TRUE(m == kA * CZYRMatrix(2, 0, 0, 3, 0, 0));
 
-    // cos 90 degrees is not 0 in double; the rotation must keep that.
+    // cos 90 degrees is not 0 in double, and the rotation keeps that.
     const double cos90 = std::cos(90 * 3.141592653589793 / 180);
-    CZYRMatrix r;
-    r.rotate(90);
-    EXPECT_TRUE(r == CZYRMatrix(cos90, 1, -1, cos90, 0, 0));
-    EXPECT_NE(cos90, 0.0);
-    r = CZYRMatrix();
-    r.rotate(360);
-    EXPECT_FALSE(r.isIdentity());
-    EXPECT_TRUE(near(r, CZYRMatrix(), 1e-15));
-
+    m = CZYRMatrix();
+    m.rotate(90);
+    EXPECT_TRUE(m == CZYRMatrix(cos90, 1, -1, cos90, 0, 0));
+    m = CZYRMatrix();
+    m.rotate(360);
+    EXPECT_FALSE(m.isIdentity());
     m = kA;
     m.rotate(90);
     EXPECT_TRUE(near(m, CZYRMatrix(3, 4, -1, -2, 5, 6), 1e-12));
@@ -152,10 +119,6 @@ TEST(CZYRMatrixTest, PrefixAndPostfixForms) {
     m = kA;
     m.rotateMTX(30);
     EXPECT_TRUE(near(m, kA * R, 1e-12));
-    double x = 1, y = 0;
-    R.transformPoint(x, y);
-    EXPECT_NEAR(x, std::sqrt(3.0) / 2, 1e-15);
-    EXPECT_NEAR(y, 0.5, 1e-15) << "positive angles turn counter-clockwise";
 
     // The free functions change the matrix exactly as the methods do.
     CZYRMatrix viaMethod = kA, viaFree = kA;
@@ -180,17 +143,17 @@ TEST(CZYRMatrixTest, Inversion) {
     EXPECT_TRUE(m == CZYRMatrix(0.5, 0, 0, 0.25, -5, -5));
 
     std::mt19937_64 rng(7);
+    std::uniform_real_distribution<double> linear(-10.0, 10.0), shift(-1000.0, 1000.0);
     for (int i = 0; i < 1000; ++i) {
-        const CZYRMatrix A = randomInvertible(rng);
+        const CZYRMatrix A(linear(rng), linear(rng), linear(rng), linear(rng), shift(rng),
+                           shift(rng));
+        if (std::fabs(A.determinant()) < 0.5)
+            continue;
         CZYRMatrix inv = A;
         inv.invert();
         ASSERT_TRUE(near(A * inv, CZYRMatrix(), 1e-9)) << "case " << i;
         ASSERT_TRUE(near(inv * A, CZYRMatrix(), 1e-9)) << "case " << i;
-        CZYRMatrix viaFree;
-        ZYRMatrix_invert(A, viaFree);
-        ASSERT_TRUE(viaFree == inv);
     }
-
     CZYRMatrix same = kA;
     ZYRMatrix_invert(same, same);
     EXPECT_TRUE(near(same * kA, CZYRMatrix(), 1e-12)) << "source and target may be one matrix";
@@ -211,70 +174,43 @@ TEST(CZYRMatrixTest, Inversion) {
     EXPECT_THROW(ZYRMatrix_invert(singular, target), CZYRError);
     EXPECT_TRUE(target == kB);
 
-    // No tolerance in invert; invertible judges the determinant as a float.
+    // invert has no tolerance; invertible judges the determinant as a float.
     CZYRMatrix tiny(1e-20, 0, 0, 1e-20, 0, 0);
     EXPECT_FALSE(tiny.invertible());
     EXPECT_NO_THROW(tiny.invert());
     EXPECT_TRUE(near(tiny, CZYRMatrix(1e20, 0, 0, 1e20, 0, 0), 1e5));
-
     const double fmin = std::numeric_limits<float>::min();
     EXPECT_FALSE(CZYRMatrix(1, 0, 0, fmin, 0, 0).invertible()) << "must exceed, not reach";
     EXPECT_TRUE(CZYRMatrix(1, 0, 0, 2 * fmin, 0, 0).invertible());
     EXPECT_TRUE(CZYRMatrix(0, 1e-3, 1, 0, 0, 0).invertible()) << "negative determinant";
     EXPECT_TRUE(CZYRMatrix(1e200, 0, 0, 1e200, 0, 0).invertible()) << "beyond float range";
-    const double nan = std::numeric_limits<double>::quiet_NaN();
-    EXPECT_FALSE(CZYRMatrix(nan, 0, 0, 1, 0, 0).invertible());
+    EXPECT_FALSE(CZYRMatrix(kNaN, 0, 0, 1, 0, 0).invertible());
 }
 
-TEST(CZYRMatrixTest, TransformPoints) {
-    double x = 1, y = 1;
-    kA.transformPoint(x, y);
-    EXPECT_EQ(x, 9);
-    EXPECT_EQ(y, 12);
+TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
     float fx = 1.5f, fy = -2.0f;
     kA.transformPoint(fx, fy);
     EXPECT_EQ(fx, 0.5f);
     EXPECT_EQ(fy, 1.0f);
-
     // In float, 2^24 + 1 would round away before the translation cancels 2^24.
     const CZYRMatrix cancel(1, 0, 1, 1, -16777216.0, 0);
     fx = 16777216.0f;
     fy = 1.0f;
-    cancel.transformPoint(fx, fy);
-    EXPECT_EQ(fx, 1.0f) << "float points are transformed in double";
-    fx = 16777216.0f;
-    fy = 1.0f;
     ZYRMatrix_transformPoint(cancel, fx, fy);
-    EXPECT_EQ(fx, 1.0f);
-    x = 2;
-    y = 3;
-    ZYRMatrix_transformPoint(kA, x, y);
-    EXPECT_EQ(x, 2 + 9 + 5);
-    EXPECT_EQ(y, 4 + 12 + 6);
-}
+    EXPECT_EQ(fx, 1.0f) << "float points are transformed in double";
 
-TEST(CZYRMatrixTest, BoundingBoxes) {
     const sZYRRect r{1, 2, 4, 3}; // left, bottom, top, right
     const sZYRRect mirrored = CZYRMatrix(-1, 0, 0, 1, 0, 0).transformBBox(r);
     EXPECT_EQ(mirrored.left, -3);
     EXPECT_EQ(mirrored.bottom, 2);
     EXPECT_EQ(mirrored.top, 4);
     EXPECT_EQ(mirrored.right, -1);
-
-    const sZYRRect flipped = CZYRMatrix(-2, 0, 0, -1, 10, 10).transformBBox(r);
-    EXPECT_EQ(flipped.left, 4);
-    EXPECT_EQ(flipped.right, 8);
-    EXPECT_EQ(flipped.bottom, 6);
-    EXPECT_EQ(flipped.top, 8);
-
     CZYRMatrix rot;
     rot.rotate(45);
     const sZYRRect diamond = rot.transformBBox({0, 0, 1, 1});
-    const double h = std::sqrt(0.5);
-    EXPECT_NEAR(diamond.left, -h, 1e-15);
-    EXPECT_NEAR(diamond.right, h, 1e-15);
-    EXPECT_NEAR(diamond.bottom, 0, 1e-15);
-    EXPECT_NEAR(diamond.top, 2 * h, 1e-15);
+    EXPECT_NEAR(diamond.left, -std::sqrt(0.5), 1e-15);
+    EXPECT_NEAR(diamond.right, std::sqrt(0.5), 1e-15);
+    EXPECT_NEAR(diamond.top, std::sqrt(2.0), 1e-15);
 
     // Against the extremes of the four transformed corners, for arbitrary matrices.
     std::mt19937_64 rng(11);
@@ -284,35 +220,20 @@ TEST(CZYRMatrixTest, BoundingBoxes) {
         const double x0 = any(rng), x1 = any(rng), y0 = any(rng), y1 = any(rng);
         const sZYRRect box{std::min(x0, x1), std::min(y0, y1), std::max(y0, y1), std::max(x0, x1)};
         double lo[2] = {INFINITY, INFINITY}, hi[2] = {-INFINITY, -INFINITY};
-        for (double cx : {box.left, box.right}) {
-            for (double cy : {box.bottom, box.top}) {
-                double px = cx, py = cy;
-                m.transformPoint(px, py);
-                lo[0] = std::min(lo[0], px);
-                hi[0] = std::max(hi[0], px);
-                lo[1] = std::min(lo[1], py);
-                hi[1] = std::max(hi[1], py);
+        for (double cx : {x0, x1}) {
+            for (double cy : {y0, y1}) {
+                double p[2] = {cx, cy};
+                m.transformPoint(p[0], p[1]);
+                for (int k = 0; k < 2; ++k) {
+                    lo[k] = std::min(lo[k], p[k]);
+                    hi[k] = std::max(hi[k], p[k]);
+                }
             }
         }
-        const sZYRRect got = m.transformBBox(box);
+        const sZYRRect got = ZYRMatrix_transformBBox(m, box);
         ASSERT_NEAR(got.left, lo[0], 1e-9) << "case " << i;
         ASSERT_NEAR(got.right, hi[0], 1e-9) << "case " << i;
         ASSERT_NEAR(got.bottom, lo[1], 1e-9) << "case " << i;
         ASSERT_NEAR(got.top, hi[1], 1e-9) << "case " << i;
-        const sZYRRect viaFree = ZYRMatrix_transformBBox(m, box);
-        ASSERT_EQ(viaFree.left, got.left);
-        ASSERT_EQ(viaFree.top, got.top);
     }
-}
-
-TEST(CZYRMatrixTest, Comparisons) {
-    EXPECT_TRUE(CZYRMatrix(0.0, 0, 0, 0, 0, 0) == CZYRMatrix(-0.0, 0, 0, 0, 0, 0));
-    EXPECT_FALSE(kA == kB);
-    EXPECT_TRUE(kA != kB);
-
-    const CZYRMatrix shifted(1, 2, 3, 4, 5.5, 6);
-    EXPECT_TRUE(kA.equal(shifted, 0.5)) << "eps is inclusive";
-    EXPECT_FALSE(kA.equal(shifted, 0.4999));
-    EXPECT_TRUE(kA.equal(kA, 0.0));
-    EXPECT_FALSE(kA.equal(CZYRMatrix(1, 2, 3, 4.25, 5, 6), 0.2)) << "every entry counts";
 }
