@@ -1,0 +1,599 @@
+// Tests of the file system: the static calls, file names, and the native and host-procedure
+// file streams on real files in a fresh temporary directory.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <sys/stat.h>
+#include <unistd.h>
+#include <vector>
+
+#include "TestSupport.h"
+#include "ZYRHostKit.h"
+#include "zyr/std/CZYRBaseStream.h"
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/CZYRFileSys.h"
+
+namespace {
+
+using namespace ZYRStreams;
+using ZYRStd::CZYRError;
+using ZYRStd::CZYRFileName;
+using ZYRStd::CZYRFileSys;
+using ZYRStd::CZYRSmartZYRRefPtr;
+
+constexpr const char* kWindowsSource = "source/zyr/std/ZYRFileSys_Windows";
+constexpr const char* kHostSource = "source/zyr/std/ZYRFileSys_OEM";
+
+std::string readFile(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+}
+
+void writeFile(const std::string& path, const std::string& bytes) {
+    std::ofstream(path, std::ios::binary) << bytes;
+}
+
+bool exists(const std::string& path) {
+    struct stat st;
+    return ::stat(path.c_str(), &st) == 0;
+}
+
+std::string utf8(const ZYRStd::CZYRUniString& s) {
+    return ZYRStd::UniStringToUTF8String(s).c_str();
+}
+
+template <class Body>
+void expectError(Body body, ZYRPublic::eZYRErrorType type, const char* message,
+                 const char* source) {
+    try {
+        body();
+        ADD_FAILURE() << "no error; expected \"" << message << "\"";
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), type) << (e.getMessage() ? e.getMessage() : "");
+        EXPECT_STREQ(e.getMessage(), message);
+        EXPECT_STREQ(e.getSrcFileName(), source);
+    }
+}
+
+// A file name whose full path is missing, as a host's may be.
+class PathlessName : public ZYRFileName::IZYRFileName {
+public:
+    bool isEmpty() const override { return true; }
+    ZYRStd::CZYRWString getFileDirPath() const override { return {}; }
+    ZYRStd::CZYRString getFileDirPathInZYRString() const override { return {}; }
+    ZYRStd::CZYRWString getFileName() const override { return {}; }
+    ZYRStd::eZYRPathSpecType GetPathSpecDefaultType() const override { return {}; }
+    bool pathSpecTypeSupported(ZYRStd::eZYRPathSpecType) const override { return false; }
+    const void* getPathSpec(ZYRStd::eZYRPathSpecType, unsigned int*) const override {
+        return nullptr;
+    }
+    const ZYRStd::CZYRWString* getFullPath() const override { return nullptr; }
+    IZYRFileName* clone() const override { return new PathlessName; }
+};
+
+// Installs the host kit's factory and a file system over a fresh directory; `host` routes
+// file streams through the host-procedure record.
+class FileSysFixture {
+public:
+    explicit FileSysFixture(bool host) : host_(host), record_(ZYRHostKit::posixFileProcs()) {
+        ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
+        ZYRStd::ZYRStdInit_SetZYRFactoryProc(ZYRHostKit::posixFileNameFactory);
+        fileSys_ = ZYRFileSys::createDefaultFileSystem(
+            ZYRStd::CZYRUniString(), ZYRStd::CZYRUniString(), host ? &record_ : nullptr);
+        installed_ = fileSys_;
+        ZYRStd::ZYRStdInit_SetDefaultFileSysProc([] { return installed_; });
+    }
+    ~FileSysFixture() {
+        ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
+        ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
+        installed_ = nullptr;
+        delete fileSys_;
+    }
+
+    CZYRSmartZYRRefPtr<IZYRFStream> open(const std::string& path, unsigned int mode) {
+        return CZYRFileSys::createFileStream(CZYRFileName(path.c_str()), mode, host_);
+    }
+
+    static inline ZYRFileSys::IZYRFileSys* installed_ = nullptr;
+    bool host_;
+    ZYRPublic::_t_ZYRPDLFileSysRec record_;
+    ZYRFileSys::IZYRFileSys* fileSys_ = nullptr;
+    zyrtest::TempDir dir_;
+};
+
+// ---- without a file system or factory -------------------------------------------------------
+
+TEST(CZYRFileSysTest, NothingInstalled) {
+    ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
+    ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
+    expectError([] { CZYRFileSys::fileExists(CZYRFileName()); },
+                ZYRPublic::kZYRErrorFileSystemNotInitialized,
+                "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method",
+                "source/zyr/std/CZYRFileSys");
+    ZYRStd::ZYRStdInit_SetDefaultFileSysProc([]() -> ZYRFileSys::IZYRFileSys* { return nullptr; });
+    expectError([] { CZYRFileSys::getTempDirName(); }, ZYRPublic::kZYRErrorFileSystemNotInitialized,
+                "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method",
+                "source/zyr/std/CZYRFileSys");
+    ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
+    expectError([] { CZYRFileName name("/tmp/x"); }, ZYRPublic::kZYRErrorFatal,
+                "ZYRFactory Proc not set in ZYRStd", "source/zyr/std/ZYRStdInit");
+}
+
+TEST(CZYRFileSysTest, FileNameCountsAndForwards) {
+    auto* raw = new ZYRHostKit::CPosixFileName(ZYRStd::CZYRWString(u"/a/b/c.txt"));
+    raw->addRef(); // ours, kept across the wrappers below
+    { CZYRFileName adopting(raw, false); }
+    EXPECT_EQ(raw->peekRefCnt(), 1) << "adopting takes over a reference";
+    {
+        CZYRFileName sharing(raw, true);
+        CZYRFileName copy(sharing);
+        EXPECT_EQ(raw->peekRefCnt(), 3);
+        EXPECT_TRUE(copy.getWStringPath() == ZYRStd::CZYRWString(u"/a/b/c.txt"));
+        EXPECT_TRUE(copy.getFileDirPath() == ZYRStd::CZYRWString(u"/a/b"));
+        EXPECT_TRUE(copy.getFileName() == ZYRStd::CZYRWString(u"c.txt"));
+        EXPECT_STREQ(copy.getFileDirPathInZYRString().c_str(), "/a/b");
+        EXPECT_FALSE(copy.isEmpty());
+        unsigned int length = 0;
+        EXPECT_STREQ(static_cast<const char*>(copy.getPathSpec(ZYRHostKit::kPathSpecUTF8, &length)),
+                     "/a/b/c.txt");
+        EXPECT_EQ(length, 10u);
+        CZYRFileName clone = copy.clone();
+        EXPECT_NE(static_cast<ZYRFileName::IZYRFileName*>(clone), raw);
+        EXPECT_EQ(static_cast<ZYRFileName::IZYRFileName*>(clone)->peekRefCnt(), 1)
+            << "the clone's reference is adopted, not doubled";
+    }
+    EXPECT_EQ(raw->peekRefCnt(), 1);
+    raw->release();
+
+    CZYRFileName pathless(new PathlessName, false);
+    EXPECT_TRUE(pathless.getWStringPath().empty());
+    CZYRFileName none;
+    EXPECT_TRUE(none.isEmpty());
+    expectError([&] { none.getWStringPath(); }, ZYRPublic::kZYRErrorInvalidObject, "Null object",
+                "source/zyr/std/CZYRFileSys");
+}
+
+TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
+    zyrtest::TempDir dir;
+    // 245 characters in all is the longest accepted name.
+    std::string longest = dir.path() + "/";
+    longest += std::string(245 - longest.size(), 'd');
+    const std::string cache = dir.file("cache");
+    ZYRFileSys::IZYRFileSys* fs = ZYRFileSys::createDefaultFileSystem(
+        ZYRStd::CZYRUniString(longest.c_str()), ZYRStd::CZYRUniString(cache.c_str()), nullptr);
+    ASSERT_NE(fs, nullptr);
+    EXPECT_TRUE(exists(longest));
+    EXPECT_TRUE(exists(cache));
+    EXPECT_EQ(utf8(fs->getTempDirName()), longest);
+    EXPECT_EQ(utf8(fs->getDLCacheDirName()), cache);
+    delete fs;
+    // Existing directories are fine.
+    delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(longest.c_str()),
+                                               ZYRStd::CZYRUniString(cache.c_str()), nullptr);
+
+    const std::string tooLong = longest + "x";
+    expectError(
+        [&] {
+            ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(tooLong.c_str()),
+                                                ZYRStd::CZYRUniString(), nullptr);
+        },
+        ZYRPublic::kZYRErrorLimitCheck, "temp dir filename too long", kWindowsSource);
+    expectError(
+        [&] {
+            ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(),
+                                                ZYRStd::CZYRUniString(tooLong.c_str()), nullptr);
+        },
+        ZYRPublic::kZYRErrorLimitCheck, "DL Cache dir filename too long", kWindowsSource);
+    const std::string twoLevels = dir.file("missing/child");
+    expectError(
+        [&] {
+            ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(twoLevels.c_str()),
+                                                ZYRStd::CZYRUniString(), nullptr);
+        },
+        ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed", kWindowsSource);
+}
+
+// ---- file streams through both file systems -------------------------------------------------
+
+class FileStreamTest : public ::testing::TestWithParam<bool> {
+protected:
+    FileSysFixture fx_{GetParam()};
+    const char* source() const { return GetParam() ? kHostSource : kWindowsSource; }
+};
+
+TEST_P(FileStreamTest, OpenModesAndTransfers) {
+    const std::string path = fx_.dir_.file("data.bin");
+    writeFile(path, "0123456789");
+
+    {
+        auto s = fx_.open(path, kZYRStreamRead | kZYRStreamWrite);
+        ASSERT_TRUE(s && s->isOpen());
+        EXPECT_EQ(s->getSize(), 10u) << "read-write keeps the content";
+        EXPECT_EQ(s->getEOF(), 10u);
+        EXPECT_EQ(utf8(s->getFilePath()), path);
+        EXPECT_EQ(s->getCapacity(), ~0ull);
+        char buf[4] = {};
+        EXPECT_EQ(s->read(buf, 2, 2), 4u);
+        EXPECT_EQ(std::string(buf, 4), "0123");
+        EXPECT_EQ(s->getPos(), 4u);
+        EXPECT_EQ(s->write("AB", 1, 2), 2u);
+        EXPECT_EQ(s->setPos(8), 8u);
+        EXPECT_EQ(s->read(buf, 1, 4), 2u) << "a short read is the end of the file";
+        s->setEOF();
+        EXPECT_EQ(s->getPos(), 10u);
+        s->setPos(3);
+        EXPECT_TRUE(s->truncate());
+        EXPECT_EQ(s->getSize(), 3u);
+        s->close();
+        EXPECT_FALSE(s->isOpen());
+    }
+    EXPECT_EQ(readFile(path), "012");
+
+    {
+        auto s = fx_.open(path, kZYRStreamAppend);
+        ASSERT_TRUE(s->isOpen());
+        EXPECT_EQ(s->write("xy", 1, 2), 2u);
+        char c;
+        EXPECT_THROW(s->read(&c, 1, 1), CZYRError);
+    }
+    EXPECT_EQ(readFile(path), "012xy") << "append writes at the end";
+
+    {
+        auto s = fx_.open(path, kZYRStreamWrite | kZYRStreamTruncate);
+        ASSERT_TRUE(s->isOpen());
+        EXPECT_EQ(s->getSize(), 0u);
+        s->write("new", 1, 3);
+        s->reOpen(kZYRStreamRead);
+        char buf[8] = {};
+        EXPECT_EQ(s->read(buf, 1, 8), 3u);
+        EXPECT_EQ(std::string(buf, 3), "new");
+        EXPECT_EQ(s->getAccessMode(), kZYRStreamRead);
+    }
+
+    if (!GetParam()) {
+        // What write-only means to a host file is the host's choice; natively it empties.
+        auto s = fx_.open(path, kZYRStreamWrite);
+        ASSERT_TRUE(s->isOpen());
+        s->write("n", 1, 1);
+        s->close();
+        EXPECT_EQ(readFile(path), "n");
+    }
+
+    const std::string created = fx_.dir_.file("created.bin");
+    {
+        auto s = fx_.open(created, kZYRStreamWrite | kZYRStreamTruncate);
+        ASSERT_TRUE(s->isOpen());
+        s->write("abc", 1, 3);
+    }
+    EXPECT_EQ(readFile(created), "abc");
+
+    const std::string temporary = fx_.dir_.file("gone.tmp");
+    {
+        auto s = fx_.open(temporary, kZYRStreamRead | kZYRStreamWrite | kZYRStreamDeleteOnClose);
+        ASSERT_TRUE(s->isOpen());
+        s->write("x", 1, 1);
+        EXPECT_TRUE(exists(temporary));
+    }
+    EXPECT_FALSE(exists(temporary)) << "deleted when its last handle closed";
+
+    auto doomed = fx_.open(created, kZYRStreamRead);
+    doomed->removeFile();
+    EXPECT_FALSE(exists(created));
+}
+
+TEST_P(FileStreamTest, FilesThatDoNotOpen) {
+    auto missing = fx_.open(fx_.dir_.file("missing.txt"), kZYRStreamRead);
+    ASSERT_TRUE(missing);
+    EXPECT_FALSE(missing->isOpen()) << "the stream exists, the file did not open";
+    char c;
+    expectError([&] { missing->read(&c, 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
+                GetParam() ? "Error reading file" : "error reading from file", source());
+    ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
+    EXPECT_EQ(missing->read(&c, 1, 1, err), 0u);
+    EXPECT_EQ(err, ZYRPublic::kZYRErrorFileOpFailed);
+    expectError([&] { missing->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+                "stream is not writable", kWindowsSource);
+
+    auto directory = fx_.open(fx_.dir_.path(), kZYRStreamRead);
+    if (!GetParam()) {
+        EXPECT_FALSE(directory->isOpen()) << "a directory is not a file";
+    }
+}
+
+TEST_P(FileStreamTest, TemporaryFiles) {
+    auto s = CZYRFileSys::createTmpFileStream(CZYRFileName(fx_.dir_.path().c_str()), u"zyrtemp",
+                                              kZYRStreamRead | kZYRStreamWrite);
+    ASSERT_TRUE(s && s->isOpen());
+    const std::string path = utf8(s->getFilePath());
+    EXPECT_EQ(path.rfind(fx_.dir_.path() + "/", 0), 0u) << path;
+    EXPECT_EQ(path.find("/zyr", fx_.dir_.path().size()), fx_.dir_.path().size()) << path;
+    EXPECT_TRUE(exists(path));
+    EXPECT_EQ(s->getSize(), 0u);
+    s->write("tmp", 1, 3);
+    s->close();
+    EXPECT_EQ(readFile(path), "tmp");
+
+    auto other = CZYRFileSys::createTmpFileStream(CZYRFileName(fx_.dir_.path().c_str()), u"zyr",
+                                                  kZYRStreamWrite | kZYRStreamDeleteOnClose);
+    ASSERT_TRUE(other && other->isOpen());
+    const std::string otherPath = utf8(other->getFilePath());
+    EXPECT_NE(otherPath, path) << "each temporary file is new";
+    other->close();
+    EXPECT_FALSE(exists(otherPath));
+
+    if (!GetParam()) {
+        const std::string nowhere = fx_.dir_.file("no/such/dir");
+        expectError(
+            [&] {
+                CZYRFileSys::createTmpFileStream(CZYRFileName(nowhere.c_str()), u"x",
+                                                 kZYRStreamWrite);
+            },
+            ZYRPublic::kZYRErrorFileOpFailed, "File rename failed", kWindowsSource);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(NativeAndHost, FileStreamTest, ::testing::Values(false, true),
+                         [](const ::testing::TestParamInfo<bool>& info) {
+                             return info.param ? "Host" : "Native";
+                         });
+
+// ---- the host record's missing procedures ---------------------------------------------------
+
+TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
+    FileSysFixture fx(true);
+    const std::string path = fx.dir_.file("host.txt");
+    writeFile(path, "host");
+
+    fx.record_.open64 = nullptr;
+    auto unopened = fx.open(path, kZYRStreamRead);
+    ASSERT_TRUE(unopened);
+    EXPECT_FALSE(unopened->isOpen());
+    EXPECT_EQ(utf8(unopened->getFilePath()), path) << "the text comes from the host";
+    expectError([&] { unopened->reOpen(kZYRStreamRead); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+                "open64 proc not defined", kHostSource);
+    fx.record_ = ZYRHostKit::posixFileProcs();
+
+    fx.record_.diPathToPath = nullptr;
+    auto fileless = fx.open(path, kZYRStreamRead);
+    ASSERT_TRUE(fileless);
+    EXPECT_FALSE(fileless->isOpen());
+    char c;
+    expectError([&] { fileless->read(&c, 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
+                "file stm not open", kWindowsSource);
+    fx.record_ = ZYRHostKit::posixFileProcs();
+
+    fx.record_.wPathToDIPath = nullptr;
+    auto narrow = fx.open(path, kZYRStreamRead);
+    ASSERT_TRUE(narrow && narrow->isOpen()) << "the narrow procedure stands in";
+    fx.record_.pathToDIPath = nullptr;
+    expectError([&] { fx.open(path, kZYRStreamRead); }, ZYRPublic::kZYRErrorFileOpFailed,
+                "pathFromDIPath not implemented", kWindowsSource);
+    fx.record_ = ZYRHostKit::posixFileProcs();
+
+    fx.record_.flush = nullptr;
+    auto s = fx.open(path, kZYRStreamRead);
+    expectError([&] { s->flush(); }, ZYRPublic::kZYRErrorInvalidFuncCall, "flush proc not defined",
+                kHostSource);
+    fx.record_.getpos64 = nullptr;
+    expectError([&] { s->getPos(); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+                "getpos64 proc not defined", kHostSource);
+    fx.record_ = ZYRHostKit::posixFileProcs();
+
+    // A path the host cannot turn into a DI path gives no stream.
+    EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true));
+}
+
+// ---- file operations ------------------------------------------------------------------------
+
+class FileOperationsTest : public ::testing::Test {
+protected:
+    CZYRFileName name(const std::string& leaf) const {
+        return CZYRFileName(fx_.dir_.file(leaf).c_str());
+    }
+    FileSysFixture fx_{false};
+};
+
+TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
+    const std::string a = fx_.dir_.file("a.txt"), b = fx_.dir_.file("b.txt");
+    writeFile(a, "alpha");
+    EXPECT_TRUE(CZYRFileSys::fileExists(name("a.txt")));
+    EXPECT_FALSE(CZYRFileSys::fileExists(name("b.txt")));
+    EXPECT_FALSE(CZYRFileSys::fileExists(CZYRFileName("")));
+
+    CZYRFileSys::copy(name("a.txt"), name("b.txt"), true);
+    EXPECT_EQ(readFile(b), "alpha");
+    expectError([&] { CZYRFileSys::copy(name("a.txt"), name("b.txt"), true); },
+                ZYRPublic::kZYRErrorFileOpFailed, "File copy failed", kWindowsSource);
+    writeFile(a, "beta");
+    CZYRFileSys::copy(name("a.txt"), name("b.txt"), false);
+    EXPECT_EQ(readFile(b), "beta");
+    expectError([&] { CZYRFileSys::copy(name("a.txt"), name("a.txt"), false); },
+                ZYRPublic::kZYRErrorFileOpFailed, "File copy failed", kWindowsSource);
+    EXPECT_EQ(readFile(a), "beta") << "copying a file onto itself must not empty it";
+    expectError([&] { CZYRFileSys::copy(name("none"), name("c.txt"), false); },
+                ZYRPublic::kZYRErrorFileOpFailed, "File copy failed", kWindowsSource);
+    EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
+    CZYRFileSys::copy(CZYRFileName(""), name("c.txt"), false); // an empty path does nothing
+
+    expectError([&] { CZYRFileSys::rename(name("a.txt"), name("b.txt")); },
+                ZYRPublic::kZYRErrorFileOpFailed, "File rename failed", kWindowsSource);
+    EXPECT_EQ(readFile(b), "beta") << "an existing target is not replaced";
+    CZYRFileSys::rename(name("a.txt"), name("c.txt"));
+    EXPECT_FALSE(exists(a));
+    EXPECT_EQ(readFile(fx_.dir_.file("c.txt")), "beta");
+    expectError([&] { CZYRFileSys::rename(name("a.txt"), name("d.txt")); },
+                ZYRPublic::kZYRErrorFileOpFailed, "File rename failed", kWindowsSource);
+
+    CZYRFileSys::remove(name("c.txt"), false);
+    EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
+    CZYRFileSys::remove(name("c.txt"), true);
+    expectError([&] { CZYRFileSys::remove(name("c.txt"), false); },
+                ZYRPublic::kZYRErrorFileOpFailed, "File delete failed", kWindowsSource);
+
+    EXPECT_TRUE(CZYRFileSys::isSameFile(name("x"), name("x")));
+    EXPECT_FALSE(
+        CZYRFileSys::isSameFile(name("x"), CZYRFileName((fx_.dir_.path() + "/./x").c_str())))
+        << "texts only, no normalisation";
+}
+
+TEST_F(FileOperationsTest, MakeDirectory) {
+    CZYRFileSys::makeDirectory(name("sub"));
+    struct stat st;
+    ASSERT_EQ(::stat(fx_.dir_.file("sub").c_str(), &st), 0);
+    EXPECT_TRUE(S_ISDIR(st.st_mode));
+    CZYRFileSys::makeDirectory(name("sub")); // exists: nothing to do
+    expectError([&] { CZYRFileSys::makeDirectory(name("no/such")); },
+                ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed", kWindowsSource);
+    expectError([&] { CZYRFileSys::makeDirectory(CZYRFileName("")); },
+                ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed empty filename",
+                kWindowsSource);
+}
+
+// Collects what an enumeration reports.
+class Collector : public ZYRFileSys::IDirEnumCBProc {
+public:
+    explicit Collector(size_t stopAfter = ~size_t{0}) : stopAfter_(stopAfter) {}
+    bool operator()(const ZYRStd::CZYRUniString& path, unsigned int attributes) override {
+        entries.emplace_back(utf8(path), attributes);
+        return entries.size() < stopAfter_;
+    }
+    std::vector<std::pair<std::string, unsigned int>> entries;
+
+private:
+    size_t stopAfter_;
+};
+
+TEST_F(FileOperationsTest, EnumDirectory) {
+    const std::string root = fx_.dir_.file("tree");
+    ::mkdir(root.c_str(), 0777);
+    ::mkdir((root + "/inner").c_str(), 0777);
+    writeFile(root + "/plain", "p");
+    writeFile(root + "/.hidden", "h");
+    writeFile(root + "/...", "dots"); // an ordinary name on POSIX
+    writeFile(root + "/locked", "l");
+    ::chmod((root + "/locked").c_str(), 0444);
+
+    Collector plain, slashed;
+    EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(root.c_str()), plain));
+    EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName((root + "/").c_str()), slashed));
+    std::sort(plain.entries.begin(), plain.entries.end());
+    std::sort(slashed.entries.begin(), slashed.entries.end());
+    EXPECT_EQ(plain.entries, slashed.entries) << "a trailing separator changes nothing";
+    const std::vector<std::pair<std::string, unsigned int>> expected{
+        {root + "/...", ZYRFileSys::kZYRFileAttrHidden},
+        {root + "/.hidden", ZYRFileSys::kZYRFileAttrHidden},
+        {root + "/inner", ZYRFileSys::kZYRFileAttrDirectory},
+        {root + "/locked", ZYRFileSys::kZYRFileAttrReadOnly},
+        {root + "/plain", 0},
+    };
+    EXPECT_EQ(plain.entries, expected);
+
+    Collector first(1);
+    EXPECT_FALSE(CZYRFileSys::enumDirectory(CZYRFileName(root.c_str()), first));
+    EXPECT_EQ(first.entries.size(), 1u) << "false stops the enumeration";
+
+    const std::string empty = fx_.dir_.file("empty");
+    ::mkdir(empty.c_str(), 0777);
+    Collector none;
+    EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(empty.c_str()), none));
+    EXPECT_TRUE(none.entries.empty());
+
+    Collector ignored;
+    expectError([&] { CZYRFileSys::enumDirectory(name("missing"), ignored); },
+                ZYRPublic::kZYRErrorFileOpFailed, "Directory enum failed", kWindowsSource);
+    expectError([&] { CZYRFileSys::enumDirectory(CZYRFileName(""), ignored); },
+                ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed empty filename",
+                kWindowsSource);
+    if (::geteuid() != 0) {
+        ::chmod(empty.c_str(), 0);
+        expectError([&] { CZYRFileSys::enumDirectory(CZYRFileName(empty.c_str()), ignored); },
+                    ZYRPublic::kZYRErrorFileOpFailed, "Directory enum failed", kWindowsSource);
+        ::chmod(empty.c_str(), 0700);
+    }
+}
+
+// ---- mapped file streams --------------------------------------------------------------------
+
+TEST_F(FileOperationsTest, MappedStreams) {
+    const std::string path = fx_.dir_.file("mapped.bin");
+    std::string content(10000, '\0');
+    for (size_t i = 0; i < content.size(); ++i)
+        content[i] = static_cast<char>('a' + i % 26);
+    writeFile(path, content);
+
+    {
+        ZYRStd::CZYRMemMapFStream whole(name("mapped.bin"), kZYRStreamRead, 0, 0);
+        ASSERT_TRUE(whole.isMapped());
+        EXPECT_TRUE(whole.isOpen());
+        EXPECT_EQ(whole.getSize(), content.size());
+        EXPECT_EQ(whole.getCapacity(), content.size());
+        std::string back(content.size(), '\0');
+        EXPECT_EQ(whole.read(back.data(), 1, 20000), content.size());
+        EXPECT_EQ(back, content);
+        expectError([&] { whole.write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+                    "stream is not writable", "source/zyr/std/IImpZYRMemStream");
+
+        whole.close();
+        EXPECT_FALSE(whole.isMapped());
+        char c;
+        expectError([&] { whole.read(&c, 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
+                    "file stm not mapped", kWindowsSource);
+        ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
+        EXPECT_EQ(whole.read(&c, 1, 1, err), 0u);
+        EXPECT_EQ(err, ZYRPublic::kZYRErrorFileOpFailed);
+        EXPECT_EQ(whole.getSize(), 0u);
+        EXPECT_EQ(whole.getCapacity(), 0u);
+        unsigned long long offset = 1;
+        unsigned int length = 1;
+        EXPECT_EQ(whole.getMapAttributes(offset, length), nullptr);
+        EXPECT_EQ(offset, 0u);
+        EXPECT_EQ(length, 0u);
+
+        whole.reOpen(kZYRStreamRead);
+        ASSERT_TRUE(whole.isMapped()) << "a closed stream maps again on reOpen";
+        EXPECT_EQ(whole.read(&c, 1, 1), 1u);
+        EXPECT_EQ(c, 'a');
+    }
+
+    {
+        // Not on a page boundary: the stream starts at the requested byte anyway.
+        ZYRStd::CZYRMemMapFStream window(name("mapped.bin"), kZYRStreamRead, 4099, 100);
+        unsigned long long offset = 0;
+        unsigned int length = 0;
+        const char* base = static_cast<const char*>(window.getMapAttributes(offset, length));
+        EXPECT_EQ(offset, 4099u);
+        EXPECT_EQ(length, 100u);
+        EXPECT_EQ(std::string(base, 100), content.substr(4099, 100));
+        char buf[100];
+        EXPECT_EQ(window.read(buf, 1, 100), 100u);
+        EXPECT_EQ(std::string(buf, 100), content.substr(4099, 100));
+        EXPECT_EQ(window.getSize(), 100u);
+    }
+
+    expectError(
+        [&] { ZYRStd::CZYRMemMapFStream past(name("mapped.bin"), kZYRStreamRead, 9990, 100); },
+        ZYRPublic::kZYRErrorFileOpFailed, "error mapping view of file", kWindowsSource);
+
+    {
+        // A writable view past the end grows the file; the bytes reach it.
+        ZYRStd::CZYRMemMapFStream out(name("grown.bin"), kZYRStreamRead | kZYRStreamWrite, 100, 8);
+        ASSERT_TRUE(out.isMapped());
+        EXPECT_EQ(out.getSize(), 8u) << "readable: the whole window is the content";
+        out.write("ABCDEFGH", 1, 8);
+        out.flush();
+    }
+    const std::string grown = readFile(fx_.dir_.file("grown.bin"));
+    ASSERT_EQ(grown.size(), 108u);
+    EXPECT_EQ(grown.substr(100), "ABCDEFGH");
+
+    writeFile(fx_.dir_.file("empty.bin"), "");
+    expectError([&] { ZYRStd::CZYRMemMapFStream e(name("empty.bin"), kZYRStreamRead, 0, 0); },
+                ZYRPublic::kZYRErrorFileOpFailed, "Error mapping empty file", kWindowsSource);
+    expectError([&] { ZYRStd::CZYRMemMapFStream m(name("missing.bin"), kZYRStreamRead, 0, 0); },
+                ZYRPublic::kZYRErrorFileOpFailed, "error opening file", kWindowsSource);
+}
+
+} // namespace

@@ -1,0 +1,441 @@
+// Tests of the ASCII85 and ASCIIHex encoders and decoders over memory streams, and of the
+// encoded text against an independent implementation (Python's base64 module).
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <fcntl.h>
+#include <fstream>
+#include <iterator>
+#include <random>
+#include <spawn.h>
+#include <string>
+#include <sys/wait.h>
+#include <vector>
+
+#include "TestSupport.h"
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/CZYRStreamsFilterASCII85.h"
+#include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
+#include "zyr/std/IImpZYRMemStream.h"
+
+extern char** environ;
+
+namespace {
+
+using namespace ZYRStreams;
+using namespace std::string_literals;
+using ZYRFileSys::IImpZYRMemStream;
+using ZYRStd::CZYRError;
+using ZYRStd::CZYRSmartZYRRefPtr;
+using ZYRStd::CZYRStreamFilterASCII85;
+using ZYRStd::CZYRStreamFilterASCII85Decode;
+using ZYRStd::CZYRStreamFilterASCIIHEX;
+using ZYRStd::CZYRStreamFilterASCIIHEXDecode;
+
+using Stream = CZYRSmartZYRRefPtr<IImpZYRMemStream>;
+
+Stream sink(unsigned int capacity = 1 << 20) {
+    return Stream(new IImpZYRMemStream(kZYRStreamRead | kZYRStreamWrite, capacity, nullptr));
+}
+
+std::string contents(const Stream& s) {
+    return std::string(reinterpret_cast<const char*>(s->data()), s->getEOF());
+}
+
+// A stream over a copy of `text`, kept alive by the returned stream's buffer.
+Stream source(const std::string& text) {
+    Stream s = sink(static_cast<unsigned int>(text.size()) + 1);
+    s->write(text.data(), 1, static_cast<unsigned int>(text.size()));
+    s->setPos(0);
+    return s;
+}
+
+std::string randomBytes(size_t n, unsigned int seed, bool zeroRuns = false) {
+    std::mt19937 random(seed);
+    std::string out(n, '\0');
+    for (size_t i = 0; i < n; ++i)
+        out[i] = (zeroRuns && (i / 8) % 3 == 0) ? '\0' : static_cast<char>(random());
+    return out;
+}
+
+std::string encode85(const std::string& bytes, const char* prefix = nullptr,
+                     const char* eod = nullptr, bool allowZ = true, size_t chunk = 0) {
+    Stream out = sink();
+    {
+        CZYRStreamFilterASCII85 filter(CZYRSmartZYRRefPtr<IZYRStream>(out), prefix, eod, allowZ);
+        const size_t step = chunk ? chunk : std::max<size_t>(bytes.size(), 1);
+        for (size_t at = 0; at < bytes.size(); at += step) {
+            const size_t n = std::min(step, bytes.size() - at);
+            EXPECT_EQ(filter.write(bytes.data() + at, 1, static_cast<unsigned int>(n)), n);
+        }
+        filter.close();
+    }
+    return contents(out);
+}
+
+std::string encodeHex(const std::string& bytes, const char* prefix = nullptr,
+                      const char* eod = nullptr, size_t chunk = 0) {
+    Stream out = sink();
+    {
+        CZYRStreamFilterASCIIHEX filter(CZYRSmartZYRRefPtr<IZYRStream>(out), prefix, eod);
+        const size_t step = chunk ? chunk : std::max<size_t>(bytes.size(), 1);
+        for (size_t at = 0; at < bytes.size(); at += step) {
+            const size_t n = std::min(step, bytes.size() - at);
+            filter.write(bytes.data() + at, 1, static_cast<unsigned int>(n));
+        }
+        filter.close();
+    }
+    return contents(out);
+}
+
+// Decodes through reads of `step` bytes, to cross every buffer boundary.
+template <class Decoder> std::string decode(const std::string& text, unsigned int step = 4096) {
+    Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
+    std::string out;
+    std::vector<char> buf(step);
+    for (;;) {
+        const unsigned int got = decoder.read(buf.data(), 1, step);
+        out.append(buf.data(), got);
+        if (got < step)
+            break;
+    }
+    EXPECT_TRUE(decoder.isAtEOD());
+    EXPECT_EQ(decoder.read(buf.data(), 1, step), 0u);
+    return out;
+}
+
+std::string decode85(const std::string& text, unsigned int step = 4096) {
+    return decode<CZYRStreamFilterASCII85Decode>(text, step);
+}
+
+std::string decodeHex(const std::string& text, unsigned int step = 4096) {
+    return decode<CZYRStreamFilterASCIIHEXDecode>(text, step);
+}
+
+// The decoder's error for `text`: its type and message.
+template <class Decoder> std::string decodeError(const std::string& text) {
+    Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
+    char buf[64];
+    try {
+        while (decoder.read(buf, 1, sizeof buf) > 0) {
+        }
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInvalidData);
+        const std::string first = e.getMessage();
+        try {
+            decoder.read(buf, 1, sizeof buf);
+            ADD_FAILURE() << "a failed decoder must keep failing";
+        } catch (const CZYRError& again) {
+            EXPECT_EQ(first, again.getMessage());
+        }
+        return first;
+    }
+    return "(no error)";
+}
+
+// ---- ASCII85 encoder ------------------------------------------------------------------------
+
+TEST(CZYRStreamsFilterTest, ASCII85Layout) {
+    EXPECT_EQ(encode85(std::string(4, '\0')), "!!!!!~>\r\n") << "a full group at close is never z";
+    EXPECT_EQ(encode85(std::string(8, '\0')), "z!!!!!~>\r\n");
+    EXPECT_EQ(encode85(std::string(8, '\0'), nullptr, nullptr, false), "!!!!!!!!!!~>\r\n");
+    EXPECT_EQ(encode85("A"), "5l~>\r\n");
+    EXPECT_EQ(encode85(""), "") << "nothing written, nothing at all, not even the marker";
+    EXPECT_EQ(encode85("Man is", "  ", "EOD"), "  9jqo^BlaEOD\r\n");
+
+    const std::string nonzero(64, '\x7f');
+    const std::string text = encode85(nonzero);
+    ASSERT_EQ(text.size(), 80u + 2 + 2 + 2);
+    EXPECT_EQ(text.substr(80), "\r\n~>\r\n") << "80 digits, then the marker alone";
+
+    // 17 groups: the 17th does not fit the first line and starts the second.
+    const std::string seventeen = encode85(std::string(68, '\x7f') + "x");
+    EXPECT_EQ(seventeen.find("\r\n"), 80u);
+
+    // A group split over two lines: one 'z' first moves every group by one character.
+    const std::string group = text.substr(0, 5); // the digits of 7f7f7f7f
+    const std::string split = encode85(std::string(4, '\0') + std::string(68, '\x7f'));
+    EXPECT_EQ(split.find("\r\n"), 80u);
+    EXPECT_EQ(split.substr(76, 4) + split.substr(82, 1), group);
+
+    // At close, the split never leaves a single character for the next line. `zeros` 'z'
+    // characters and 15 groups of digits come first; then "A" gives the final "5l".
+    auto closing = [](unsigned int zeros, const char* eod, const std::string& last = "A") {
+        return encode85(std::string(4 * zeros, '\0') + std::string(60, '\x7f') + last, nullptr,
+                        eod);
+    };
+    auto lines = [&](const std::string& t) {
+        const size_t end = t.find("\r\n");
+        return std::make_pair(t.substr(end - 5, 5), t.substr(end + 2));
+    };
+    // 77 characters, then "5l~>": 3 would fit and leave ">" alone, so "~>" goes on whole.
+    EXPECT_EQ(lines(closing(2, nullptr)), std::make_pair(group.substr(2) + "5l", "~>\r\n"s));
+    EXPECT_EQ(closing(2, nullptr).find("\r\n"), 79u);
+    // 78: 2 fit, 2 go on.
+    EXPECT_EQ(lines(closing(3, nullptr)), std::make_pair(group.substr(2) + "5l", "~>\r\n"s));
+    EXPECT_EQ(closing(3, nullptr).find("\r\n"), 80u);
+    // 79: 1 fits, 3 go on.
+    EXPECT_EQ(lines(closing(4, nullptr)), std::make_pair(group.substr(1) + "5", "l~>\r\n"s));
+    // 79, then "5l": the split would leave "l" alone, so both go on.
+    EXPECT_EQ(lines(closing(4, "")).second, "5l\r\n");
+    EXPECT_EQ(closing(4, "").find("\r\n"), 79u);
+    // 78, then "5l~": "~" would be alone, so "l~" goes on.
+    EXPECT_EQ(lines(closing(3, "~")).second, "l~\r\n");
+    // 79, then three digits and "~>": 1 fits, 4 go on.
+    EXPECT_EQ(lines(closing(4, nullptr, "AB")).second.size(), 4u + 2);
+}
+
+TEST(CZYRStreamsFilterTest, ASCII85ArgumentsAndFailures) {
+    Stream out = sink();
+    const CZYRSmartZYRRefPtr<IZYRStream> target(out);
+    EXPECT_NO_THROW(CZYRStreamFilterASCII85(target, "ab", "12345678901234"));
+    try {
+        CZYRStreamFilterASCII85 f(target, nullptr, "123456789012345");
+        ADD_FAILURE();
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorBadParam);
+        EXPECT_STREQ(e.getMessage(),
+                     "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long");
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCII85");
+    }
+    try {
+        CZYRStreamFilterASCII85 f(target, "abc", nullptr);
+        ADD_FAILURE();
+    } catch (const CZYRError& e) {
+        EXPECT_STREQ(e.getMessage(),
+                     "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long");
+    }
+
+    CZYRStreamFilterASCII85 filter(target, nullptr, nullptr, true);
+    EXPECT_STREQ(filter.getFilterName(), "ASCII85");
+    EXPECT_EQ(filter.getTargetStream().get(), target.get());
+    EXPECT_EQ(filter.write("", 1, 0), 0u);
+    {
+        CZYRStreamFilterASCII85 copy(filter);
+        EXPECT_EQ(target->peekRefCnt(), 4) << "ours, filter's, copy's, and the Stream's";
+    }
+    filter.write("abcd", 1, 4);
+    filter.close();
+    filter.close();
+    EXPECT_FALSE(filter.getTargetStream());
+    try {
+        filter.write("x", 1, 1);
+        ADD_FAILURE();
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorFileOpFailed);
+        EXPECT_STREQ(e.getMessage(), "CZYRStreamFilterASCII85::write - stream invalid");
+    }
+    ZYRStd::C_Error err;
+    EXPECT_EQ(filter.write("x", 1, 1, err), 0u);
+    EXPECT_EQ(err.getError(), ZYRPublic::kZYRErrorFileOpFailed);
+    EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCII85::write - stream invalid");
+    EXPECT_STREQ(err.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCII85");
+
+    // A target too small for the second line: the write fails, the target is dropped,
+    // and the destructor's close does not throw.
+    Stream small = sink(90);
+    {
+        CZYRStreamFilterASCII85 f{CZYRSmartZYRRefPtr<IZYRStream>(small)};
+        const std::string bytes(200, '\x7f');
+        ZYRStd::C_Error writeErr;
+        EXPECT_EQ(f.write(bytes.data(), 1, 200, writeErr), 0u);
+        EXPECT_EQ(writeErr.getError(), ZYRPublic::kZYRErrorInvalidData);
+        EXPECT_STREQ(writeErr.getMessage(), "write past end of stream");
+        EXPECT_FALSE(f.getTargetStream());
+        EXPECT_THROW(f.write("x", 1, 1), CZYRError);
+    }
+    EXPECT_EQ(small->peekRefCnt(), 1);
+}
+
+// ---- ASCIIHex encoder -----------------------------------------------------------------------
+
+TEST(CZYRStreamsFilterTest, ASCIIHexLayout) {
+    EXPECT_EQ(encodeHex(""), ">\r\n") << "the marker is written even without data";
+    EXPECT_EQ(encodeHex("", "  "), "  >\r\n");
+    EXPECT_EQ(encodeHex("\x01\xab\xff"), "01abff>\r\n");
+
+    const std::string bytes = randomBytes(41, 3);
+    std::string expectedDigits;
+    for (unsigned char c : bytes) {
+        static const char digits[] = "0123456789abcdef";
+        expectedDigits += digits[c >> 4];
+        expectedDigits += digits[c & 15];
+    }
+    const std::string text = encodeHex(bytes, "  ");
+    EXPECT_EQ(text,
+              "  " + expectedDigits.substr(0, 80) + "\r\n  " + expectedDigits.substr(80) + ">\r\n");
+    for (size_t chunk : {1, 3, 7, 40, 41})
+        EXPECT_EQ(encodeHex(bytes, "  ", nullptr, chunk), text) << "chunk " << chunk;
+
+    // 39 bytes fill 78 of 80 characters: a 3-character marker needs a line of its own.
+    const std::string full = encodeHex(randomBytes(39, 4), nullptr, "EOD");
+    EXPECT_EQ(full.substr(78), "\r\nEOD\r\n");
+    EXPECT_EQ(encodeHex(randomBytes(39, 4), nullptr, "E").substr(78), "E\r\n");
+
+    EXPECT_EQ(CZYRStreamFilterASCIIHEX::approximateEncodedLength(0, nullptr, nullptr), 83u);
+    EXPECT_EQ(CZYRStreamFilterASCIIHEX::approximateEncodedLength(40, "ab", "EOD"), 2u * 82 + 4 + 3);
+    for (unsigned int n : {0u, 1u, 39u, 40u, 41u, 1000u, 4096u})
+        EXPECT_GE(CZYRStreamFilterASCIIHEX::approximateEncodedLength(n, "ab", nullptr),
+                  encodeHex(randomBytes(n, n), "ab").size());
+    EXPECT_EQ(CZYRStreamFilterASCIIHEX::approximateEncodedLength(0xFFFFFFFFu, nullptr, nullptr),
+              0xFFFFFFFFu)
+        << "saturates rather than wrapping to a small size";
+
+    Stream out = sink();
+    try {
+        CZYRStreamFilterASCIIHEX f(CZYRSmartZYRRefPtr<IZYRStream>(out), "abc", nullptr);
+        ADD_FAILURE();
+    } catch (const CZYRError& e) {
+        EXPECT_STREQ(e.getMessage(),
+                     "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: prefix is too long");
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCIIHEX");
+    }
+    try {
+        CZYRStreamFilterASCIIHEX f(CZYRSmartZYRRefPtr<IZYRStream>(out), nullptr, "123456789012345");
+        ADD_FAILURE();
+    } catch (const CZYRError& e) {
+        EXPECT_STREQ(e.getMessage(),
+                     "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: eod is too long");
+    }
+    CZYRStreamFilterASCIIHEX closed{CZYRSmartZYRRefPtr<IZYRStream>(out)};
+    EXPECT_STREQ(closed.getFilterName(), "ASCIIHEX");
+    closed.close();
+    ZYRStd::C_Error err;
+    EXPECT_EQ(closed.write("x", 1, 1, err), 0u);
+    EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCIIHEX::write - stream invalid");
+    EXPECT_EQ(closed.write("x", 1, 1, err), 0u) << "an error already recorded stays";
+}
+
+// ---- decoders -------------------------------------------------------------------------------
+
+TEST(CZYRStreamsFilterTest, RoundTripsOfManyLengths) {
+    for (size_t n = 0; n < 300; ++n) {
+        for (bool zeros : {false, true}) {
+            const std::string bytes = randomBytes(n, static_cast<unsigned int>(n), zeros);
+            const std::string a85 = encode85(bytes, nullptr, nullptr, true, 1 + n % 7);
+            ASSERT_EQ(decode85(a85, 1 + n % 5), bytes) << n << " bytes: " << a85;
+            ASSERT_EQ(encode85(bytes, nullptr, nullptr, true, 1), a85)
+                << "byte by byte or in bulk, the same text";
+            const std::string hex = encodeHex(bytes, "  ", nullptr, 1 + n % 9);
+            ASSERT_EQ(decodeHex(hex, 1 + n % 5), bytes) << n << " bytes: " << hex;
+        }
+    }
+    for (size_t n : {4095u, 65536u, 65537u, 200001u}) {
+        const std::string bytes = randomBytes(n, 99, true);
+        EXPECT_EQ(decode85(encode85(bytes, "  ", nullptr, true)), bytes) << n;
+        EXPECT_EQ(decode85(encode85(bytes, nullptr, nullptr, false), 1000), bytes) << n;
+        EXPECT_EQ(decodeHex(encodeHex(bytes)), bytes) << n;
+    }
+}
+
+TEST(CZYRStreamsFilterTest, ASCII85DecodeRules) {
+    EXPECT_EQ(decode85("9jqo^BlbD-BleB1DJ+*+F(f,q~>"), "Man is distinguished");
+    EXPECT_EQ(decode85(" 9jq\no^\tBl\rbD-\f~ >"), "Man is d") << "white space anywhere";
+    EXPECT_EQ(decode85("<~9jqo^~>"), "Man ") << "Adobe's opening bracket";
+    EXPECT_EQ(decode85("z!!!!!~>"), std::string(8, '\0'));
+    EXPECT_EQ(decode85("5l~>"), "A");
+    EXPECT_EQ(decode85("5l"), "A") << "the end of the source ends the data";
+    EXPECT_EQ(decode85("~>garbage{"), "") << "nothing after the marker is read";
+    EXPECT_EQ(decode85("s8W-!~>"), "\xff\xff\xff\xff");
+    EXPECT_EQ(decode85(""), "");
+
+    using D = CZYRStreamFilterASCII85Decode;
+    EXPECT_EQ(decodeError<D>("9jqo^{"), "ASCII85Decode: invalid character 0x7B at offset 5");
+    EXPECT_EQ(decodeError<D>("9jz"), "ASCII85Decode: 'z' inside a group at offset 2");
+    EXPECT_EQ(decodeError<D>("9jqo^5~>"),
+              "ASCII85Decode: final group of one character at offset 5");
+    EXPECT_EQ(decodeError<D>("s8W-\"~>"), "ASCII85Decode: group out of range at offset 0");
+    EXPECT_EQ(decodeError<D>("9j~x"), "ASCII85Decode: '~' not followed by '>' at offset 2");
+    EXPECT_EQ(decodeError<D>("9j~"), "ASCII85Decode: '~' not followed by '>' at offset 2");
+
+    // The offset counts from the start of the encoded data across buffer refills.
+    std::string longText = encode85(randomBytes(100000, 5));
+    longText.insert(70000, "v");
+    EXPECT_EQ(decodeError<D>(longText), "ASCII85Decode: invalid character 0x76 at offset 70000");
+
+    ZYRStd::C_Error err;
+    D decoder(CZYRSmartZYRRefPtr<IZYRStream>(source("ab{")));
+    char buf[8];
+    EXPECT_EQ(decoder.read(buf, 1, 8, err), 0u);
+    EXPECT_EQ(err.getError(), ZYRPublic::kZYRErrorInvalidData);
+    EXPECT_STREQ(err.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCII85");
+    EXPECT_STREQ(decoder.getFilterName(), "ASCII85Decode");
+    decoder.close();
+    EXPECT_FALSE(decoder.getSourceStream());
+}
+
+TEST(CZYRStreamsFilterTest, ASCIIHexDecodeRules) {
+    EXPECT_EQ(decodeHex("4d616E>"), "Man");
+    EXPECT_EQ(decodeHex(" 4 d\r\n61\t6e\f>"), "Man");
+    EXPECT_EQ(decodeHex("4d6>"), "M`") << "an odd last digit is followed by 0";
+    EXPECT_EQ(decodeHex("4d6"), "M`");
+    EXPECT_EQ(decodeHex(">4d"), "");
+    EXPECT_EQ(decodeHex(""), "");
+
+    using D = CZYRStreamFilterASCIIHEXDecode;
+    EXPECT_EQ(decodeError<D>("4d6g>"), "ASCIIHexDecode: invalid character 0x67 at offset 3");
+    std::string longText = encodeHex(randomBytes(50000, 6));
+    longText.insert(70001, "~");
+    EXPECT_EQ(decodeError<D>(longText), "ASCIIHexDecode: invalid character 0x7E at offset 70001");
+}
+
+// ---- against Python's base64 ----------------------------------------------------------------
+
+// Runs python3 on `script` with `input` as standard input; empty optional when python3 is
+// not there.
+bool runPython(const std::string& script, const std::string& input, std::string& output,
+               const zyrtest::TempDir& dir) {
+    const std::string inPath = dir.file("py.in"), outPath = dir.file("py.out");
+    std::ofstream(inPath, std::ios::binary) << input;
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_addopen(&actions, 0, inPath.c_str(), O_RDONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, 1, outPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
+                                     0600);
+    std::string program = "python3", flag = "-c", code = script;
+    char* argv[] = {program.data(), flag.data(), code.data(), nullptr};
+    pid_t pid = 0;
+    const int spawned = posix_spawnp(&pid, "python3", &actions, nullptr, argv, environ);
+    posix_spawn_file_actions_destroy(&actions);
+    if (spawned != 0)
+        return false;
+    int status = 0;
+    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
+    }
+    std::ifstream in(outPath, std::ios::binary);
+    output.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+    return WIFEXITED(status) && WEXITSTATUS(status) == 0;
+}
+
+TEST(CZYRStreamsFilterTest, AgreesWithPythonBase64) {
+    zyrtest::TempDir dir;
+    std::string probe;
+    if (!runPython("pass", "", probe, dir))
+        GTEST_SKIP() << "python3 is not available";
+
+    const std::string bytes = randomBytes(5003, 11, true);
+    // Our text, decoded by Python: the marker ends the data, the line ends are white space.
+    std::string decoded;
+    ASSERT_TRUE(runPython("import sys,base64; d=sys.stdin.buffer.read().rstrip(b'\\r\\n');"
+                          "sys.stdout.buffer.write(base64.a85decode(b'<~'+d, adobe=True))",
+                          encode85(bytes), decoded, dir));
+    EXPECT_EQ(decoded, bytes);
+    ASSERT_TRUE(runPython("import sys,base64; d=sys.stdin.buffer.read();"
+                          "sys.stdout.buffer.write(base64.b16decode(d.replace(b'\\r\\n',b'')"
+                          ".rstrip(b'>'), casefold=True))",
+                          encodeHex(bytes), decoded, dir));
+    EXPECT_EQ(decoded, bytes);
+
+    // Python's text, decoded by us.
+    std::string text;
+    ASSERT_TRUE(runPython("import sys,base64; sys.stdout.buffer.write(base64.a85encode("
+                          "sys.stdin.buffer.read(), adobe=True, wrapcol=72))",
+                          bytes, text, dir));
+    EXPECT_EQ(decode85(text), bytes);
+    ASSERT_TRUE(runPython("import sys,base64; sys.stdout.buffer.write(base64.b16encode("
+                          "sys.stdin.buffer.read()))",
+                          bytes, text, dir));
+    EXPECT_EQ(decodeHex(text), bytes);
+}
+
+} // namespace
