@@ -258,10 +258,14 @@ public:
         if (dir.empty())
             dir = ZYRStd::CZYRWString(u".");
         errno = 0;
-        // The data is worth nothing until renamed into place, so no flush at close.
-        file_ = ZYRStd::CZYRFileSys::createTmpFileStream(ZYRStd::CZYRFileName(dir), u"zyr",
-                                                         kZYRStreamWrite | kZYRStreamTruncate |
-                                                             kZYRStreamNoFlushOnClose);
+        try {
+            // The data is worth nothing until renamed into place, so no flush at close.
+            file_ = ZYRStd::CZYRFileSys::createTmpFileStream(ZYRStd::CZYRFileName(dir), u"zyr",
+                                                             kZYRStreamWrite | kZYRStreamTruncate |
+                                                                 kZYRStreamNoFlushOnClose);
+        } catch (const CZYRError&) {
+            file_.reset();
+        }
         if (!file_ || !file_->isOpen()) {
             const int error = errno ? errno : EIO;
             failWith(*name + ": cannot create the output file: " + std::strerror(error));
