@@ -1,0 +1,250 @@
+// Sub-allocators and pools: many small blocks carved out of few large pieces.
+#pragma once
+
+#include <cstdint>
+#include <cstring>
+
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/I_VariableSizeAllocator.h"
+#include "zyr/std/redblack_tree.h"
+
+namespace ZYRStd {
+
+// Where VariableSizeAllocator and FixedSizeAllocator get their pages. Pieces must be at
+// least 8-byte aligned. When either procedure is null, both default to VirtualMemAlloc /
+// VirtualMemFree, so that a piece is never given back to a procedure that did not make it.
+using tZYRPoolAllocProc = void* (*)(unsigned int bytes, void* userData);
+using tZYRPoolFreeProc = void (*)(void* block, void* userData);
+
+} // namespace ZYRStd
+
+// The boundary tag in front of every block of a VariableSizeAllocator page.
+struct BlkHeader {
+    // Size of the previous block in the page (0 for the first); bit 0 set while this block
+    // is free.
+    unsigned int prevSize;
+    // Bytes of this block's user area.
+    unsigned int size;
+};
+
+// The free-tree node, built in place at a free block's user pointer; its key is the size
+// word just in front of it. The tree holds one node per free size; further free blocks of
+// that size hang in a list after it. Such a list member is not in the tree, so it keeps its
+// list predecessor in the left link and says so with the owner flag.
+class FreeBlock : public ZYRStd::redblack_node<unsigned int, FreeBlock, ZYRStd::ZYRRBParent> {
+public:
+    unsigned int key() const {
+        unsigned int size;
+        std::memcpy(&size, reinterpret_cast<const unsigned char*>(this) - 4, sizeof size);
+        return size;
+    }
+    bool inSizeList() const { return ownerFlag(); }
+    FreeBlock* nextSameSize() const { return next_; }
+    void setNextSameSize(FreeBlock* next) { next_ = next; }
+    FreeBlock* prevSameSize() const { return left(); }
+    void setPrevSameSize(FreeBlock* prev) { setLeft(prev); }
+
+private:
+    FreeBlock* next_ = nullptr;
+};
+
+// A best-fit allocator over pages with boundary tags and a free tree keyed by size.
+// Requests above the page size get a block of their own ("large" blocks). Not thread-safe:
+// the owning client serialises its use.
+class ZYRSTD_API VariableSizeAllocator : public ZYRStd::I_VariableSizeAllocator,
+                                         public ZYRStd::redblack_tree<FreeBlock, unsigned int>,
+                                         public ZYRStd::CZYRClientBase {
+public:
+    // The node must fit the smallest block.
+    static constexpr unsigned int kMinBlockSize = (sizeof(FreeBlock) + 7) & ~7u;
+    // Page bytes beyond the usable size: 8-byte page word pair, first header, end sentinel.
+    static constexpr unsigned int kPageOverhead = 24;
+    // Large blocks up to this request are kept for reuse when freed.
+    static constexpr unsigned int kMaxCachedLargeBlock = 131071;
+
+    // The first page, of initialPages x pageSize usable bytes, is kept as the reserved page.
+    // `reservedCount` is accepted and not used.
+    VariableSizeAllocator(const char* name, unsigned int initialPages, unsigned int reservedCount,
+                          unsigned int pageSize, ZYRStd::tZYRPoolAllocProc alloc,
+                          ZYRStd::tZYRPoolFreeProc free, void* userData);
+    ~VariableSizeAllocator() override;
+    VariableSizeAllocator(const VariableSizeAllocator&) = delete;
+    VariableSizeAllocator& operator=(const VariableSizeAllocator&) = delete;
+
+    void* allocate(unsigned int size, unsigned int& obtained) override;
+    // Null is ignored.
+    unsigned int Free(void* p) override;
+
+    // 0 for null; the request of a large block, else the block's size.
+    unsigned int GetPtrSize(void* p) const;
+    // A page of `bytes` usable bytes laid out as one free block, counted in the held bytes.
+    void* allocVarPage(unsigned int bytes);
+    void freeVarPage(void* page);
+    unsigned long long getVarPageCurrAllocAmount() const { return held_; }
+    unsigned long long getVarPagePeakAllocAmount() const { return peakHeld_; }
+    unsigned int pageSize() const { return pageSize_; }
+    // Everything now taken from the supplier (the held bytes).
+    unsigned long long totalAllocatedMemory() const { return held_; }
+    // Takes a free block out of the tree or out of its same-size list.
+    void RemoveBlock(BlkHeader* header);
+    // Obtains the first page as the reserved page (construction does this).
+    void InitializePages();
+    void LogAllocFailure(unsigned int) {}
+    void ThrowBadAlloc() {}
+
+    const char* name() const { return name_; }
+    // Debug check of the tree, the same-size lists, every page's boundary tags and the held
+    // bytes. Null when all is sound, else what is broken.
+    const char* checkInvariants() const;
+
+private:
+    void* allocateLarge(unsigned int size, unsigned int& obtained);
+    unsigned int freeLarge(unsigned char* header);
+    // Merges a block that just became free with its free neighbours, then keeps, returns or
+    // files the result; the bytes given back to the supplier.
+    unsigned int release(unsigned char* header);
+    void fileBlock(unsigned char* header, unsigned int size);
+    void unfile(unsigned char* header);
+    bool registerPage(unsigned char* page);
+    void unregisterPage(unsigned char* page);
+    void noteHeld(unsigned long long bytes);
+    bool isFiled(const unsigned char* header, unsigned int size) const;
+
+    unsigned int initialPages_;
+    unsigned int reservedCount_;
+    unsigned int pageSize_;
+    unsigned char* cachedLarge_ = nullptr;
+    unsigned int cachedLargeSize_ = 0;
+    unsigned char* reservedPage_ = nullptr;
+    ZYRStd::tZYRPoolAllocProc alloc_;
+    ZYRStd::tZYRPoolFreeProc free_;
+    void* userData_;
+    unsigned long long held_ = 0;
+    unsigned long long peakHeld_ = 0;
+    bool log_;
+    char name_[39];
+    // Every page held, so that the debug check can walk them; a page's index here is kept
+    // in its unused second word.
+    unsigned char** pages_ = nullptr;
+    unsigned int pageCount_ = 0;
+    unsigned int pageCapacity_ = 0;
+    unsigned long long liveLargeBytes_ = 0;
+};
+
+// One slot of a FixedSizeAllocator pool; while free it links the pool's free list.
+struct DMMPoolBlock {
+    DMMPoolBlock* next;
+};
+
+// The header at the start of every FixedSizeAllocator pool; the slots follow it.
+struct DMMPoolControl {
+    DMMPoolControl* nextPool;
+    DMMPoolBlock* freeList;
+    unsigned char* end; // one past the pool
+    unsigned int freeSlots;
+    unsigned int slots;
+    unsigned int stride; // bytes from one slot to the next
+    unsigned int poolBytes;
+};
+
+// Pools of equal slots. The first pool has room for slotsPerPool slots of slotBytes bytes
+// (header included); later pools hold one slot each. The usable slot size is reported by
+// GetPool.
+class ZYRSTD_API FixedSizeAllocator : public ZYRStd::CZYRClientBase {
+public:
+    // `name` and `reservedCount` are accepted and not kept.
+    FixedSizeAllocator(const char* name, unsigned int slotsPerPool, unsigned int reservedCount,
+                       unsigned int slotBytes, ZYRStd::tZYRPoolAllocProc alloc,
+                       ZYRStd::tZYRPoolFreeProc free, void* userData);
+    ~FixedSizeAllocator() override;
+    FixedSizeAllocator(const FixedSizeAllocator&) = delete;
+    FixedSizeAllocator& operator=(const FixedSizeAllocator&) = delete;
+
+    // A free slot (its usable bytes in *slotSize when not null), or null.
+    DMMPoolBlock* GetPool(int* slotSize);
+    // A slot outside every pool is ignored.
+    void FreePool(DMMPoolBlock* slot);
+    void SetupPool(DMMPoolControl* pool, unsigned int bytes);
+
+    unsigned long long heldBytes() const { return held_; }
+    unsigned long long peakHeldBytes() const { return peakHeld_; }
+
+private:
+    static DMMPoolBlock* pop(DMMPoolControl* pool, int* slotSize);
+
+    DMMPoolControl* pools_ = nullptr;
+    unsigned int slotsPerPool_;
+    unsigned int slotBytes_;
+    ZYRStd::tZYRPoolAllocProc alloc_;
+    ZYRStd::tZYRPoolFreeProc free_;
+    void* userData_;
+    unsigned long long held_ = 0;
+    unsigned long long peakHeld_ = 0;
+};
+
+namespace ZYRStd {
+
+// A free-list pool of equal elements in chunks from ZYRMalloc. Elements are 8-byte aligned
+// and at least 8 bytes, since a free element holds the free-list link.
+class ZYRSTD_API ZYRFixedSizePool : public CZYRClientBase {
+public:
+    ZYRFixedSizePool(unsigned int elementSize, unsigned int elementsPerChunk);
+    ~ZYRFixedSizePool() override;
+    ZYRFixedSizePool(const ZYRFixedSizePool&) = delete;
+    ZYRFixedSizePool& operator=(const ZYRFixedSizePool&) = delete;
+
+    // Null when no chunk could be had.
+    void* Alloc();
+    // Throws kZYRErrorOutOfMemory instead of returning null.
+    void* SureAlloc();
+    // Null is ignored.
+    void Free(void* p);
+    // Gives every chunk back; elements handed out become invalid.
+    void FlushAll();
+
+    unsigned int elementSize() const { return elementSize_; }
+
+private:
+    struct Chunk;
+
+    unsigned int elementSize_;
+    unsigned int elementsPerChunk_;
+    Chunk* chunks_ = nullptr; // newest first
+    void* freeList_ = nullptr;
+};
+
+struct ZYRStdAllocatorFixedSizePoolPage {
+    ZYRStdAllocatorFixedSizePoolPage* next;
+    unsigned int freeElements;
+    unsigned int elements;
+};
+
+// A bump pool of element runs on virtual-memory pages; runs are only given back all at
+// once.
+class ZYRSTD_API ZYRStdAllocatorFixedSizePool : public CZYRClientBase {
+public:
+    ZYRStdAllocatorFixedSizePool(unsigned int elementSize, unsigned int elementsPerPage);
+    ~ZYRStdAllocatorFixedSizePool() override;
+    ZYRStdAllocatorFixedSizePool(const ZYRStdAllocatorFixedSizePool&) = delete;
+    ZYRStdAllocatorFixedSizePool& operator=(const ZYRStdAllocatorFixedSizePool&) = delete;
+
+    // `count` consecutive elements, or null (also for 0).
+    void* Alloc(unsigned int count);
+    // Throws kZYRErrorOutOfMemory instead of returning null.
+    void* SureAlloc(unsigned int count);
+    void FlushAll();
+
+private:
+    ZYRStdAllocatorFixedSizePoolPage* AddPage(unsigned int count);
+    void* AllocFromPage(ZYRStdAllocatorFixedSizePoolPage* page, unsigned int count);
+    void FreePage(ZYRStdAllocatorFixedSizePoolPage* page);
+    unsigned int OptimalNumElementsPerPage(unsigned int count) const;
+
+    unsigned int elementSize_;
+    unsigned int elementsPerPage_;
+    ZYRStdAllocatorFixedSizePoolPage* pages_ = nullptr; // newest first
+    unsigned long long freeElements_ = 0;
+};
+
+} // namespace ZYRStd
