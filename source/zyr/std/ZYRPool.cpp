@@ -218,20 +218,9 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
     const auto n = static_cast<uint32_t>(wanted);
 
     unsigned char* h;
-    if (FreeBlock* node = GetMinGTOrEqNode(n)) {
-        // The node stays in the tree while its size list has members: the most recently
-        // freed member goes first.
-        if (FreeBlock* member = node->nextSameSize()) {
-            FreeBlock* after = member->nextSameSize();
-            node->setNextSameSize(after);
-            if (after)
-                after->setPrevSameSize(node);
-            h = headerOf(member);
-        } else {
-            UnlinkNode(node);
-            h = headerOf(node);
-        }
-    } else {
+    FreeBlock* below = nullptr;
+    FreeBlock* node = GetMinGTOrEqNode(n, below);
+    if (!node) {
         unsigned char* page = reservedPage_;
         if (page) {
             reservedPage_ = nullptr;
@@ -245,21 +234,46 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
         }
         layOutPage(page);
         h = firstHeader(page);
+    } else if (FreeBlock* member = node->nextSameSize()) {
+        // The node stays in the tree while its size list has members: the most recently
+        // freed member goes first.
+        FreeBlock* after = member->nextSameSize();
+        node->setNextSameSize(after);
+        if (after)
+            after->setPrevSameSize(node);
+        h = headerOf(member);
+    } else {
+        h = headerOf(node);
     }
 
     store32(h, load32(h) & ~kFreeBit);
     const uint32_t blockSize = sizeOf(h);
-    if (uint64_t{blockSize} >= uint64_t{n} + kMinBlockSize + 8) {
-        const uint32_t restSize = blockSize - n - 8;
-        store32(h + 4, n);
-        unsigned char* rest = h + 8 + n;
-        store32(rest, n);
-        store32(rest + 4, restSize);
-        unsigned char* after = rest + 8 + restSize;
-        if (!isSentinel(after))
-            setPrevSize(after, restSize);
-        release(rest);
+    const bool split = uint64_t{blockSize} >= uint64_t{n} + kMinBlockSize + 8;
+    const bool nodeLeaves = node && headerOf(node) == h;
+    if (!split) {
+        if (nodeLeaves)
+            UnlinkNode(node);
+        return h + 8;
     }
+
+    // The rest needs no merging: the block was free, so its neighbours are not.
+    const uint32_t restSize = blockSize - n - 8;
+    store32(h + 4, n);
+    unsigned char* rest = h + 8 + n;
+    store32(rest, n | kFreeBit);
+    store32(rest + 4, restSize);
+    unsigned char* after = rest + 8 + restSize;
+    if (!isSentinel(after))
+        setPrevSize(after, restSize);
+    if (nodeLeaves && (!below || below->key() < restSize)) {
+        // No free size lies between the node's predecessor and the rest, so the rest can
+        // take the node's place in the tree without a search or rebalancing.
+        ReplaceNode(node, ::new (static_cast<void*>(rest + 8)) FreeBlock());
+        return h + 8;
+    }
+    if (nodeLeaves)
+        UnlinkNode(node);
+    fileBlock(rest, restSize);
     return h + 8;
 }
 

@@ -30,18 +30,19 @@ protected:
 // supplies `Key key() const`; keys of the nodes in one tree are distinct.
 template <class Key, class Node, class Parent = ZYRRBParent> class redblack_node : public Parent {
 public:
-    Node* left() const { return left_; }
-    Node* right() const { return right_; }
+    Node* left() const { return child_[0]; }
+    Node* right() const { return child_[1]; }
+    // child(false) is the left child, child(true) the right one.
+    Node* child(bool right) const { return child_[right]; }
     Node* parent() const { return reinterpret_cast<Node*>(this->bits_ & Parent::kLinkMask); }
-    void setLeft(Node* n) { left_ = n; }
-    void setRight(Node* n) { right_ = n; }
+    void setLeft(Node* n) { child_[0] = n; }
+    void setRight(Node* n) { child_[1] = n; }
     void setParent(Node* n) {
         this->bits_ = reinterpret_cast<uintptr_t>(n) | (this->bits_ & ~Parent::kLinkMask);
     }
 
 private:
-    Node* left_ = nullptr;
-    Node* right_ = nullptr;
+    Node* child_[2] = {nullptr, nullptr};
 };
 
 // Where a search ended: the node with the key, or the empty place where it belongs.
@@ -95,24 +96,32 @@ public:
 
     Node* FindNode(Key key) const {
         Node* n = root_;
-        while (n && n->key() != key)
-            n = key < n->key() ? n->left() : n->right();
+        while (n) {
+            const Key k = n->key();
+            if (k == key)
+                break;
+            n = n->child(k < key);
+        }
         return n;
     }
 
-    // The node with the smallest key at least `key`, or null.
+    // The node with the smallest key at least `key`, or null. The descent picks children
+    // by index rather than by branch: the direction at each level is a coin toss that the
+    // processor cannot predict.
     Node* GetMinGTOrEqNode(Key key) const {
+        Node* below;
+        return GetMinGTOrEqNode(key, below);
+    }
+    // As above; `below` receives the node with the largest key under `key` (or null), which
+    // is the in-order predecessor of the answer.
+    Node* GetMinGTOrEqNode(Key key, Node*& below) const {
         Node* best = nullptr;
+        below = nullptr;
         for (Node* n = root_; n;) {
-            const Key k = n->key();
-            if (k == key)
-                return n;
-            if (k > key) {
-                best = n;
-                n = n->left();
-            } else {
-                n = n->right();
-            }
+            const bool goRight = n->key() < key;
+            best = goRight ? best : n;
+            below = goRight ? n : below;
+            n = n->child(goRight);
         }
         return best;
     }
@@ -121,15 +130,9 @@ public:
     Node* GetMaxLTOrEqNode(Key key) const {
         Node* best = nullptr;
         for (Node* n = root_; n;) {
-            const Key k = n->key();
-            if (k == key)
-                return n;
-            if (k < key) {
-                best = n;
-                n = n->right();
-            } else {
-                n = n->left();
-            }
+            const bool goLeft = key < n->key();
+            best = goLeft ? best : n;
+            n = n->child(!goLeft);
         }
         return best;
     }
@@ -138,16 +141,20 @@ public:
     // empty place for it, valid until the tree next changes.
     bool SetSearchState(tree_search_state<Node>& state, Key key) const {
         state = tree_search_state<Node>{};
+        Node* parent = nullptr;
+        bool right = false;
         for (Node* n = root_; n;) {
             const Key k = n->key();
             if (k == key) {
                 state.found = n;
                 return true;
             }
-            state.parent = n;
-            state.asLeftChild = key < k;
-            n = state.asLeftChild ? n->left() : n->right();
+            parent = n;
+            right = k < key;
+            n = n->child(right);
         }
+        state.parent = parent;
+        state.asLeftChild = !right;
         return false;
     }
 
