@@ -1,6 +1,7 @@
 // Fixed (16.16) and Frac (2.30) arithmetic on signed 32-bit numbers.
 #pragma once
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <cstdlib>
@@ -37,11 +38,11 @@ inline uint64_t magnitude(int64_t v) {
     return static_cast<uint64_t>(std::llabs(v));
 }
 
-// Applies the sign to a magnitude, saturating at the 32-bit extremes.
+// Applies the sign to a magnitude, saturating at the 32-bit extremes. Every caller's
+// magnitude is below 2^63; selects rather than branches, as signs are unpredictable.
 inline int32_t saturate(bool negative, uint64_t q) {
-    if (negative)
-        return q >= 0x80000000u ? kMin : static_cast<int32_t>(-static_cast<int64_t>(q));
-    return q >= 0x7FFFFFFFu ? kMax : static_cast<int32_t>(q);
+    const auto v = static_cast<int64_t>(q);
+    return static_cast<int32_t>(std::clamp<int64_t>(negative ? -v : v, kMin, kMax));
 }
 
 // a times b / 2^shift, half away from zero. The product needs at most 62 bits, so
@@ -72,11 +73,7 @@ inline int32_t TFixedDiv(int32_t a, int32_t b) {
         return divideByZero(a);
     // 2^47 at most, and 64-bit division truncates toward zero as required.
     const int64_t q = static_cast<int64_t>(a) * 65536 / b;
-    if (q >= kMax)
-        return kMax;
-    if (q <= kMin)
-        return kMin;
-    return static_cast<int32_t>(q);
+    return static_cast<int32_t>(std::clamp<int64_t>(q, kMin, kMax));
 }
 
 inline int32_t fixratio(int32_t a, int32_t b) {
