@@ -49,8 +49,12 @@ public:
     // Checked access: throws kZYRErrorBadParam "invalid index" past the end.
     T& operator[](unsigned int index) {
         if (index >= count_)
-            throw CZYRError(ZYRPublic::kZYRErrorBadParam, "invalid index",
-                            "source/zyr/std/CZYRMemBuffer", __LINE__);
+            throwInvalidMemBufferIndex(__LINE__);
+        return data_[index];
+    }
+    const T& operator[](unsigned int index) const {
+        if (index >= count_)
+            throwInvalidMemBufferIndex(__LINE__);
         return data_[index];
     }
     unsigned int count() const { return count_; }

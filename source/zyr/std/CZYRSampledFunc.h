@@ -1,0 +1,90 @@
+// One-dimensional functions given by sample points, and their 8-bit resampling.
+#pragma once
+
+#include <algorithm>
+#include <cstring>
+
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRMemBuffer.h"
+
+namespace ZYRStd {
+
+template <class T> struct sZYRRangeT {
+    T min;
+    T max;
+};
+
+template <class T> struct sZYRPointT {
+    T x;
+    T y;
+};
+
+// Piecewise linear over points with ascending x.
+template <class T> class CZYRSampledFunc : public CZYRClientBase {
+public:
+    using Point = sZYRPointT<T>;
+
+    CZYRSampledFunc() = default;
+    CZYRSampledFunc(sZYRRangeT<T> domain, sZYRRangeT<T> range) : domain_(domain), range_(range) {}
+    CZYRSampledFunc(const CZYRSampledFunc& other)
+        : CZYRClientBase(), domain_(other.domain_), range_(other.range_) {
+        setPoints(other.getPoints(), other.getPointCount());
+    }
+    CZYRSampledFunc& operator=(const CZYRSampledFunc& other) {
+        if (this != &other) {
+            domain_ = other.domain_;
+            range_ = other.range_;
+            setPoints(other.getPoints(), other.getPointCount());
+        }
+        return *this;
+    }
+    ~CZYRSampledFunc() override = default;
+
+    sZYRRangeT<T> getDomain() const { return domain_; }
+    sZYRRangeT<T> getRange() const { return range_; }
+    void setDomain(sZYRRangeT<T> domain) { domain_ = domain; }
+    void setRange(sZYRRangeT<T> range) { range_ = range; }
+    unsigned int getPointCount() const { return count_; }
+    const Point* getPoints() const { return points_.data(); }
+    // Checked: an index past the points throws kZYRErrorBadParam "invalid index".
+    const Point& getPoint(unsigned int index) const {
+        if (index >= count_)
+            throwInvalidMemBufferIndex(__LINE__);
+        return points_[index];
+    }
+
+    // Copies the points; throws kZYRErrorOutOfMemory when the buffer cannot grow.
+    void setPoints(const Point* points, unsigned int count) {
+        if (count > points_.count())
+            points_.grow(count);
+        if (count)
+            std::memcpy(points_.data(), points, sizeof(Point) * count);
+        count_ = count;
+    }
+
+private:
+    using Buffer = CZYRMemBuffer<Point>;
+
+    sZYRRangeT<T> domain_{0, 1};
+    sZYRRangeT<T> range_{0, 1};
+    Buffer points_;
+    unsigned int count_ = 0;
+};
+
+// Receives each resampled output; the result is not used.
+class ZYRSTD_API IEncodedDataCBProc {
+public:
+    virtual bool encodedSample(int index, float value) = 0;
+
+protected:
+    ~IEncodedDataCBProc() = default;
+};
+
+// Calls `cb` n times with the function sampled evenly over its domain, scaled so that the
+// function's range maps onto 0 to 255; returns (0, 255). Fewer than two points throw
+// kZYRErrorBadParam "invalid index" before any call.
+ZYRSTD_API sZYRRangeT<float> Caculate8BitEncodedSamples(const CZYRSampledFunc<float>& f, int n,
+                                                        IEncodedDataCBProc& cb);
+
+} // namespace ZYRStd
