@@ -26,6 +26,12 @@ template <class T> struct CZYRMemBufferAlloc {
     static void free(T* p) { ZYRDMMFree(p, kClientName, nullptr); }
 };
 
+// The bound error of checked element access.
+[[noreturn]] inline void throwInvalidMemBufferIndex(int line) {
+    throw CZYRError(ZYRPublic::kZYRErrorBadParam, "invalid index", "source/zyr/std/CZYRMemBuffer",
+                    line);
+}
+
 template <class T, class Alloc> class CZYRBaseMemBuffer : public CZYRClientBase {
     static_assert(std::is_trivially_copyable_v<T>, "elements are raw storage");
 
