@@ -9,7 +9,7 @@ namespace zyrtest {
 
 bool FailingHost::shouldFail() {
     ++calls;
-    return failAll || (failEvery != 0 && calls % failEvery == 0);
+    return failAll || calls == failAt || (failEvery != 0 && calls % failEvery == 0);
 }
 
 namespace {

@@ -12,6 +12,7 @@ namespace zyrtest {
 struct FailingHost {
     // Calls (counting from 1) to fail: every n-th, or all once `failAll` is set.
     unsigned int failEvery = 0;
+    unsigned int failAt = 0; // one given call
     bool failAll = false;
     unsigned int calls = 0;
     bool shouldFail();

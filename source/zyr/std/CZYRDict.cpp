@@ -221,22 +221,18 @@ template <class Store> void cloneValue(const CZYRValue& value, I_Error& err, Sto
     switch (value.tag()) {
     case kZYRValTypeDict:
         if (I_Dict* nested = value.as<I_Dict*>()) {
-            I_Dict* copy = nested->clone(err);
-            if (copy) {
-                store(CZYRValue::of(copy));
-                copy->release();
-            }
+            const C_SmartPtr<I_Dict> copy(nested->clone(err), false);
+            if (copy)
+                store(CZYRValue::of(copy.get()));
         } else {
             store(value);
         }
         break;
     case kZYRValTypeArray:
         if (I_Array* nested = value.as<I_Array*>()) {
-            I_Array* copy = nested->clone(err);
-            if (copy) {
-                store(CZYRValue::of(copy));
-                copy->release();
-            }
+            const C_SmartPtr<I_Array> copy(nested->clone(err), false);
+            if (copy)
+                store(CZYRValue::of(copy.get()));
         } else {
             store(value);
         }
@@ -376,7 +372,8 @@ public:
                                [&](const CZYRValue& v) { copy->insertOrAssign(node.key, v); });
                     return !err.errorOccurred();
                 });
-                return copy.detach();
+                // A partial copy is of no use to anyone; it goes with the error.
+                return err.errorOccurred() ? nullptr : copy.detach();
             });
     }
 
@@ -551,7 +548,7 @@ public:
                     cloneValue(elements_[i], err, [&](const CZYRValue& v) {
                         copy->put(static_cast<unsigned int>(i), v);
                     });
-                return copy.detach();
+                return err.errorOccurred() ? nullptr : copy.detach();
             });
     }
 
