@@ -18,6 +18,7 @@ namespace {
 constexpr unsigned int kPageSize = 65536;
 constexpr unsigned int kTraceLiveTarget = 1000;
 constexpr unsigned int kPoolElements = 1024;
+constexpr unsigned int kPoolChurn = 4096;
 
 // Pages come from the library's heap front, as a client's supplier would take them; the
 // virtual-memory default would measure mmap rather than the allocator.
@@ -109,41 +110,56 @@ void BM_Malloc_Trace(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * static_cast<int64_t>(t.steps.size()));
 }
 
-// kPoolElements elements allocated, then freed in a fixed random order.
-const std::vector<uint32_t>& freeOrder() {
-    static const std::vector<uint32_t> order = [] {
-        std::vector<uint32_t> o(kPoolElements);
+// A pool's life: kPoolElements elements allocated, then kPoolChurn steps that each free a
+// random live element and allocate one in its place, then everything freed in random order.
+struct PoolPlan {
+    std::vector<uint32_t> churn;
+    std::vector<uint32_t> finalOrder;
+};
+
+const PoolPlan& poolPlan() {
+    static const PoolPlan plan = [] {
+        PoolPlan p;
+        std::mt19937 random(99);
+        for (unsigned int i = 0; i < kPoolChurn; ++i)
+            p.churn.push_back(random() % kPoolElements);
+        p.finalOrder.resize(kPoolElements);
         for (uint32_t i = 0; i < kPoolElements; ++i)
-            o[i] = i;
-        std::shuffle(o.begin(), o.end(), std::mt19937(99));
-        return o;
+            p.finalOrder[i] = i;
+        std::shuffle(p.finalOrder.begin(), p.finalOrder.end(), random);
+        return p;
     }();
-    return order;
+    return plan;
 }
 
 template <class Allocate, class Free>
-void fillAndEmpty(benchmark::State& state, Allocate allocate, Free release) {
-    const auto& order = freeOrder();
+void poolLife(benchmark::State& state, Allocate allocate, Free release) {
+    const PoolPlan& plan = poolPlan();
     std::vector<void*> elements(kPoolElements);
     for (auto _ : state) {
         for (void*& e : elements) {
             e = allocate();
             benchmark::DoNotOptimize(e);
         }
-        for (uint32_t i : order)
+        for (uint32_t i : plan.churn) {
+            release(elements[i]);
+            elements[i] = allocate();
+            benchmark::DoNotOptimize(elements[i]);
+        }
+        for (uint32_t i : plan.finalOrder)
             release(elements[i]);
     }
-    state.SetItemsProcessed(state.iterations() * kPoolElements);
+    state.SetItemsProcessed(state.iterations() * (kPoolElements + kPoolChurn));
 }
 
 void BM_ZYRFixedSizePool_64(benchmark::State& state) {
     ZYRStd::ZYRFixedSizePool pool(64, 256);
-    fillAndEmpty(
+    poolLife(
         state, [&] { return pool.Alloc(); }, [&](void* p) { pool.Free(p); });
 }
 
 void BM_Malloc_64(benchmark::State& state) {
-    fillAndEmpty(
+    poolLife(
         state, [] { return std::malloc(64); }, [](void* p) { std::free(p); });
 }
 

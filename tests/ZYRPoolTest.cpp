@@ -75,6 +75,34 @@ char* alloc(VariableSizeAllocator& a, unsigned int size) {
     return static_cast<char*>(a.allocate(size, obtained));
 }
 
+uint32_t word(const void* at) {
+    uint32_t v;
+    std::memcpy(&v, at, sizeof v);
+    return v;
+}
+
+// The free blocks of every page (by header address, with their sizes), read from the
+// boundary tags; the reserved page, one free block spanning its page, is left out.
+std::map<const char*, uint32_t> freeBlocksOfPages(const Supplier& s, unsigned int pageSize,
+                                                  unsigned int initialPages) {
+    std::map<const char*, uint32_t> blocks;
+    for (const auto& [block, bytes] : s.live) {
+        if (bytes != pageSize + 24 && bytes != initialPages * pageSize + 24)
+            continue;
+        const auto* page = static_cast<const char*>(block);
+        const uint32_t usable = word(page);
+        for (uint32_t offset = 8; offset < 16 + usable;) {
+            const char* h = page + offset;
+            const uint32_t size = word(h + 4);
+            const bool whole = offset == 8 && size == usable;
+            if ((word(h) & 1) && !whole)
+                blocks[h] = size;
+            offset += 8 + size;
+        }
+    }
+    return blocks;
+}
+
 struct IntNode : redblack_node<int, IntNode> {
     explicit IntNode(int k = 0) : value(k) {}
     int key() const { return value; }
@@ -366,11 +394,17 @@ TEST(VariableSizeAllocatorTest, SupplierFailureLeavesNothingBroken) {
 // Random allocate/free against a model: live blocks never overlap, their contents survive,
 // and the tree, the pages and the held bytes stay sound after every step.
 TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
-    constexpr unsigned int kPageSize = 4096;
-    for (unsigned int failEvery : {0u, 5u}) {
-        SCOPED_TRACE(failEvery ? "supplier failing every 5th call" : "reliable supplier");
+    struct Setup {
+        unsigned int pageSize;
+        unsigned int failEvery; // 0: reliable supplier
+    };
+    // 5000 bytes: the last block of each page is not a multiple of 8 (4 bytes over).
+    for (const Setup setup : {Setup{4096, 0}, Setup{4096, 5}, Setup{5004, 0}}) {
+        const unsigned int pageSize = setup.pageSize;
+        SCOPED_TRACE("page size " + std::to_string(pageSize) + ", supplier failing every " +
+                     std::to_string(setup.failEvery) + "th call");
         Supplier s;
-        s.failEvery = failEvery;
+        s.failEvery = setup.failEvery;
         std::mt19937 rng(20240607);
         struct Live {
             unsigned int size;
@@ -379,7 +413,7 @@ TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
         std::map<char*, Live> live; // by address
         std::vector<char*> order;
         {
-            VariableSizeAllocator a = makeAllocator(s, 2, kPageSize);
+            VariableSizeAllocator a = makeAllocator(s, 2, pageSize);
             unsigned long long obtainedSum = 0;
             unsigned long long returnedSum = 0;
             for (int step = 0; step < 5000; ++step) {
@@ -390,16 +424,33 @@ TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
                     if (kind < 60)
                         size = 1 + rng() % 128;
                     else if (kind < 95)
-                        size = 1 + rng() % kPageSize;
+                        size = 1 + rng() % pageSize;
                     else
-                        size = kPageSize + 100 + rng() % 20000;
-                    if (size + 16 == 2 * kPageSize + 24)
+                        size = pageSize + 100 + rng() % 20000;
+                    if (size + 16 == 2 * pageSize + 24)
                         ++size; // keeps large blocks apart from pages in the supplier's list
+                    // Best fit: a block of the smallest free size that holds the request.
+                    uint32_t bestSize = UINT32_MAX;
+                    std::map<const char*, uint32_t> freeBefore;
+                    if (size <= pageSize) {
+                        const uint32_t n = (std::max(size, 32u) + 7) & ~7u;
+                        freeBefore = freeBlocksOfPages(s, pageSize, 2);
+                        for (const auto& [h, blockSize] : freeBefore)
+                            if (blockSize >= n)
+                                bestSize = std::min(bestSize, blockSize);
+                    }
                     unsigned int obtained = 0;
                     auto* p = static_cast<char*>(a.allocate(size, obtained));
                     obtainedSum += obtained;
+                    if (p && bestSize != UINT32_MAX) {
+                        const auto chosen = freeBefore.find(p - 8);
+                        ASSERT_NE(chosen, freeBefore.end()) << "not carved from a free block";
+                        ASSERT_EQ(chosen->second, bestSize) << "not the best fit";
+                    } else if (p && size <= pageSize) {
+                        ASSERT_EQ(word(p - 8), 0u) << "no fit: the first block of a page";
+                    }
                     if (!p) {
-                        ASSERT_NE(failEvery, 0u) << "null from a reliable supplier";
+                        ASSERT_NE(setup.failEvery, 0u) << "null from a reliable supplier";
                         ASSERT_EQ(obtained, 0u);
                     } else {
                         ASSERT_GE(a.GetPtrSize(p), size);
@@ -435,7 +486,7 @@ TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
                 unsigned long long expectedHeld = 0;
                 for (const auto& [block, bytes] : s.live)
                     expectedHeld +=
-                        bytes == kPageSize + 24 || bytes == 2 * kPageSize + 24 ? bytes : bytes - 16;
+                        bytes == pageSize + 24 || bytes == 2 * pageSize + 24 ? bytes : bytes - 16;
                 ASSERT_EQ(a.getVarPageCurrAllocAmount(), expectedHeld) << "at step " << step;
             }
             EXPECT_GT(obtainedSum, 0u);

@@ -2,6 +2,7 @@
 #include "zyr/std/ZYRPool.h"
 
 #include <algorithm>
+#include <climits>
 #include <cstdlib>
 #include <new>
 
@@ -104,6 +105,30 @@ void defaultSupplierFree(void* block, void*) {
 
 bool usesDefaultSupplier(ZYRStd::tZYRPoolAllocProc alloc, ZYRStd::tZYRPoolFreeProc free) {
     return alloc == nullptr || free == nullptr;
+}
+
+// The first set bit at or after `from` in a bitmap of `count` bits, or `count`.
+unsigned int nextSetBit(const uint64_t* bits, unsigned int from, unsigned int count) {
+    unsigned int word = from / 64;
+    uint64_t w = bits[word] & (~uint64_t{0} << (from % 64));
+    while (w == 0) {
+        if (++word == count / 64)
+            return count;
+        w = bits[word];
+    }
+    return word * 64 + static_cast<unsigned int>(__builtin_ctzll(w));
+}
+
+// The last set bit before `before`, or UINT_MAX.
+unsigned int previousSetBit(const uint64_t* bits, unsigned int before) {
+    unsigned int word = before / 64;
+    uint64_t w = before % 64 ? bits[word] & ((uint64_t{1} << (before % 64)) - 1) : 0;
+    while (w == 0) {
+        if (word == 0)
+            return UINT_MAX;
+        w = bits[--word];
+    }
+    return word * 64 + 63 - static_cast<unsigned int>(__builtin_clzll(w));
 }
 
 uintptr_t address(const void* p) {
@@ -219,7 +244,7 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
 
     unsigned char* h;
     FreeBlock* below = nullptr;
-    FreeBlock* node = GetMinGTOrEqNode(n, below);
+    FreeBlock* node = bestFit(n, below);
     if (!node) {
         unsigned char* page = reservedPage_;
         if (page) {
@@ -251,8 +276,10 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
     const bool split = uint64_t{blockSize} >= uint64_t{n} + kMinBlockSize + 8;
     const bool nodeLeaves = node && headerOf(node) == h;
     if (!split) {
-        if (nodeLeaves)
+        if (nodeLeaves) {
             UnlinkNode(node);
+            indexErase(blockSize);
+        }
         return h + 8;
     }
 
@@ -268,11 +295,16 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
     if (nodeLeaves && (!below || below->key() < restSize)) {
         // No free size lies between the node's predecessor and the rest, so the rest can
         // take the node's place in the tree without a search or rebalancing.
-        ReplaceNode(node, ::new (static_cast<void*>(rest + 8)) FreeBlock());
+        FreeBlock* restNode = ::new (static_cast<void*>(rest + 8)) FreeBlock();
+        ReplaceNode(node, restNode);
+        indexErase(blockSize);
+        indexInsert(restSize, restNode);
         return h + 8;
     }
-    if (nodeLeaves)
+    if (nodeLeaves) {
         UnlinkNode(node);
+        indexErase(blockSize);
+    }
     fileBlock(rest, restSize);
     return h + 8;
 }
@@ -373,8 +405,17 @@ void VariableSizeAllocator::fileBlock(unsigned char* h, unsigned int size) {
     store32(h, load32(h) | kFreeBit);
     FreeBlock* block = ::new (static_cast<void*>(h + 8)) FreeBlock();
     ZYRStd::tree_search_state<FreeBlock> state;
-    if (SetSearchState(state, size)) {
-        FreeBlock* node = state.found;
+    FreeBlock* node;
+    if (isIndexed(size)) {
+        node = nodeOfSize_[size / 8];
+        if (!node && unindexedSmallSizes_ == 0)
+            placeBesideNeighbours(state, size);
+        else if (!node)
+            SetSearchState(state, size);
+    } else {
+        node = SetSearchState(state, size) ? state.found : nullptr;
+    }
+    if (node) {
         FreeBlock* after = node->nextSameSize();
         block->setOwnerFlag(true);
         block->setPrevSameSize(node);
@@ -384,6 +425,7 @@ void VariableSizeAllocator::fileBlock(unsigned char* h, unsigned int size) {
         node->setNextSameSize(block);
     } else {
         InsertNodeReference(state, block);
+        indexInsert(size, block);
     }
 }
 
@@ -399,9 +441,84 @@ void VariableSizeAllocator::unfile(unsigned char* h) {
         // The first list member takes the node's place; the rest of the list follows it.
         after->setOwnerFlag(false);
         ReplaceNode(block, after);
+        indexRepoint(sizeOf(h), after);
     } else {
         UnlinkNode(block);
+        indexErase(sizeOf(h));
     }
+}
+
+FreeBlock* VariableSizeAllocator::bestFit(unsigned int n, FreeBlock*& below) const {
+    if (n >= kIndexLimit || unindexedSmallSizes_ != 0)
+        return GetMinGTOrEqNode(n, below);
+    const unsigned int slot = n / 8;
+    const unsigned int under = previousSetBit(sizePresent_, slot);
+    below = under < kIndexSlots ? nodeOfSize_[under] : nullptr;
+    const unsigned int over = nextSetBit(sizePresent_, slot, kIndexSlots);
+    if (over < kIndexSlots)
+        return nodeOfSize_[over];
+    // No free size in [n, kIndexLimit): the answer lies above, and `below` is right already.
+    FreeBlock* ignored;
+    return GetMinGTOrEqNode(kIndexLimit, ignored);
+}
+
+// A new node belongs right of its in-order predecessor or, when that has a right child,
+// left of its successor, the leftmost node of that subtree. The index names the
+// predecessor, so no descent from the root is needed.
+void VariableSizeAllocator::placeBesideNeighbours(ZYRStd::tree_search_state<FreeBlock>& state,
+                                                  unsigned int size) const {
+    state = ZYRStd::tree_search_state<FreeBlock>{};
+    const unsigned int slot = size / 8;
+    const unsigned int under = previousSetBit(sizePresent_, slot);
+    if (under < kIndexSlots) {
+        FreeBlock* predecessor = nodeOfSize_[under];
+        FreeBlock* n = predecessor->right();
+        if (!n) {
+            state.parent = predecessor;
+            return;
+        }
+        while (n->left())
+            n = n->left();
+        state.parent = n;
+        state.asLeftChild = true;
+        return;
+    }
+    // Nothing smaller: the node goes left of the tree's minimum.
+    FreeBlock* minimum = root();
+    if (!minimum)
+        return;
+    const unsigned int over = nextSetBit(sizePresent_, slot, kIndexSlots);
+    if (over < kIndexSlots) {
+        minimum = nodeOfSize_[over];
+    } else {
+        while (minimum->left())
+            minimum = minimum->left();
+    }
+    state.parent = minimum;
+    state.asLeftChild = true;
+}
+
+void VariableSizeAllocator::indexInsert(unsigned int size, FreeBlock* node) {
+    if (isIndexed(size)) {
+        nodeOfSize_[size / 8] = node;
+        sizePresent_[size / 512] |= uint64_t{1} << (size / 8 % 64);
+    } else if (size < kIndexLimit) {
+        ++unindexedSmallSizes_;
+    }
+}
+
+void VariableSizeAllocator::indexErase(unsigned int size) {
+    if (isIndexed(size)) {
+        nodeOfSize_[size / 8] = nullptr;
+        sizePresent_[size / 512] &= ~(uint64_t{1} << (size / 8 % 64));
+    } else if (size < kIndexLimit) {
+        --unindexedSmallSizes_;
+    }
+}
+
+void VariableSizeAllocator::indexRepoint(unsigned int size, FreeBlock* node) {
+    if (isIndexed(size))
+        nodeOfSize_[size / 8] = node;
 }
 
 void VariableSizeAllocator::RemoveBlock(BlkHeader* header) {
@@ -451,6 +568,25 @@ const char* VariableSizeAllocator::checkInvariants() const {
             if (!isFree(headerOf(m)))
                 return "a filed block is not marked free";
         }
+    }
+
+    unsigned int unindexed = 0;
+    for (auto it = begin(); it != end(); ++it) {
+        const unsigned int key = it->key();
+        if (isIndexed(key) && nodeOfSize_[key / 8] != it.get())
+            return "the size index misses a tree node";
+        if (!isIndexed(key) && key < kIndexLimit)
+            ++unindexed;
+    }
+    if (unindexed != unindexedSmallSizes_)
+        return "the count of unindexed small sizes is wrong";
+    for (unsigned int slot = 0; slot < kIndexSlots; ++slot) {
+        const FreeBlock* node = nodeOfSize_[slot];
+        const bool present = (sizePresent_[slot / 64] >> (slot % 64)) & 1;
+        if (present != (node != nullptr))
+            return "the size index's bitmap disagrees with its slots";
+        if (node && FindNode(slot * 8) != node)
+            return "the size index names a block that is not the tree node of its size";
     }
 
     unsigned long long pageBytes = 0;
@@ -656,12 +792,7 @@ ZYRFixedSizePool::~ZYRFixedSizePool() {
     FlushAll();
 }
 
-void* ZYRFixedSizePool::Alloc() {
-    if (void* element = freeList_) {
-        ZYR_POOL_UNPOISON(element, elementSize_);
-        std::memcpy(&freeList_, element, sizeof freeList_);
-        return element;
-    }
+void* ZYRFixedSizePool::allocFromChunks() {
     if (chunks_ && chunks_->handedOut < elementsPerChunk_) {
         unsigned char* element = chunks_->elements() + uint64_t{chunks_->handedOut} * elementSize_;
         ++chunks_->handedOut;
@@ -686,14 +817,6 @@ void* ZYRFixedSizePool::SureAlloc() {
         throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "ZYRFixedSizePool allocation failed",
                         kSource, 102);
     return element;
-}
-
-void ZYRFixedSizePool::Free(void* p) {
-    if (!p)
-        return;
-    std::memcpy(p, &freeList_, sizeof freeList_);
-    freeList_ = p;
-    ZYR_POOL_POISON(p, elementSize_);
 }
 
 void ZYRFixedSizePool::FlushAll() {

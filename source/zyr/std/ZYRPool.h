@@ -4,6 +4,10 @@
 #include <cstdint>
 #include <cstring>
 
+#if defined(__SANITIZE_ADDRESS__)
+#include <sanitizer/asan_interface.h>
+#endif
+
 #include "ZYRStdExport.h"
 #include "zyr/std/CZYRClientBase.h"
 #include "zyr/std/I_VariableSizeAllocator.h"
@@ -110,6 +114,14 @@ private:
     void unregisterPage(unsigned char* page);
     void noteHeld(unsigned long long bytes);
     bool isFiled(const unsigned char* header, unsigned int size) const;
+    static bool isIndexed(unsigned int size) { return size < kIndexLimit && size % 8 == 0; }
+    // The tree node with the smallest size at least n; `below` gets the largest size under n.
+    FreeBlock* bestFit(unsigned int n, FreeBlock*& below) const;
+    void placeBesideNeighbours(ZYRStd::tree_search_state<FreeBlock>& state,
+                               unsigned int size) const;
+    void indexInsert(unsigned int size, FreeBlock* node);
+    void indexErase(unsigned int size);
+    void indexRepoint(unsigned int size, FreeBlock* node);
 
     unsigned int initialPages_;
     unsigned int reservedCount_;
@@ -130,6 +142,16 @@ private:
     unsigned int pageCount_ = 0;
     unsigned int pageCapacity_ = 0;
     unsigned long long liveLargeBytes_ = 0;
+
+    // Tree nodes of sizes below kIndexLimit that are multiples of 8 are also found here by
+    // size, so that small best-fit and exact lookups need no descent of the tree.
+    static constexpr unsigned int kIndexLimit = 4096;
+    static constexpr unsigned int kIndexSlots = kIndexLimit / 8;
+    FreeBlock* nodeOfSize_[kIndexSlots] = {};
+    uint64_t sizePresent_[kIndexSlots / 64] = {};
+    // Tree sizes below kIndexLimit that are not multiples of 8 (the last block of a page of
+    // such a size); while there are any, best-fit lookups descend the tree.
+    unsigned int unindexedSmallSizes_ = 0;
 };
 
 // One slot of a FixedSizeAllocator pool; while free it links the pool's free list.
@@ -194,12 +216,26 @@ public:
     ZYRFixedSizePool(const ZYRFixedSizePool&) = delete;
     ZYRFixedSizePool& operator=(const ZYRFixedSizePool&) = delete;
 
-    // Null when no chunk could be had.
-    void* Alloc();
+    // Null when no chunk could be had. The free-list paths are inline: a pool exists to
+    // make these two calls cheap.
+    void* Alloc() {
+        void* element = freeList_;
+        if (!element)
+            return allocFromChunks();
+        unpoison(element);
+        std::memcpy(&freeList_, element, sizeof freeList_);
+        return element;
+    }
     // Throws kZYRErrorOutOfMemory instead of returning null.
     void* SureAlloc();
     // Null is ignored.
-    void Free(void* p);
+    void Free(void* p) {
+        if (!p)
+            return;
+        std::memcpy(p, &freeList_, sizeof freeList_);
+        freeList_ = p;
+        poison(p);
+    }
     // Gives every chunk back; elements handed out become invalid.
     void FlushAll();
 
@@ -207,6 +243,23 @@ public:
 
 private:
     struct Chunk;
+
+    void* allocFromChunks();
+    // Free elements are off limits to AddressSanitizer builds.
+    void poison(void* element) const {
+#if defined(__SANITIZE_ADDRESS__)
+        __asan_poison_memory_region(element, elementSize_);
+#else
+        (void)element;
+#endif
+    }
+    void unpoison(void* element) const {
+#if defined(__SANITIZE_ADDRESS__)
+        __asan_unpoison_memory_region(element, elementSize_);
+#else
+        (void)element;
+#endif
+    }
 
     unsigned int elementSize_;
     unsigned int elementsPerChunk_;
