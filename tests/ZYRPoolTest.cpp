@@ -234,39 +234,44 @@ TEST(VariableSizeAllocatorTest, RoundingSplittingAndMerging) {
         std::free(block);
 }
 
+// Small sizes head their lists from bins, larger ones from tree nodes: both behave alike.
 TEST(VariableSizeAllocatorTest, SameSizeBlocksAreReusedLastFreedFirst) {
-    Supplier s;
-    VariableSizeAllocator a = makeAllocator(s, 1, 4096);
-    char* blocks[6];
-    char* fences[6];
-    for (int i = 0; i < 6; ++i) {
-        blocks[i] = alloc(a, 100);
-        fences[i] = alloc(a, 40);
-    }
-    for (char* p : blocks)
-        a.Free(p);
-    EXPECT_EQ(problems(a), "");
-    for (int i = 5; i >= 0; --i)
-        EXPECT_EQ(alloc(a, 100), blocks[i]) << "the block freed last comes first";
-    EXPECT_EQ(problems(a), "");
+    for (const unsigned int size : {100u, 5000u}) {
+        SCOPED_TRACE("block size " + std::to_string(size));
+        Supplier s;
+        VariableSizeAllocator a = makeAllocator(s, 1, 65536);
+        char* blocks[6];
+        char* fences[6];
+        for (int i = 0; i < 6; ++i) {
+            blocks[i] = alloc(a, size);
+            fences[i] = alloc(a, 40);
+        }
+        for (char* p : blocks)
+            a.Free(p);
+        EXPECT_EQ(problems(a), "");
+        for (int i = 5; i >= 0; --i)
+            EXPECT_EQ(alloc(a, size), blocks[i]) << "the block freed last comes first";
+        EXPECT_EQ(problems(a), "");
 
-    // Take the tree node itself out through a merge while its list has members.
-    a.Free(blocks[0]);
-    a.Free(blocks[1]);
-    a.Free(blocks[2]);
-    a.Free(fences[0]); // merges with blocks[0], the oldest and so the tree node
-    EXPECT_EQ(problems(a), "");
-    EXPECT_EQ(alloc(a, 100), blocks[2]) << "the list member took the node's place";
-    EXPECT_EQ(alloc(a, 100), blocks[0]) << "carved from the merged block";
-    EXPECT_EQ(problems(a), "");
-    a.Free(blocks[0]);
-    a.Free(blocks[2]);
-    for (int i = 1; i < 6; ++i)
-        a.Free(fences[i]);
-    for (int i = 3; i < 6; ++i)
-        a.Free(blocks[i]);
-    EXPECT_EQ(problems(a), "");
-    EXPECT_TRUE(a.empty()) << "everything merged back into the reserved page";
+        // Take the list head itself out through a merge while its list has members.
+        a.Free(blocks[0]);
+        a.Free(blocks[1]);
+        a.Free(blocks[2]);
+        a.Free(fences[0]); // merges with blocks[0], the oldest and so the head
+        EXPECT_EQ(problems(a), "");
+        EXPECT_EQ(alloc(a, size), blocks[2]) << "the list member took the head's place";
+        EXPECT_EQ(alloc(a, size), blocks[0]) << "carved from the merged block";
+        EXPECT_EQ(problems(a), "");
+        a.Free(blocks[0]);
+        a.Free(blocks[2]);
+        for (int i = 1; i < 6; ++i)
+            a.Free(fences[i]);
+        for (int i = 3; i < 6; ++i)
+            a.Free(blocks[i]);
+        EXPECT_EQ(problems(a), "");
+        EXPECT_TRUE(a.empty()) << "everything merged back into the reserved page";
+        EXPECT_EQ(s.allocCalls, 1u);
+    }
 }
 
 TEST(VariableSizeAllocatorTest, ReservedPageAndPageReturn) {
@@ -399,7 +404,8 @@ TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
         unsigned int failEvery; // 0: reliable supplier
     };
     // 5000 bytes: the last block of each page is not a multiple of 8 (4 bytes over).
-    for (const Setup setup : {Setup{4096, 0}, Setup{4096, 5}, Setup{5004, 0}}) {
+    // 20000 bytes: most free sizes are above the bins and live in the tree.
+    for (const Setup setup : {Setup{4096, 0}, Setup{4096, 5}, Setup{5004, 0}, Setup{20000, 0}}) {
         const unsigned int pageSize = setup.pageSize;
         SCOPED_TRACE("page size " + std::to_string(pageSize) + ", supplier failing every " +
                      std::to_string(setup.failEvery) + "th call");

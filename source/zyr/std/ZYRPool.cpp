@@ -2,7 +2,6 @@
 #include "zyr/std/ZYRPool.h"
 
 #include <algorithm>
-#include <climits>
 #include <cstdlib>
 #include <new>
 
@@ -119,18 +118,6 @@ unsigned int nextSetBit(const uint64_t* bits, unsigned int from, unsigned int co
     return word * 64 + static_cast<unsigned int>(__builtin_ctzll(w));
 }
 
-// The last set bit before `before`, or UINT_MAX.
-unsigned int previousSetBit(const uint64_t* bits, unsigned int before) {
-    unsigned int word = before / 64;
-    uint64_t w = before % 64 ? bits[word] & ((uint64_t{1} << (before % 64)) - 1) : 0;
-    while (w == 0) {
-        if (word == 0)
-            return UINT_MAX;
-        w = bits[--word];
-    }
-    return word * 64 + 63 - static_cast<unsigned int>(__builtin_clzll(w));
-}
-
 uintptr_t address(const void* p) {
     return reinterpret_cast<uintptr_t>(p);
 }
@@ -244,8 +231,8 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
 
     unsigned char* h;
     FreeBlock* below = nullptr;
-    FreeBlock* node = bestFit(n, below);
-    if (!node) {
+    FreeBlock* head = bestFit(n, below);
+    if (!head) {
         unsigned char* page = reservedPage_;
         if (page) {
             reservedPage_ = nullptr;
@@ -259,27 +246,24 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
         }
         layOutPage(page);
         h = firstHeader(page);
-    } else if (FreeBlock* member = node->nextSameSize()) {
-        // The node stays in the tree while its size list has members: the most recently
-        // freed member goes first.
+    } else if (FreeBlock* member = head->nextSameSize()) {
+        // The head stays while its list has members: the most recently freed member goes
+        // first.
         FreeBlock* after = member->nextSameSize();
-        node->setNextSameSize(after);
+        head->setNextSameSize(after);
         if (after)
-            after->setPrevSameSize(node);
+            after->setPrevSameSize(head);
         h = headerOf(member);
     } else {
-        h = headerOf(node);
+        h = headerOf(head);
     }
 
     store32(h, load32(h) & ~kFreeBit);
     const uint32_t blockSize = sizeOf(h);
-    const bool split = uint64_t{blockSize} >= uint64_t{n} + kMinBlockSize + 8;
-    const bool nodeLeaves = node && headerOf(node) == h;
-    if (!split) {
-        if (nodeLeaves) {
-            UnlinkNode(node);
-            indexErase(blockSize);
-        }
+    const bool headLeaves = head && headerOf(head) == h;
+    if (uint64_t{blockSize} < uint64_t{n} + kMinBlockSize + 8) {
+        if (headLeaves)
+            dropHead(head, blockSize);
         return h + 8;
     }
 
@@ -292,19 +276,16 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
     unsigned char* after = rest + 8 + restSize;
     if (!isSentinel(after))
         setPrevSize(after, restSize);
-    if (nodeLeaves && (!below || below->key() < restSize)) {
-        // No free size lies between the node's predecessor and the rest, so the rest can
-        // take the node's place in the tree without a search or rebalancing.
-        FreeBlock* restNode = ::new (static_cast<void*>(rest + 8)) FreeBlock();
-        ReplaceNode(node, restNode);
-        indexErase(blockSize);
-        indexInsert(restSize, restNode);
+    if (headLeaves && !isBinned(blockSize) && !isBinned(restSize) &&
+        (!below || below->key() < restSize)) {
+        // No free size in the tree lies between the node's predecessor and the rest, so the
+        // rest can take the node's place without a search or rebalancing.
+        ReplaceNode(head, ::new (static_cast<void*>(rest + 8)) FreeBlock());
+        unbinnedSmallSizes_ += (restSize < kBinLimit) - (blockSize < kBinLimit);
         return h + 8;
     }
-    if (nodeLeaves) {
-        UnlinkNode(node);
-        indexErase(blockSize);
-    }
+    if (headLeaves)
+        dropHead(head, blockSize);
     fileBlock(rest, restSize);
     return h + 8;
 }
@@ -404,28 +385,38 @@ unsigned int VariableSizeAllocator::release(unsigned char* h) {
 void VariableSizeAllocator::fileBlock(unsigned char* h, unsigned int size) {
     store32(h, load32(h) | kFreeBit);
     FreeBlock* block = ::new (static_cast<void*>(h + 8)) FreeBlock();
+    FreeBlock* head;
     ZYRStd::tree_search_state<FreeBlock> state;
-    FreeBlock* node;
-    if (isIndexed(size)) {
-        node = nodeOfSize_[size / 8];
-        if (!node && unindexedSmallSizes_ == 0)
-            placeBesideNeighbours(state, size);
-        else if (!node)
-            SetSearchState(state, size);
-    } else {
-        node = SetSearchState(state, size) ? state.found : nullptr;
-    }
-    if (node) {
-        FreeBlock* after = node->nextSameSize();
-        block->setOwnerFlag(true);
-        block->setPrevSameSize(node);
-        block->setNextSameSize(after);
-        if (after)
-            after->setPrevSameSize(block);
-        node->setNextSameSize(block);
+    if (isBinned(size)) {
+        head = binHead_[size / 8];
+        if (!head) {
+            binHead_[size / 8] = block;
+            binPresent_[size / 512] |= uint64_t{1} << (size / 8 % 64);
+            return;
+        }
+    } else if (SetSearchState(state, size)) {
+        head = state.found;
     } else {
         InsertNodeReference(state, block);
-        indexInsert(size, block);
+        unbinnedSmallSizes_ += size < kBinLimit;
+        return;
+    }
+    FreeBlock* after = head->nextSameSize();
+    block->setOwnerFlag(true);
+    block->setPrevSameSize(head);
+    block->setNextSameSize(after);
+    if (after)
+        after->setPrevSameSize(block);
+    head->setNextSameSize(block);
+}
+
+void VariableSizeAllocator::dropHead(FreeBlock* head, unsigned int size) {
+    if (isBinned(size)) {
+        binHead_[size / 8] = nullptr;
+        binPresent_[size / 512] &= ~(uint64_t{1} << (size / 8 % 64));
+    } else {
+        UnlinkNode(head);
+        unbinnedSmallSizes_ -= size < kBinLimit;
     }
 }
 
@@ -437,92 +428,38 @@ void VariableSizeAllocator::unfile(unsigned char* h) {
         before->setNextSameSize(after);
         if (after)
             after->setPrevSameSize(before);
-    } else if (after) {
-        // The first list member takes the node's place; the rest of the list follows it.
-        after->setOwnerFlag(false);
+        return;
+    }
+    if (!after) {
+        dropHead(block, sizeOf(h));
+        return;
+    }
+    // The first list member heads the list in the block's place.
+    after->setOwnerFlag(false);
+    const uint32_t size = sizeOf(h);
+    if (isBinned(size)) {
+        after->setPrevSameSize(nullptr);
+        binHead_[size / 8] = after;
+    } else {
         ReplaceNode(block, after);
-        indexRepoint(sizeOf(h), after);
-    } else {
-        UnlinkNode(block);
-        indexErase(sizeOf(h));
     }
-}
-
-FreeBlock* VariableSizeAllocator::bestFit(unsigned int n, FreeBlock*& below) const {
-    if (n >= kIndexLimit || unindexedSmallSizes_ != 0)
-        return GetMinGTOrEqNode(n, below);
-    const unsigned int slot = n / 8;
-    const unsigned int under = previousSetBit(sizePresent_, slot);
-    below = under < kIndexSlots ? nodeOfSize_[under] : nullptr;
-    const unsigned int over = nextSetBit(sizePresent_, slot, kIndexSlots);
-    if (over < kIndexSlots)
-        return nodeOfSize_[over];
-    // No free size in [n, kIndexLimit): the answer lies above, and `below` is right already.
-    FreeBlock* ignored;
-    return GetMinGTOrEqNode(kIndexLimit, ignored);
-}
-
-// A new node belongs right of its in-order predecessor or, when that has a right child,
-// left of its successor, the leftmost node of that subtree. The index names the
-// predecessor, so no descent from the root is needed.
-void VariableSizeAllocator::placeBesideNeighbours(ZYRStd::tree_search_state<FreeBlock>& state,
-                                                  unsigned int size) const {
-    state = ZYRStd::tree_search_state<FreeBlock>{};
-    const unsigned int slot = size / 8;
-    const unsigned int under = previousSetBit(sizePresent_, slot);
-    if (under < kIndexSlots) {
-        FreeBlock* predecessor = nodeOfSize_[under];
-        FreeBlock* n = predecessor->right();
-        if (!n) {
-            state.parent = predecessor;
-            return;
-        }
-        while (n->left())
-            n = n->left();
-        state.parent = n;
-        state.asLeftChild = true;
-        return;
-    }
-    // Nothing smaller: the node goes left of the tree's minimum.
-    FreeBlock* minimum = root();
-    if (!minimum)
-        return;
-    const unsigned int over = nextSetBit(sizePresent_, slot, kIndexSlots);
-    if (over < kIndexSlots) {
-        minimum = nodeOfSize_[over];
-    } else {
-        while (minimum->left())
-            minimum = minimum->left();
-    }
-    state.parent = minimum;
-    state.asLeftChild = true;
-}
-
-void VariableSizeAllocator::indexInsert(unsigned int size, FreeBlock* node) {
-    if (isIndexed(size)) {
-        nodeOfSize_[size / 8] = node;
-        sizePresent_[size / 512] |= uint64_t{1} << (size / 8 % 64);
-    } else if (size < kIndexLimit) {
-        ++unindexedSmallSizes_;
-    }
-}
-
-void VariableSizeAllocator::indexErase(unsigned int size) {
-    if (isIndexed(size)) {
-        nodeOfSize_[size / 8] = nullptr;
-        sizePresent_[size / 512] &= ~(uint64_t{1} << (size / 8 % 64));
-    } else if (size < kIndexLimit) {
-        --unindexedSmallSizes_;
-    }
-}
-
-void VariableSizeAllocator::indexRepoint(unsigned int size, FreeBlock* node) {
-    if (isIndexed(size))
-        nodeOfSize_[size / 8] = node;
 }
 
 void VariableSizeAllocator::RemoveBlock(BlkHeader* header) {
     unfile(reinterpret_cast<unsigned char*>(header));
+}
+
+FreeBlock* VariableSizeAllocator::bestFit(unsigned int n, FreeBlock*& below) const {
+    below = nullptr;
+    if (n >= kBinLimit)
+        return GetMinGTOrEqNode(n, below);
+    const unsigned int slot = nextSetBit(binPresent_, n / 8, kBinSlots);
+    FreeBlock* binned = slot < kBinSlots ? binHead_[slot] : nullptr;
+    // The tree holds small sizes only when pages end in blocks that are not multiples of 8.
+    if (binned && unbinnedSmallSizes_ == 0)
+        return binned;
+    FreeBlock* inTree = GetMinGTOrEqNode(n, below);
+    return binned && (!inTree || slot * 8 < inTree->key()) ? binned : inTree;
 }
 
 unsigned int VariableSizeAllocator::GetPtrSize(void* p) const {
@@ -536,10 +473,33 @@ unsigned int VariableSizeAllocator::GetPtrSize(void* p) const {
 
 bool VariableSizeAllocator::isFiled(const unsigned char* h, unsigned int size) const {
     const FreeBlock* wanted = nodeAt(h);
-    for (const FreeBlock* b = FindNode(size); b; b = b->nextSameSize())
+    for (const FreeBlock* b = isBinned(size) ? binHead_[size / 8] : FindNode(size); b;
+         b = b->nextSameSize())
         if (b == wanted)
             return true;
     return false;
+}
+
+// A list of same-size blocks from its head; null when sound, else what is broken.
+const char* VariableSizeAllocator::checkSizeList(const FreeBlock* head, unsigned long long& filed,
+                                                 unsigned long long maxBlocks) const {
+    if (head->inSizeList())
+        return "a list head is marked as a list member";
+    if (!isFree(headerOf(head)))
+        return "a filed block is not marked free";
+    ++filed;
+    const FreeBlock* before = head;
+    for (const FreeBlock* m = head->nextSameSize(); m; before = m, m = m->nextSameSize()) {
+        if (++filed > maxBlocks)
+            return "a size list does not end";
+        if (!m->inSizeList() || m->prevSameSize() != before)
+            return "a size list is not linked both ways";
+        if (m->key() != head->key())
+            return "a size list holds a block of another size";
+        if (!isFree(headerOf(m)))
+            return "a filed block is not marked free";
+    }
+    return nullptr;
 }
 
 const char* VariableSizeAllocator::checkInvariants() const {
@@ -550,43 +510,26 @@ const char* VariableSizeAllocator::checkInvariants() const {
     // Bounds every list walk, so that a cycle is reported rather than followed forever.
     const unsigned long long maxBlocks = held_ / (kMinBlockSize + 8) + 1;
     unsigned long long filed = 0;
+    unsigned int smallInTree = 0;
     for (auto it = begin(); it != end(); ++it) {
-        const FreeBlock* node = it.get();
-        if (node->inSizeList())
-            return "a tree node is marked as a size-list member";
-        if (!isFree(headerOf(node)))
-            return "a filed block is not marked free";
-        ++filed;
-        const FreeBlock* before = node;
-        for (const FreeBlock* m = node->nextSameSize(); m; before = m, m = m->nextSameSize()) {
-            if (++filed > maxBlocks)
-                return "a size list does not end";
-            if (!m->inSizeList() || m->prevSameSize() != before)
-                return "a size list is not linked both ways";
-            if (m->key() != node->key())
-                return "a size list holds a block of another size";
-            if (!isFree(headerOf(m)))
-                return "a filed block is not marked free";
-        }
+        if (isBinned(it->key()))
+            return "a size that belongs in a bin is in the tree";
+        smallInTree += it->key() < kBinLimit;
+        if (const char* why = checkSizeList(it.get(), filed, maxBlocks))
+            return why;
     }
-
-    unsigned int unindexed = 0;
-    for (auto it = begin(); it != end(); ++it) {
-        const unsigned int key = it->key();
-        if (isIndexed(key) && nodeOfSize_[key / 8] != it.get())
-            return "the size index misses a tree node";
-        if (!isIndexed(key) && key < kIndexLimit)
-            ++unindexed;
-    }
-    if (unindexed != unindexedSmallSizes_)
-        return "the count of unindexed small sizes is wrong";
-    for (unsigned int slot = 0; slot < kIndexSlots; ++slot) {
-        const FreeBlock* node = nodeOfSize_[slot];
-        const bool present = (sizePresent_[slot / 64] >> (slot % 64)) & 1;
-        if (present != (node != nullptr))
-            return "the size index's bitmap disagrees with its slots";
-        if (node && FindNode(slot * 8) != node)
-            return "the size index names a block that is not the tree node of its size";
+    if (smallInTree != unbinnedSmallSizes_)
+        return "the count of small sizes in the tree is wrong";
+    for (unsigned int slot = 0; slot < kBinSlots; ++slot) {
+        const FreeBlock* head = binHead_[slot];
+        if (((binPresent_[slot / 64] >> (slot % 64)) & 1) != (head != nullptr))
+            return "a bin's bit disagrees with its list";
+        if (!head)
+            continue;
+        if (head->key() != slot * 8)
+            return "a bin holds a block of another size";
+        if (const char* why = checkSizeList(head, filed, maxBlocks))
+            return why;
     }
 
     unsigned long long pageBytes = 0;

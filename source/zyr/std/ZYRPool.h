@@ -32,10 +32,10 @@ struct BlkHeader {
     unsigned int size;
 };
 
-// The free-tree node, built in place at a free block's user pointer; its key is the size
-// word just in front of it. The tree holds one node per free size; further free blocks of
-// that size hang in a list after it. Such a list member is not in the tree, so it keeps its
-// list predecessor in the left link and says so with the owner flag.
+// Built in place at a free block's user pointer; its key is the size word just in front of
+// it. The free blocks of one size form a list: its head is a node of the free tree (or, for
+// small sizes, sits in a bin), and the others hang after it. A list member is not in the
+// tree, so it keeps its list predecessor in the left link and says so with the owner flag.
 class FreeBlock : public ZYRStd::redblack_node<unsigned int, FreeBlock, ZYRStd::ZYRRBParent> {
 public:
     unsigned int key() const {
@@ -53,7 +53,8 @@ private:
     FreeBlock* next_ = nullptr;
 };
 
-// A best-fit allocator over pages with boundary tags and a free tree keyed by size.
+// A best-fit allocator over pages with boundary tags and a free tree keyed by size (with
+// bins for small sizes).
 // Requests above the page size get a block of their own ("large" blocks). Not thread-safe:
 // the owning client serialises its use.
 class ZYRSTD_API VariableSizeAllocator : public ZYRStd::I_VariableSizeAllocator,
@@ -114,14 +115,14 @@ private:
     void unregisterPage(unsigned char* page);
     void noteHeld(unsigned long long bytes);
     bool isFiled(const unsigned char* header, unsigned int size) const;
-    static bool isIndexed(unsigned int size) { return size < kIndexLimit && size % 8 == 0; }
-    // The tree node with the smallest size at least n; `below` gets the largest size under n.
+    static bool isBinned(unsigned int size) { return size < kBinLimit && size % 8 == 0; }
+    // The head of the free blocks of the smallest size at least n (a bin head or a tree
+    // node); when it comes from the tree, `below` gets the tree node just under n.
     FreeBlock* bestFit(unsigned int n, FreeBlock*& below) const;
-    void placeBesideNeighbours(ZYRStd::tree_search_state<FreeBlock>& state,
-                               unsigned int size) const;
-    void indexInsert(unsigned int size, FreeBlock* node);
-    void indexErase(unsigned int size);
-    void indexRepoint(unsigned int size, FreeBlock* node);
+    // Takes a list head that has no members out of its bin or the tree.
+    void dropHead(FreeBlock* head, unsigned int size);
+    const char* checkSizeList(const FreeBlock* head, unsigned long long& filed,
+                              unsigned long long maxBlocks) const;
 
     unsigned int initialPages_;
     unsigned int reservedCount_;
@@ -143,15 +144,16 @@ private:
     unsigned int pageCapacity_ = 0;
     unsigned long long liveLargeBytes_ = 0;
 
-    // Tree nodes of sizes below kIndexLimit that are multiples of 8 are also found here by
-    // size, so that small best-fit and exact lookups need no descent of the tree.
-    static constexpr unsigned int kIndexLimit = 4096;
-    static constexpr unsigned int kIndexSlots = kIndexLimit / 8;
-    FreeBlock* nodeOfSize_[kIndexSlots] = {};
-    uint64_t sizePresent_[kIndexSlots / 64] = {};
-    // Tree sizes below kIndexLimit that are not multiples of 8 (the last block of a page of
-    // such a size); while there are any, best-fit lookups descend the tree.
-    unsigned int unindexedSmallSizes_ = 0;
+    // Free sizes below kBinLimit that are multiples of 8 head their lists from a bin with a
+    // presence bit instead of a tree node: best fit is then a bit scan, and filing or taking
+    // a block of such a size needs no tree search or rebalancing.
+    static constexpr unsigned int kBinLimit = 4096;
+    static constexpr unsigned int kBinSlots = kBinLimit / 8;
+    FreeBlock* binHead_[kBinSlots] = {};
+    uint64_t binPresent_[kBinSlots / 64] = {};
+    // Tree sizes below kBinLimit (the last block of a page whose size is not a multiple of
+    // 8); while there are any, small best-fit lookups also search the tree.
+    unsigned int unbinnedSmallSizes_ = 0;
 };
 
 // One slot of a FixedSizeAllocator pool; while free it links the pool's free list.
