@@ -15,7 +15,7 @@ namespace {
 
 constexpr const char* kSource = "source/zyr/std/CZYRDataBuffer";
 
-class IImp_ZYRDataBuffer final : public I_DataBuffer, public CZYRClientBase {
+class IImp_ZYRDataBuffer final : public CZYRPublicObject<I_DataBuffer> {
 public:
     IImp_ZYRDataBuffer(const char* data, unsigned int length, ZYRPublic::I_Error& err)
         : id_(createUniqueID()) {
@@ -57,46 +57,16 @@ I_DataBuffer* createDataBuffer(const char* data, unsigned int length, ZYRPublic:
         [&]() -> I_DataBuffer* { return new IImp_ZYRDataBuffer(data, length, err); });
 }
 
-CZYRDataBuffer::CZYRDataBuffer(const CZYRDataBuffer& other) : CZYRClientBase(), impl_(other.impl_) {
-    if (impl_)
-        impl_->addRef();
-}
-
-CZYRDataBuffer::CZYRDataBuffer(const C_SmartPtr<I_DataBuffer>& buffer) : impl_(buffer.get()) {
-    if (impl_)
-        impl_->addRef();
-}
-
-CZYRDataBuffer::CZYRDataBuffer(I_DataBuffer* buffer, bool addRef) : impl_(buffer) {
-    if (impl_ && addRef)
-        impl_->addRef();
-}
-
 CZYRDataBuffer::CZYRDataBuffer(const char* data, unsigned int length) {
     C_Error err;
-    impl_ = createDataBuffer(data, length, err);
+    adopt(createDataBuffer(data, length, err));
     if (err.errorOccurred()) {
-        if (impl_)
-            std::exchange(impl_, nullptr)->release();
+        adopt(nullptr);
         throwCZYRErrorIfErrorOccurred(err);
     }
 }
 
-CZYRDataBuffer& CZYRDataBuffer::operator=(const CZYRDataBuffer& other) {
-    if (other.impl_ != impl_) {
-        if (other.impl_)
-            other.impl_->addRef();
-        I_DataBuffer* old = std::exchange(impl_, other.impl_);
-        if (old)
-            old->release();
-    }
-    return *this;
-}
-
-CZYRDataBuffer::~CZYRDataBuffer() {
-    if (impl_)
-        impl_->release();
-}
+CZYRDataBuffer::~CZYRDataBuffer() = default;
 
 unsigned long long CZYRDataBuffer::getUniqueID() const {
     if (!impl_)

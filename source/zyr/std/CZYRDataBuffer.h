@@ -5,7 +5,7 @@
 #include "I_DataBuffer.h"
 #include "I_Error.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRPublicObject.h"
 
 namespace ZYRStd {
 
@@ -17,28 +17,24 @@ using ZYRPublic::I_DataBuffer;
 ZYRSTD_API I_DataBuffer* createDataBuffer(const char* data, unsigned int length,
                                           ZYRPublic::I_Error& err);
 
-class ZYRSTD_API CZYRDataBuffer : public CZYRClientBase {
+class ZYRSTD_API CZYRDataBuffer : public CZYRInterfaceValue<I_DataBuffer> {
 public:
     CZYRDataBuffer() = default;
-    CZYRDataBuffer(const CZYRDataBuffer& other);
-    CZYRDataBuffer(const C_SmartPtr<I_DataBuffer>& buffer);
-    CZYRDataBuffer(I_DataBuffer* buffer, bool addRef);
+    CZYRDataBuffer(const CZYRDataBuffer& other) = default;
+    CZYRDataBuffer(CZYRDataBuffer&& other) noexcept = default;
+    CZYRDataBuffer(const C_SmartPtr<I_DataBuffer>& buffer)
+        : CZYRInterfaceValue(buffer.get(), true) {}
+    CZYRDataBuffer(I_DataBuffer* buffer, bool addRef) : CZYRInterfaceValue(buffer, addRef) {}
     // Throws what createDataBuffer recorded.
     CZYRDataBuffer(const char* data, unsigned int length);
-    CZYRDataBuffer& operator=(const CZYRDataBuffer& other);
+    CZYRDataBuffer& operator=(const CZYRDataBuffer& other) = default;
+    CZYRDataBuffer& operator=(CZYRDataBuffer&& other) noexcept = default;
     ~CZYRDataBuffer() override;
-
-    operator C_SmartPtr<I_DataBuffer>() const { return C_SmartPtr<I_DataBuffer>(impl_, true); }
-    I_DataBuffer* getImpl() const { return impl_; }
-    bool isValid() const { return impl_ != nullptr; }
     const char* getBuffer() const { return impl_ ? impl_->getBuffer() : nullptr; }
     unsigned int getLength() const { return impl_ ? impl_->getLength() : 0; }
     // Throws kZYRErrorInvalidObject for an invalid wrapper.
     unsigned long long getUniqueID() const;
     unsigned int debugRefCount() const { return impl_ ? impl_->debugGetRefCount() : 0; }
-
-private:
-    I_DataBuffer* impl_ = nullptr;
 };
 
 } // namespace ZYRStd

@@ -196,14 +196,16 @@ bool dispatch(I_DictEnumProcs* procs, I_UniString* key, const CZYRValue& value, 
 }
 
 // The count, identity and finalized flag every container has.
-class ContainerBase : public CZYRClientBase {
+template <class Interface> class ContainerBase : public CZYRPublicObject<Interface> {
+public:
+    uint64_t getUniqueID() const override { return id_; }
+
 protected:
     void refuseIfFinalized() const {
         if (finalized_)
             raise(kZYRErrorFinalized, "Finalized objects can't be modified", __LINE__);
     }
 
-    CZYRPublicRefCountBase rc_;
     uint64_t id_ = createUniqueID();
     bool finalized_ = false;
 };
@@ -258,7 +260,7 @@ uint32_t bucketCountFor(uint64_t needed) {
     return found == kBucketPrimes.end() ? kBucketPrimes.back() : *found;
 }
 
-class IImp_ZYRDict final : public I_Dict, public ContainerBase {
+class IImp_ZYRDict final : public ContainerBase<I_Dict> {
 public:
     IImp_ZYRDict() : buckets_(193, nullptr) {}
     ~IImp_ZYRDict() override {
@@ -266,16 +268,6 @@ public:
             while (head)
                 destroy(std::exchange(head, head->next));
     }
-
-    void addRef() override { rc_.addRef(); }
-    void release() override {
-        if (rc_.release())
-            delete this;
-    }
-    bool isShared() const override { return rc_.isShared(); }
-    unsigned int debugGetRefCount() const override { return rc_.debugGetRefCount(); }
-    const unsigned int* debugGetRefCountAddr() const override { return rc_.debugGetRefCountAddr(); }
-    uint64_t getUniqueID() const override { return id_; }
 
     void enumerate(I_DictEnumProcs* procs, I_Error& err) override {
         ZYRErrorBoundaryVoid(err, "Error in IImp_ZYRDict::enumerate", kSource, __LINE__, [&] {
@@ -469,18 +461,8 @@ private:
 
 // ---- array --------------------------------------------------------------------------------
 
-class IImp_ZYRArray final : public I_Array, public ContainerBase {
+class IImp_ZYRArray final : public ContainerBase<I_Array> {
 public:
-    void addRef() override { rc_.addRef(); }
-    void release() override {
-        if (rc_.release())
-            delete this;
-    }
-    bool isShared() const override { return rc_.isShared(); }
-    unsigned int debugGetRefCount() const override { return rc_.debugGetRefCount(); }
-    const unsigned int* debugGetRefCountAddr() const override { return rc_.debugGetRefCountAddr(); }
-    uint64_t getUniqueID() const override { return id_; }
-
     void set(unsigned int i, I_DataBuffer* value, I_Error& err) override { store(i, value, err); }
     void set(unsigned int i, I_Array* value, I_Error& err) override { store(i, value, err); }
     void set(unsigned int i, I_Dict* value, I_Error& err) override { store(i, value, err); }
@@ -698,15 +680,6 @@ bool getScalar(Container* impl, Where where, T* out, bool throwIfMissing) {
     return missing(found, throwIfMissing);
 }
 
-template <class Interface> void shareInto(Interface*& impl, Interface* other) {
-    if (other == impl)
-        return;
-    if (other)
-        other->addRef();
-    if (Interface* old = std::exchange(impl, other))
-        old->release();
-}
-
 } // namespace
 
 // ---- factories ----------------------------------------------------------------------------
@@ -723,35 +696,9 @@ I_Array* createArray(ZYRPublic::I_Error& err) {
 
 // ---- CZYRDict -----------------------------------------------------------------------------
 
-CZYRDict::CZYRDict() : impl_(throwing([](C_Error& err) { return createDict(err); })) {}
-CZYRDict::CZYRDict(const CZYRDict& other) : CZYRClientBase(), impl_(other.impl_) {
-    if (impl_)
-        impl_->addRef();
-}
-CZYRDict::CZYRDict(CZYRDict&& other) noexcept
-    : CZYRClientBase(), impl_(std::exchange(other.impl_, nullptr)) {}
-CZYRDict::CZYRDict(const C_SmartPtr<I_Dict>& dict) : impl_(dict.get()) {
-    if (impl_)
-        impl_->addRef();
-}
-CZYRDict::CZYRDict(I_Dict* dict, bool addRef) : impl_(dict) {
-    if (impl_ && addRef)
-        impl_->addRef();
-}
-CZYRDict& CZYRDict::operator=(const CZYRDict& other) {
-    shareInto(impl_, other.impl_);
-    return *this;
-}
-CZYRDict& CZYRDict::operator=(CZYRDict&& other) noexcept {
-    if (this != &other)
-        if (I_Dict* old = std::exchange(impl_, std::exchange(other.impl_, nullptr)))
-            old->release();
-    return *this;
-}
-CZYRDict::~CZYRDict() {
-    if (impl_)
-        impl_->release();
-}
+CZYRDict::CZYRDict()
+    : CZYRInterfaceValue(throwing([](C_Error& err) { return createDict(err); }), false) {}
+CZYRDict::~CZYRDict() = default;
 
 I_Dict* CZYRDict::valid() const {
     if (!impl_)
@@ -837,35 +784,9 @@ unsigned long long CZYRDict::getUniqueID() const {
 
 // ---- CZYRArray ----------------------------------------------------------------------------
 
-CZYRArray::CZYRArray() : impl_(throwing([](C_Error& err) { return createArray(err); })) {}
-CZYRArray::CZYRArray(const CZYRArray& other) : CZYRClientBase(), impl_(other.impl_) {
-    if (impl_)
-        impl_->addRef();
-}
-CZYRArray::CZYRArray(CZYRArray&& other) noexcept
-    : CZYRClientBase(), impl_(std::exchange(other.impl_, nullptr)) {}
-CZYRArray::CZYRArray(const C_SmartPtr<I_Array>& array) : impl_(array.get()) {
-    if (impl_)
-        impl_->addRef();
-}
-CZYRArray::CZYRArray(I_Array* array, bool addRef) : impl_(array) {
-    if (impl_ && addRef)
-        impl_->addRef();
-}
-CZYRArray& CZYRArray::operator=(const CZYRArray& other) {
-    shareInto(impl_, other.impl_);
-    return *this;
-}
-CZYRArray& CZYRArray::operator=(CZYRArray&& other) noexcept {
-    if (this != &other)
-        if (I_Array* old = std::exchange(impl_, std::exchange(other.impl_, nullptr)))
-            old->release();
-    return *this;
-}
-CZYRArray::~CZYRArray() {
-    if (impl_)
-        impl_->release();
-}
+CZYRArray::CZYRArray()
+    : CZYRInterfaceValue(throwing([](C_Error& err) { return createArray(err); }), false) {}
+CZYRArray::~CZYRArray() = default;
 
 I_Array* CZYRArray::valid() const {
     if (!impl_)

@@ -6,8 +6,8 @@
 #include "C_SmartPtr.h"
 #include "I_Dict.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
 #include "zyr/std/CZYRDataBuffer.h"
+#include "zyr/std/CZYRPublicObject.h"
 #include "zyr/std/CZYRUniString.h"
 
 namespace ZYRStd {
@@ -25,20 +25,16 @@ class CZYRArray;
 class CZYRDictEnumProcs;
 
 // A shared dictionary; copies share contents. Failures are thrown as CZYRError.
-class ZYRSTD_API CZYRDict : public CZYRClientBase {
+class ZYRSTD_API CZYRDict : public CZYRInterfaceValue<I_Dict> {
 public:
     CZYRDict(); // a new, empty dictionary
-    CZYRDict(const CZYRDict& other);
-    CZYRDict(CZYRDict&& other) noexcept;
-    CZYRDict(const C_SmartPtr<I_Dict>& dict);
-    CZYRDict(I_Dict* dict, bool addRef);
-    CZYRDict& operator=(const CZYRDict& other);
-    CZYRDict& operator=(CZYRDict&& other) noexcept;
+    CZYRDict(const CZYRDict& other) = default;
+    CZYRDict(CZYRDict&& other) noexcept = default;
+    CZYRDict(const C_SmartPtr<I_Dict>& dict) : CZYRInterfaceValue(dict.get(), true) {}
+    CZYRDict(I_Dict* dict, bool addRef) : CZYRInterfaceValue(dict, addRef) {}
+    CZYRDict& operator=(const CZYRDict& other) = default;
+    CZYRDict& operator=(CZYRDict&& other) noexcept = default;
     ~CZYRDict() override;
-
-    operator C_SmartPtr<I_Dict>() const { return C_SmartPtr<I_Dict>(impl_, true); }
-    I_Dict* getImpl() const { return impl_; }
-    bool isValid() const { return impl_ != nullptr; }
 
     void set(const CZYRUniString& key, const CZYRUniString& value);
     void set(const CZYRUniString& key, const CZYRDict& value);
@@ -70,25 +66,19 @@ public:
 
 private:
     I_Dict* valid() const;
-
-    I_Dict* impl_ = nullptr;
 };
 
 // A shared array; copies share contents. Failures are thrown as CZYRError.
-class ZYRSTD_API CZYRArray : public CZYRClientBase {
+class ZYRSTD_API CZYRArray : public CZYRInterfaceValue<I_Array> {
 public:
     CZYRArray(); // a new, empty array
-    CZYRArray(const CZYRArray& other);
-    CZYRArray(CZYRArray&& other) noexcept;
-    CZYRArray(const C_SmartPtr<I_Array>& array);
-    CZYRArray(I_Array* array, bool addRef);
-    CZYRArray& operator=(const CZYRArray& other);
-    CZYRArray& operator=(CZYRArray&& other) noexcept;
+    CZYRArray(const CZYRArray& other) = default;
+    CZYRArray(CZYRArray&& other) noexcept = default;
+    CZYRArray(const C_SmartPtr<I_Array>& array) : CZYRInterfaceValue(array.get(), true) {}
+    CZYRArray(I_Array* array, bool addRef) : CZYRInterfaceValue(array, addRef) {}
+    CZYRArray& operator=(const CZYRArray& other) = default;
+    CZYRArray& operator=(CZYRArray&& other) noexcept = default;
     ~CZYRArray() override;
-
-    operator C_SmartPtr<I_Array>() const { return C_SmartPtr<I_Array>(impl_, true); }
-    I_Array* getImpl() const { return impl_; }
-    bool isValid() const { return impl_ != nullptr; }
 
     // Setting past the end grows the array; the elements in between are holes.
     void set(unsigned int index, const CZYRUniString& value);
@@ -120,8 +110,6 @@ public:
 
 private:
     I_Array* valid() const;
-
-    I_Array* impl_ = nullptr;
 };
 
 // Enumeration callbacks in wrapper types; true means "go on".

@@ -75,7 +75,7 @@ struct ConverterClose {
     void operator()(UConverter* converter) const noexcept { ucnv_close(converter); }
 };
 
-class IImp_ZYRUniString final : public I_UniString, public CZYRClientBase {
+class IImp_ZYRUniString final : public CZYRPublicObject<I_UniString> {
 public:
     // From bytes in `encoding`; `nullEncodingIsError` for the overload that names a length.
     IImp_ZYRUniString(const char* text, size_t length, const char* encoding,
@@ -103,14 +103,6 @@ public:
     explicit IImp_ZYRUniString(const icu::UnicodeString& text)
         : id_(createUniqueID()), text_(text) {}
 
-    void addRef() override { rc_.addRef(); }
-    void release() override {
-        if (rc_.release())
-            delete this;
-    }
-    bool isShared() const override { return rc_.isShared(); }
-    unsigned int debugGetRefCount() const override { return rc_.debugGetRefCount(); }
-    const unsigned int* debugGetRefCountAddr() const override { return rc_.debugGetRefCountAddr(); }
     uint64_t getUniqueID() const override { return id_; }
 
     void convert(char16_t* buffer, unsigned int* size, I_Error& err) const override {
@@ -193,7 +185,6 @@ private:
     const char* data() const { return reinterpret_cast<const char*>(text_.getBuffer()); }
     unsigned int byteLength() const { return static_cast<unsigned int>(text_.length()) * 2; }
 
-    CZYRPublicRefCountBase rc_;
     uint64_t id_ = 0;
     icu::UnicodeString text_;
 };
@@ -294,24 +285,6 @@ I_UniString* createUniString(const char16_t* text, I_Error& err) {
 
 // ---- CZYRUniString -------------------------------------------------------------------------
 
-CZYRUniString::CZYRUniString(const CZYRUniString& other) : CZYRClientBase(), impl_(other.impl_) {
-    if (impl_)
-        impl_->addRef();
-}
-
-CZYRUniString::CZYRUniString(CZYRUniString&& other) noexcept
-    : CZYRClientBase(), impl_(std::exchange(other.impl_, nullptr)) {}
-
-CZYRUniString::CZYRUniString(const C_SmartPtr<I_UniString>& s) : impl_(s.get()) {
-    if (impl_)
-        impl_->addRef();
-}
-
-CZYRUniString::CZYRUniString(I_UniString* s, bool addRef) : impl_(s) {
-    if (impl_ && addRef)
-        impl_->addRef();
-}
-
 CZYRUniString::CZYRUniString(const char* text, const char* encoding) {
     C_Error err;
     intern(createUniString(text, encoding, err), err);
@@ -339,40 +312,16 @@ void CZYRUniString::intern(I_UniString* created, const ZYRPublic::I_Error& err) 
         held = GetCommonUniStrings()->findCommonUniString(held);
         if (held->getUniqueID() == id)
             held = GetUniStringFromDynamicCache(held);
-        impl_ = held.detach();
+        adopt(held.detach());
     }
     if (err.errorOccurred()) {
         // The constructor does not finish, so nothing else would release the object.
-        if (impl_)
-            std::exchange(impl_, nullptr)->release();
+        adopt(nullptr);
         throwCZYRErrorIfErrorOccurred(err);
     }
 }
 
-CZYRUniString& CZYRUniString::operator=(const CZYRUniString& other) {
-    if (this != &other && other.impl_ != impl_) {
-        if (other.impl_)
-            other.impl_->addRef();
-        I_UniString* old = std::exchange(impl_, other.impl_);
-        if (old)
-            old->release();
-    }
-    return *this;
-}
-
-CZYRUniString& CZYRUniString::operator=(CZYRUniString&& other) noexcept {
-    if (this != &other) {
-        I_UniString* old = std::exchange(impl_, std::exchange(other.impl_, nullptr));
-        if (old)
-            old->release();
-    }
-    return *this;
-}
-
-CZYRUniString::~CZYRUniString() {
-    if (impl_)
-        impl_->release();
-}
+CZYRUniString::~CZYRUniString() = default;
 
 bool CZYRUniString::operator==(const CZYRUniString& other) const {
     return impl_ && impl_->equals(other.impl_);
@@ -394,17 +343,13 @@ void CZYRUniString::append(const CZYRUniString& other) {
     if (!other.impl_)
         return;
     if (!impl_) {
-        if (this != &other) {
-            impl_ = other.impl_;
-            impl_->addRef();
-        }
+        if (this != &other)
+            *this = other;
         return;
     }
     C_Error err;
-    I_UniString* joined = impl_->concat(other.impl_, err);
-    if (joined) {
-        std::exchange(impl_, joined)->release();
-    }
+    if (I_UniString* joined = impl_->concat(other.impl_, err))
+        adopt(joined);
     throwCZYRErrorIfErrorOccurred(err);
 }
 

@@ -8,8 +8,8 @@
 #include "I_Error.h"
 #include "I_UniString.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
 #include "zyr/std/CZYRMemBuffer.h"
+#include "zyr/std/CZYRPublicObject.h"
 
 namespace ZYRStd {
 
@@ -30,19 +30,19 @@ ZYRSTD_API I_UniString* createUniString(const char16_t* text, ZYRPublic::I_Error
 
 // A shared, immutable Unicode string; null inside means invalid. Built from text, equal
 // texts share one interned object.
-class ZYRSTD_API CZYRUniString : public CZYRClientBase {
+class ZYRSTD_API CZYRUniString : public CZYRInterfaceValue<I_UniString> {
 public:
     CZYRUniString() = default;
-    CZYRUniString(const CZYRUniString& other);
-    CZYRUniString(CZYRUniString&& other) noexcept;
-    CZYRUniString(const C_SmartPtr<I_UniString>& s);
-    explicit CZYRUniString(I_UniString* s, bool addRef = false);
+    CZYRUniString(const CZYRUniString& other) = default;
+    CZYRUniString(CZYRUniString&& other) noexcept = default;
+    CZYRUniString(const C_SmartPtr<I_UniString>& s) : CZYRInterfaceValue(s.get(), true) {}
+    explicit CZYRUniString(I_UniString* s, bool addRef = false) : CZYRInterfaceValue(s, addRef) {}
     CZYRUniString(const char* text, const char* encoding);
     CZYRUniString(const char* text);
     CZYRUniString(const char* text, unsigned int length, const char* encoding);
     CZYRUniString(const char16_t* text);
-    CZYRUniString& operator=(const CZYRUniString& other);
-    CZYRUniString& operator=(CZYRUniString&& other) noexcept;
+    CZYRUniString& operator=(const CZYRUniString& other) = default;
+    CZYRUniString& operator=(CZYRUniString&& other) noexcept = default;
     ~CZYRUniString() override;
 
     // An invalid left-hand value equals nothing and is less than everything.
@@ -51,8 +51,6 @@ public:
     bool operator!=(const CZYRUniString& other) const { return !(*this == other); }
     bool operator<(const CZYRUniString& other) const;
     bool operator<(const I_UniString* other) const;
-
-    operator C_SmartPtr<I_UniString>() const { return C_SmartPtr<I_UniString>(impl_, true); }
 
     void append(const CZYRUniString& other);
     CZYRUniString concat(const CZYRUniString& other) const;
@@ -65,14 +63,10 @@ public:
     unsigned long long getUniqueID() const;
     uint32_t hashCode() const { return impl_ ? impl_->hashCode() : 0; }
     bool isEmpty() const { return !impl_ || impl_->isEmpty(); }
-    bool isValid() const { return impl_ != nullptr; }
     unsigned int debugRefCount() const { return impl_ ? impl_->debugGetRefCount() : 0; }
-    I_UniString* getImpl() const { return impl_; }
 
 private:
     void intern(I_UniString* created, const ZYRPublic::I_Error& err);
-
-    I_UniString* impl_ = nullptr;
 };
 
 // Hash and equality by text, for unordered containers of strings.
