@@ -177,6 +177,8 @@ void VariableSizeAllocator::noteHeld(unsigned long long bytes) {
 bool VariableSizeAllocator::registerPage(unsigned char* page) {
     if (pageCount_ == pageCapacity_) {
         const unsigned int capacity = pageCapacity_ ? pageCapacity_ * 2 : 16;
+        if (capacity > UINT32_MAX / sizeof(unsigned char*))
+            return false;
         void* grown = ZYRStd::ZYRRealloc(pages_, capacity * sizeof(unsigned char*));
         if (!grown)
             return false;
@@ -281,7 +283,10 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
         // No free size in the tree lies between the node's predecessor and the rest, so the
         // rest can take the node's place without a search or rebalancing.
         ReplaceNode(head, ::new (static_cast<void*>(rest + 8)) FreeBlock());
-        unbinnedSmallSizes_ += (restSize < kBinLimit) - (blockSize < kBinLimit);
+        if (blockSize < kBinLimit)
+            --unbinnedSmallSizes_;
+        if (restSize < kBinLimit)
+            ++unbinnedSmallSizes_;
         return h + 8;
     }
     if (headLeaves)

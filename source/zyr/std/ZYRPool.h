@@ -53,10 +53,9 @@ private:
     FreeBlock* next_ = nullptr;
 };
 
-// A best-fit allocator over pages with boundary tags and a free tree keyed by size (with
-// bins for small sizes).
-// Requests above the page size get a block of their own ("large" blocks). Not thread-safe:
-// the owning client serialises its use.
+// A best-fit allocator over pages with boundary tags, a free tree keyed by size and bins for
+// small sizes. Requests above the page size get a block of their own ("large" blocks). Not
+// thread-safe: the owning client serialises its use.
 class ZYRSTD_API VariableSizeAllocator : public ZYRStd::I_VariableSizeAllocator,
                                          public ZYRStd::redblack_tree<FreeBlock, unsigned int>,
                                          public ZYRStd::CZYRClientBase {
@@ -91,7 +90,7 @@ public:
     unsigned int pageSize() const { return pageSize_; }
     // Everything now taken from the supplier (the held bytes).
     unsigned long long totalAllocatedMemory() const { return held_; }
-    // Takes a free block out of the tree or out of its same-size list.
+    // Takes a free block out of the tree, its bin or its same-size list.
     void RemoveBlock(BlkHeader* header);
     // Obtains the first page as the reserved page (construction does this).
     void InitializePages();
@@ -99,8 +98,8 @@ public:
     void ThrowBadAlloc() {}
 
     const char* name() const { return name_; }
-    // Debug check of the tree, the same-size lists, every page's boundary tags and the held
-    // bytes. Null when all is sound, else what is broken.
+    // Debug check of the tree, the bins, the same-size lists, every page's boundary tags and
+    // the held bytes. Null when all is sound, else what is broken.
     const char* checkInvariants() const;
 
 private:
