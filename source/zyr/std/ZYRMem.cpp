@@ -423,6 +423,8 @@ int ZYRGetMemStatLevel() {
 
 namespace detail {
 
+tZYRMemMgr crtMemMgr() { return {crtAlloc, crtRealloc, crtFree, nullptr}; }
+
 void configureFront(int level, const tZYRMemMgr& hostRecord) {
     Tracker& t = tracker();
     {

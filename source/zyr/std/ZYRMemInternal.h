@@ -16,6 +16,9 @@ constexpr uint64_t kDefaultMemReserve = 314572800;    // 300 MiB
 constexpr uint64_t kMinimumMemLimit = 419430400;      // 400 MiB
 constexpr uint64_t kGuardedLimitCeiling = 1ull << 32; // guarded tests pass at 4 GiB or more
 
+// The C runtime heap as a host record: the default until the host hands over its own.
+tZYRMemMgr crtMemMgr();
+
 // Start-up: resets the tracker to `level`, installs `host` and picks the front variants.
 void configureFront(int level, const tZYRMemMgr& host);
 void setMemLimitRaw(uint64_t limit);

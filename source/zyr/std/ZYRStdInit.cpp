@@ -74,7 +74,7 @@ const char* orEmpty(const char* text) {
 void ZYRStdInit_ZYRMemMgrSet(tZYRMemMgr* mgr) {
     const char* level = std::getenv("ZYR_MEMORY_STAT");
     const int memStatLevel = level ? std::atoi(level) : 0;
-    hostRecord = tZYRMemMgr{crtAlloc, crtRealloc, crtFree, nullptr};
+    hostRecord = detail::crtMemMgr();
     if (mgr)
         hostRecord = *mgr;
     detail::configureFront(memStatLevel, hostRecord);
