@@ -25,15 +25,6 @@ constinit tZYRDefaultFileSysProc defaultFileSysProc = nullptr;
 constinit tOEMFlushCB oemFlushCB{nullptr, nullptr};
 constinit const void* debugStopTarget = nullptr;
 
-void* crtAlloc(size_t size, void*) {
-    return std::malloc(size);
-}
-void* crtRealloc(void* block, size_t size, void*) {
-    return std::realloc(block, size);
-}
-void crtFree(void* block, void*) {
-    std::free(block);
-}
 
 struct ExceptionName {
     uint32_t code;
