@@ -25,7 +25,6 @@ constinit tZYRDefaultFileSysProc defaultFileSysProc = nullptr;
 constinit tOEMFlushCB oemFlushCB{nullptr, nullptr};
 constinit const void* debugStopTarget = nullptr;
 
-
 struct ExceptionName {
     uint32_t code;
     const char* name;
