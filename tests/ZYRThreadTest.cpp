@@ -105,6 +105,8 @@ TEST(ZYRThreadTest, ClientBaseNewRetriesThroughTheNewHandler) {
         EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRClientBase");
         EXPECT_EQ(e.getSrcLineNumber(), 92);
     }
+    // A request beyond the front's 32-bit sizes is refused, never cut down.
+    EXPECT_THROW(CZYRClientBase::operator new (std::size_t{5} << 30), ZYROutOfMemoryError);
     const std::new_handler previous = std::set_new_handler(recoveringHandler);
     Object* object = new Object;
     std::set_new_handler(previous);

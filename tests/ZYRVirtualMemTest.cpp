@@ -28,14 +28,14 @@ TEST_F(ZYRVirtualMemTest, BlocksAreCountedAndDecommittedByWholePages) {
     EXPECT_EQ(GetMemUsage(), before + 5ull * page) << "counted in whole pages";
     std::memset(block, 0xAB, 5 * page);
 
-    // Half a page either side is not given back; the two pages inside are.
+    // Every page the range touches goes: pages 0 to 3 here.
     VirtualMemDecommit(block, block + page / 2, 3 * page);
-    EXPECT_EQ(GetMemUsage(), before + 3ull * page);
+    EXPECT_EQ(GetMemUsage(), before + 1ull * page);
     VirtualMemDecommit(block, block + page, 2 * page); // already decommitted: no change
-    EXPECT_EQ(GetMemUsage(), before + 3ull * page);
+    EXPECT_EQ(GetMemUsage(), before + 1ull * page);
     VirtualMemDecommit(nullptr, block, page);
     VirtualMemDecommit(block, block, 0);
-    EXPECT_EQ(block[0], 0xAB) << "pages outside the range keep their contents";
+    EXPECT_EQ(block[4 * page], 0xAB) << "pages outside the range keep their contents";
 
     VirtualMemFree(block);
     EXPECT_EQ(GetMemUsage(), before);
@@ -45,11 +45,15 @@ TEST_F(ZYRVirtualMemTest, BlocksAreCountedAndDecommittedByWholePages) {
 TEST_F(ZYRVirtualMemTest, TrackedAtLevelTwoAndRefusedOverTheLimit) {
     zyrtest::installFront(2);
     const unsigned int page = GetPageSize();
-    void* block = VirtualMemAlloc(page);
+    auto* block = static_cast<unsigned char*>(VirtualMemAlloc(3 * page));
     ASSERT_NE(block, nullptr);
-    EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, page);
+    EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 3 * page);
+    VirtualMemDecommit(block, block + page, 1);
+    EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 2 * page);
+    VirtualMemDecommit(block, block + page, page); // nothing left there: nothing changes
+    EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 2 * page);
     VirtualMemFree(block);
-    EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 0u);
+    EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 0u) << "the tracker must not wrap";
 
     zyrtest::installFront(0);
     ZYRSetMemLimit(400ull << 20);

@@ -11,6 +11,9 @@ namespace ZYRStd {
 
 namespace {
 void* allocateClient(std::size_t size) {
+    // The front counts in 32 bits; a larger request cannot be served, only refused.
+    if (size > 0xFFFFFFFFu)
+        throw ZYROutOfMemoryError("source/zyr/std/CZYRClientBase", 92);
     const auto n = static_cast<unsigned int>(std::max<std::size_t>(size, 1));
     for (;;) {
         if (void* block = ZYRMalloc(n))

@@ -30,20 +30,11 @@ public:
     }
     ~IImp_ZYRDataBuffer() override { ZYRFree(data_); }
 
-    void addRef() override { rc_.addRef(); }
-    void release() override {
-        if (rc_.release())
-            delete this;
-    }
-    bool isShared() const override { return rc_.isShared(); }
-    unsigned int debugGetRefCount() const override { return rc_.debugGetRefCount(); }
-    const unsigned int* debugGetRefCountAddr() const override { return rc_.debugGetRefCountAddr(); }
     uint64_t getUniqueID() const override { return id_; }
     const char* getBuffer() const override { return data_; }
     unsigned int getLength() const override { return length_; }
 
 private:
-    CZYRPublicRefCountBase rc_;
     uint64_t id_;
     char* data_ = nullptr;
     unsigned int length_ = 0;

@@ -117,6 +117,10 @@ private:
     std::map<uint32_t, sZYRErrorInfo*> stacks_; // kernel thread id -> newest record
 };
 
+// The stack lives in static storage: the out-of-memory notice must reach it exactly when
+// the front refuses to allocate, and two threads may be the first to report at once.
+std::mutex processStackMutex; // guards processStack
+alignas(IImp_ZYRErrorStk) unsigned char processStackStorage[sizeof(IImp_ZYRErrorStk)];
 IImp_ZYRErrorStk* processStack = nullptr;
 
 } // namespace
@@ -132,14 +136,18 @@ sZYRErrorInfo ZYRMakeErrorInfo(short errorCode, const char16_t* message) {
 I_ErrorStk* createErrorStk(ZYRPublic::I_Error& err) {
     return ZYRErrorBoundary<I_ErrorStk*>(err, nullptr, "Error in ZYRStd::createErrorStk",
                                          "source/zyr/std/CZYRErrorStk", 146, []() -> I_ErrorStk* {
+                                             std::lock_guard lock(processStackMutex);
                                              if (!processStack)
-                                                 processStack = new IImp_ZYRErrorStk;
+                                                 processStack =
+                                                     ::new (processStackStorage) IImp_ZYRErrorStk;
                                              return processStack;
                                          });
 }
 
 void TerminateErrorStk() {
-    delete std::exchange(processStack, nullptr);
+    std::lock_guard lock(processStackMutex);
+    if (processStack)
+        std::exchange(processStack, nullptr)->~IImp_ZYRErrorStk();
 }
 
 CZYRErrorStk::CZYRErrorStk() : impl_(nullptr) {

@@ -355,7 +355,7 @@ void CZYRUniString::append(const CZYRUniString& other) {
 
 CZYRUniString CZYRUniString::concat(const CZYRUniString& other) const {
     if (!impl_)
-        return other.impl_ ? CZYRUniString() : CZYRUniString();
+        return CZYRUniString();
     C_Error err;
     I_UniString* joined = impl_->concat(other.impl_, err);
     throwCZYRErrorIfErrorOccurred(err);

@@ -14,6 +14,7 @@
 #include "zyr/std/ZYRFlushRegistry.h"
 #include "zyr/std/ZYRMem.h"
 #include "zyr/std/ZYRMemInternal.h"
+#include "zyr/std/ZYRNoDestructor.h"
 #include "zyr/std/ZYRStdInit.h"
 #include "zyr/std/ZYRThread.h"
 #include "zyr/std/ZYRVirtualMem.h"
@@ -143,8 +144,8 @@ struct ClientStatistics {
 };
 
 ClientStatistics& statistics() {
-    static ClientStatistics instance;
-    return instance;
+    static detail::NoDestructor<ClientStatistics> instance;
+    return *instance;
 }
 
 void accountAlloc(EngineClient ClientStatistics::*client, void* p) {
@@ -304,14 +305,13 @@ bool ZYRFlushMemory(I_FlushableMemoryClient* requester, unsigned int bytesNeeded
     std::array<I_FlushableMemoryClient*, kMaxCollected> collected{};
     unsigned int count = 0;
     for (size_t i = 0; i < registry.main.size(); ++i) {
-        I_FlushableMemoryClient* client = registry.main[i];
-        if (client == requester)
-            continue;
         if (count == kMaxCollected) {
             dmmLogPrintf("-- Too many flushable clients \n");
             break;
         }
-        collected[count++] = client;
+        I_FlushableMemoryClient* client = registry.main[i];
+        if (client != requester)
+            collected[count++] = client;
     }
 
     // Largest first; sizes are asked afresh at every comparison, equal sizes keep their order.
@@ -385,13 +385,12 @@ bool ZYRFlushMemoryThreadSafe(I_FlushableMemoryClient* requester, unsigned int b
     std::array<Candidate, kMaxCollected> collected{};
     unsigned int count = 0;
     for (I_FlushableMemoryClient* client : registry.threadSafe) {
-        if (client == requester)
-            continue;
         if (count == kMaxCollected) {
             dmmLogPrintf("-- Too many flushable clients \n");
             break;
         }
-        collected[count++] = {client, client->getFlushableMemorySize()};
+        if (client != requester)
+            collected[count++] = {client, client->getFlushableMemorySize()};
     }
     for (unsigned int i = 0; i < count; ++i)
         for (unsigned int j = i + 1; j < count; ++j)

@@ -41,9 +41,11 @@ void ZYRDictEnumProcs::printDataBufferContents(ZYRPublic::I_DataBuffer* buffer, 
         const auto* bytes = reinterpret_cast<const unsigned char*>(buffer->getBuffer());
         const unsigned int shown = std::min(buffer->getLength(), kMaxPrintedBytes);
         const auto flags = out_.flags();
+        const char fill = out_.fill();
         for (unsigned int i = 0; i < shown; ++i)
             out_ << std::hex << std::setw(2) << std::setfill('0') << unsigned{bytes[i]};
         out_.flags(flags);
+        out_.fill(fill);
     }
     out_ << '>' << std::endl;
 }

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
@@ -260,9 +261,7 @@ void* guardedRealloc(void* p, unsigned int size) {
                 t.allocations.insert(std::move(node));
             }
         }
-        auto* grownHeader = reinterpret_cast<GuardHeader*>(grown);
-        if (grownHeader->stackId != 0)
-            t.walker->resize(grownHeader->stackId, oldSize, size);
+        t.walker->resize(reinterpret_cast<GuardHeader*>(grown)->stackId, oldSize, size);
     }
     writeGuards(grown, size);
     return grown + kGuardHeader;
@@ -335,7 +334,8 @@ void* ZYRSureRealloc(void* p, unsigned int size) {
 }
 
 void ZYRDbgCheckZYRMemAllocPtr(void* p) {
-    if (!p)
+    // Plain blocks carry no guards: there is nothing to check, and nothing safe to read.
+    if (!p || statLevel == 0)
         return;
     const GuardHeader* header = guardHeader(p);
     uint32_t tail;
@@ -423,9 +423,22 @@ int ZYRGetMemStatLevel() {
 
 namespace detail {
 
-tZYRMemMgr crtMemMgr() { return {crtAlloc, crtRealloc, crtFree, nullptr}; }
+tZYRMemMgr crtMemMgr() {
+    return {crtAlloc, crtRealloc, crtFree, nullptr};
+}
 
-void configureFront(int level, const tZYRMemMgr& hostRecord) {
+tZYRMemMgr& hostMemMgr() {
+    return host;
+}
+
+uint32_t processClockMs() {
+    static const auto loaded = std::chrono::steady_clock::now();
+    return static_cast<uint32_t>(std::chrono::duration_cast<std::chrono::milliseconds>(
+                                     std::chrono::steady_clock::now() - loaded)
+                                     .count());
+}
+
+void configureFront(int level) {
     Tracker& t = tracker();
     {
         std::lock_guard lock(t.mutex);
@@ -434,7 +447,6 @@ void configureFront(int level, const tZYRMemMgr& hostRecord) {
             t.walker.reset(IImpStackWalkerStub::create());
     }
     statLevel = level;
-    host = hostRecord;
     front = level != 0 ? kGuardedFront : kPlainFront;
 }
 
@@ -562,7 +574,7 @@ void dumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data) {
             srcLine,
             thread ? thread->getThreadName() : nullptr,
             thread ? thread->getThreadId() : 0,
-            static_cast<uint32_t>(std::clock() / (CLOCKS_PER_SEC / 1000)),
+            processClockMs(),
         };
         proc(&msg, &detail, data);
     };

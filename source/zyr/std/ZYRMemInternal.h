@@ -18,9 +18,13 @@ constexpr uint64_t kGuardedLimitCeiling = 1ull << 32; // guarded tests pass at 4
 
 // The C runtime heap as a host record: the default until the host hands over its own.
 tZYRMemMgr crtMemMgr();
+// The record the front calls through (the library's own copy of the host's).
+tZYRMemMgr& hostMemMgr();
 
-// Start-up: resets the tracker to `level`, installs `host` and picks the front variants.
-void configureFront(int level, const tZYRMemMgr& host);
+// Start-up: resets the tracker to `level` and picks the front variants.
+void configureFront(int level);
+// Milliseconds since the library was loaded, for time stamps.
+uint32_t processClockMs();
 void setMemLimitRaw(uint64_t limit);
 void setMemReserveRaw(uint64_t reserve);
 

@@ -18,7 +18,6 @@ namespace {
 
 constexpr const char* kSource = "source/zyr/std/ZYRStdInit";
 
-constinit tZYRMemMgr hostRecord{};
 constinit unsigned int workerID = 1;
 constinit tZYRFactoryProc factoryProc = nullptr;
 constinit tZYRDefaultFileSysProc defaultFileSysProc = nullptr;
@@ -64,10 +63,8 @@ const char* orEmpty(const char* text) {
 void ZYRStdInit_ZYRMemMgrSet(tZYRMemMgr* mgr) {
     const char* level = std::getenv("ZYR_MEMORY_STAT");
     const int memStatLevel = level ? std::atoi(level) : 0;
-    hostRecord = detail::crtMemMgr();
-    if (mgr)
-        hostRecord = *mgr;
-    detail::configureFront(memStatLevel, hostRecord);
+    detail::hostMemMgr() = mgr ? *mgr : detail::crtMemMgr();
+    detail::configureFront(memStatLevel);
     if (mgr) {
         tZYRVirtualMemoryInfo info{};
         VirtualMemStatus(&info);
@@ -78,7 +75,7 @@ void ZYRStdInit_ZYRMemMgrSet(tZYRMemMgr* mgr) {
 }
 
 tZYRMemMgr* ZYRStdInit_ZYRMemMgrGet() {
-    return &hostRecord;
+    return &detail::hostMemMgr();
 }
 
 void ZYRStdInit_ZYRMemMgrDumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data) {

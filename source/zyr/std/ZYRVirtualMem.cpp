@@ -86,7 +86,7 @@ void* VirtualMemAlloc(unsigned int size) {
     const uint64_t bytes = roundUpToPage(size);
     const int level = detail::memStatLevel();
     const bool withinLimit =
-        level == 0 ? detail::plainLimitTest(bytes, 0, false) : detail::trackerLimitTest(bytes, 0);
+        level == 0 ? detail::plainLimitTest(size, 0, false) : detail::trackerLimitTest(size, 0);
     if (!withinLimit) {
         detail::sendOutOfMemoryNotice();
         return nullptr;
@@ -94,10 +94,14 @@ void* VirtualMemAlloc(unsigned int size) {
     void* base = ::mmap(nullptr, bytes, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
     if (base == MAP_FAILED)
         return nullptr;
-    {
+    try {
         RegionTable& table = regionTable();
         std::lock_guard lock(table.mutex);
         table.regions[base] = Region{bytes, std::vector<bool>(bytes / pageSize(), true), bytes};
+    } catch (...) {
+        // Without its record the block could never be freed or counted: give it back.
+        ::munmap(base, bytes);
+        return nullptr;
     }
     if (level == 0) {
         detail::plainUsageAdd(bytes);
@@ -150,11 +154,11 @@ void VirtualMemDecommit(void* base, void* addr, unsigned int size) {
         const auto from = static_cast<const unsigned char*>(addr);
         if (from < start || from >= start + region.size)
             return;
-        // Only whole pages inside the range are given back.
+        // Every page that holds a byte of the range is given back.
         const uint64_t offset = static_cast<uint64_t>(from - start);
-        const uint64_t firstPage = (offset + pageSize() - 1) / pageSize();
-        const uint64_t endPage =
-            std::min<uint64_t>((offset + size) / pageSize(), region.committed.size());
+        const uint64_t firstPage = offset / pageSize();
+        const uint64_t endPage = std::min<uint64_t>((offset + size + pageSize() - 1) / pageSize(),
+                                                    region.committed.size());
         before = region.committedBytes;
         for (uint64_t page = firstPage; page < endPage; ++page) {
             if (!region.committed[page])
@@ -166,11 +170,14 @@ void VirtualMemDecommit(void* base, void* addr, unsigned int size) {
         }
         after = region.committedBytes;
     }
+    if (before == after)
+        return;
     if (detail::memStatLevel() == 0) {
         detail::plainUsageSub(before - after);
     } else {
+        // The block is counted anew with what stays committed.
         detail::trackerRecordFree(nullptr, before);
-        if (before != after)
+        if (after != 0)
             detail::trackerRecordAlloc(nullptr, after);
         const unsigned int id = detail::trackerVirtualBlockId(base);
         if (id != 0)
