@@ -9,7 +9,7 @@ class CZYRString;
 class CZYRWString;
 class CZYRUniString;
 
-// Kinds of host path specification. The values belong to the host's file-name
+// Kinds of host path form. The values belong to the host's file-name
 // implementation; the library only passes them through.
 enum eZYRPathSpecType : int {};
 } // namespace ZYRStd

@@ -9,7 +9,7 @@
 
 namespace ZYRHostKit {
 
-// The path specifications of this host's file names.
+// The path forms of this host's file names.
 constexpr ZYRStd::eZYRPathSpecType kPathSpecUTF8 = static_cast<ZYRStd::eZYRPathSpecType>(1);
 constexpr ZYRStd::eZYRPathSpecType kPathSpecUTF16 = static_cast<ZYRStd::eZYRPathSpecType>(2);
 
