@@ -1,7 +1,6 @@
 // ASCII85 encoder and decoder over streams.
 #include "zyr/std/CZYRStreamsFilterASCII85.h"
 
-#include <cstdio>
 #include <cstring>
 
 #include "zyr/std/CZYRError.h"
@@ -11,7 +10,6 @@ namespace ZYRStd {
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/CZYRStreamsFilterASCII85";
-constexpr unsigned int kInputChunk = 64 * 1024;
 
 uint32_t loadBigEndian(const unsigned char* p) {
     return (uint32_t{p[0]} << 24) | (uint32_t{p[1]} << 16) | (uint32_t{p[2]} << 8) | p[3];
@@ -30,19 +28,6 @@ bool isWhite(unsigned char c) {
     return c == ' ' || c == '\n' || c == '\r' || c == '\t' || c == '\f' || c == '\0';
 }
 
-// Error texts are not owned by the errors that carry them; this one lives until the next
-// decoding error on the same thread.
-const char* decodeMessage(const char* filter, const char* what, int character,
-                          unsigned long long offset) {
-    thread_local char text[160];
-    if (character >= 0)
-        std::snprintf(text, sizeof text, "%s: %s 0x%02X at offset %llu", filter, what, character,
-                      offset);
-    else
-        std::snprintf(text, sizeof text, "%s: %s at offset %llu", filter, what, offset);
-    return text;
-}
-
 } // namespace
 
 // ---- CZYRStreamFilterASCII85 ---------------------------------------------------------------
@@ -50,39 +35,19 @@ const char* decodeMessage(const char* filter, const char* what, int character,
 CZYRStreamFilterASCII85::CZYRStreamFilterASCII85(
     const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& target, const char* prefix, const char* eod,
     bool allowZ)
-    : allowZ_(allowZ), target_(target) {
-    const char* marker = eod ? eod : "~>";
-    const size_t markerLength = std::strlen(marker);
-    if (markerLength >= sizeof eod_)
-        throw CZYRError(ZYRPublic::kZYRErrorBadParam,
-                        "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long",
-                        kSource, __LINE__);
-    const char* lead = prefix ? prefix : "";
-    const size_t leadLength = std::strlen(lead);
-    if (leadLength >= sizeof prefix_)
-        throw CZYRError(ZYRPublic::kZYRErrorBadParam,
-                        "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long",
-                        kSource, __LINE__);
-    std::memcpy(eod_, marker, markerLength + 1);
-    eodLength_ = static_cast<unsigned int>(markerLength);
-    std::memcpy(prefix_, lead, leadLength + 1);
-    prefixLength_ = static_cast<unsigned int>(leadLength);
-    linePos_ = prefixLength_;
-}
+    : allowZ_(allowZ),
+      lines_(target, prefix, eod, "~>",
+             "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long",
+             "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long", kSource,
+             __LINE__) {}
 
 CZYRStreamFilterASCII85::~CZYRStreamFilterASCII85() {
-    try {
-        close();
-    } catch (...) {
-        // A destructor has no one to report to.
-    }
+    StreamsFilterCommon::closeQuietly(*this);
 }
 
 unsigned int CZYRStreamFilterASCII85::write(const void* buf, unsigned int size,
                                             unsigned int count) {
-    if (!target_)
-        throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed,
-                        "CZYRStreamFilterASCII85::write - stream invalid", kSource, __LINE__);
+    lines_.requireTarget("CZYRStreamFilterASCII85::write - stream invalid", kSource, __LINE__);
     const unsigned int total = size * count;
     if (total == 0)
         return 0;
@@ -111,19 +76,9 @@ unsigned int CZYRStreamFilterASCII85::write(const void* buf, unsigned int size,
 
 unsigned int CZYRStreamFilterASCII85::write(const void* buf, unsigned int size, unsigned int count,
                                             ZYRPublic::I_Error& err) {
-    if (err.errorOccurred())
-        return 0;
-    try {
-        return write(buf, size, count);
-    } catch (const CZYRError& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (const ZYRPublic::I_Error& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (...) {
-        err.setError(ZYRPublic::kZYRErrorFileOpFailed, "CZYRStreamFilterASCII85::write - failed",
-                     kSource, __LINE__);
-    }
-    return 0;
+    return StreamsFilterCommon::recordingErrors(err, "CZYRStreamFilterASCII85::write - failed",
+                                                kSource, __LINE__,
+                                                [&] { return write(buf, size, count); });
 }
 
 void CZYRStreamFilterASCII85::encodeGroups(const unsigned char* p, unsigned int n) {
@@ -131,10 +86,9 @@ void CZYRStreamFilterASCII85::encodeGroups(const unsigned char* p, unsigned int 
         const uint32_t value = loadBigEndian(p);
         if (value == 0 && allowZ_) {
             place("z", 1);
-        } else if (lineLength_ + 5 <= kLineChars) {
-            toDigits(value, line_ + linePos_);
-            lineLength_ += 5;
-            linePos_ += 5;
+        } else if (lines_.room() >= 5) {
+            toDigits(value, lines_.next());
+            lines_.advance(5);
         } else {
             char digits[5];
             toDigits(value, digits);
@@ -144,77 +98,50 @@ void CZYRStreamFilterASCII85::encodeGroups(const unsigned char* p, unsigned int 
 }
 
 void CZYRStreamFilterASCII85::place(const char* chars, unsigned int n, bool keepPair) {
-    if (lineLength_ + n > kLineChars) {
-        unsigned int head = kLineChars - lineLength_;
+    if (n > lines_.room()) {
+        unsigned int head = lines_.room();
         if (keepPair && n - head == 1)
             --head;
-        std::memcpy(line_ + linePos_, chars, head);
-        lineLength_ += head;
-        linePos_ += head;
-        emitLine();
+        lines_.append(chars, head);
+        lines_.emit();
         chars += head;
         n -= head;
     }
-    std::memcpy(line_ + linePos_, chars, n);
-    lineLength_ += n;
-    linePos_ += n;
-}
-
-void CZYRStreamFilterASCII85::emitLine() {
-    std::memcpy(line_, prefix_, prefixLength_);
-    line_[linePos_] = '\r';
-    line_[linePos_ + 1] = '\n';
-    const unsigned int n = linePos_ + 2;
-    lineLength_ = 0;
-    linePos_ = prefixLength_;
-    try {
-        target_->write(line_, 1, n);
-    } catch (...) {
-        target_.reset();
-        throw;
-    }
+    lines_.append(chars, n);
 }
 
 void CZYRStreamFilterASCII85::close() {
-    if (!target_)
+    if (!lines_.target)
         return;
     if (groupCount_ > 0) {
         unsigned char last[4] = {};
         std::memcpy(last, group_, groupCount_);
         // k bytes give k + 1 digits; a final group is never "z".
-        char tail[5 + sizeof eod_];
+        char tail[5 + StreamsFilterCommon::EncodedLines::kMaxEod];
         toDigits(loadBigEndian(last), tail);
-        std::memcpy(tail + groupCount_ + 1, eod_, eodLength_);
-        const unsigned int n = groupCount_ + 1 + eodLength_;
+        std::memcpy(tail + groupCount_ + 1, lines_.eod, lines_.eodLength);
+        const unsigned int n = groupCount_ + 1 + lines_.eodLength;
         groupCount_ = 0;
         place(tail, n, true);
-        emitLine();
+        lines_.emit();
     }
-    target_.reset();
+    lines_.target.reset();
 }
 
 // ---- CZYRStreamFilterASCII85Decode ---------------------------------------------------------
 
 CZYRStreamFilterASCII85Decode::CZYRStreamFilterASCII85Decode(
     const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& source)
-    : source_(source) {
-    input_.grow(kInputChunk);
-}
+    : input_(source) {}
 
 CZYRStreamFilterASCII85Decode::~CZYRStreamFilterASCII85Decode() = default;
 
 [[noreturn]] void CZYRStreamFilterASCII85Decode::fail(const char* what, int character,
                                                       unsigned long long offset, int line) {
     failure_ = {what, character, offset, line};
-    throw CZYRError(ZYRPublic::kZYRErrorInvalidData,
-                    decodeMessage("ASCII85Decode", what, character, offset), kSource, line);
-}
-
-bool CZYRStreamFilterASCII85Decode::fill() {
-    inOffset_ += inLength_;
-    inPos_ = 0;
-    inLength_ = source_->read(input_.data(), 1, input_.count());
-    return inLength_ > 0;
+    // Lives until the next decoding error of this filter on the same thread.
+    thread_local char text[160];
+    failure_.raise(text, "ASCII85Decode", kSource);
 }
 
 void CZYRStreamFilterASCII85Decode::emit(uint32_t value, unsigned int bytes) {
@@ -306,9 +233,7 @@ void CZYRStreamFilterASCII85Decode::consume(unsigned char c, unsigned long long 
 unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, unsigned int count) {
     if (failure_.what)
         fail(failure_.what, failure_.character, failure_.offset, failure_.line);
-    if (!source_)
-        throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed,
-                        "CZYRStreamFilterASCII85Decode::read - stream invalid", kSource, __LINE__);
+    input_.requireSource("CZYRStreamFilterASCII85Decode::read - stream invalid", kSource, __LINE__);
     const unsigned int wanted = size * count;
     dest_ = static_cast<unsigned char*>(buf);
     destRoom_ = wanted;
@@ -319,17 +244,17 @@ unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, u
     if (outPos_ == outLength_)
         outPos_ = outLength_ = 0;
     while (destRoom_ > 0 && !done_) {
-        if (inPos_ == inLength_ && !fill()) {
+        if (input_.pos == input_.length && !input_.fill()) {
             if (sawTilde_)
                 fail("'~' not followed by '>'", -1, tildeOffset_, __LINE__);
-            finish(inOffset_);
+            finish(input_.offset);
             break;
         }
-        const unsigned char* in = input_.data();
-        while (destRoom_ > 0 && inPos_ < inLength_ && !done_) {
-            const unsigned char c = in[inPos_];
-            consume(c, inOffset_ + inPos_);
-            ++inPos_;
+        const unsigned char* in = input_.buffer.data();
+        while (destRoom_ > 0 && input_.pos < input_.length && !done_) {
+            const unsigned char c = in[input_.pos];
+            consume(c, input_.offset + input_.pos);
+            ++input_.pos;
         }
     }
     const unsigned int got = wanted - destRoom_;
@@ -340,19 +265,9 @@ unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, u
 
 unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, unsigned int count,
                                                  ZYRPublic::I_Error& err) {
-    if (err.errorOccurred())
-        return 0;
-    try {
-        return read(buf, size, count);
-    } catch (const CZYRError& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (const ZYRPublic::I_Error& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (...) {
-        err.setError(ZYRPublic::kZYRErrorFileOpFailed,
-                     "CZYRStreamFilterASCII85Decode::read - failed", kSource, __LINE__);
-    }
-    return 0;
+    return StreamsFilterCommon::recordingErrors(err, "CZYRStreamFilterASCII85Decode::read - failed",
+                                                kSource, __LINE__,
+                                                [&] { return read(buf, size, count); });
 }
 
 } // namespace ZYRStd

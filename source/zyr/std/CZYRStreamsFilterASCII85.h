@@ -6,8 +6,8 @@
 #include "I_Error.h"
 #include "ZYRStdExport.h"
 #include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRMemBuffer.h"
 #include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/ZYRStreamsFilterCommon.h"
 
 namespace ZYRStd {
 
@@ -38,28 +38,18 @@ public:
     void close();
 
     const char* getFilterName() const { return "ASCII85"; }
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getTargetStream() const { return target_; }
+    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getTargetStream() const { return lines_.target; }
 
 private:
-    static constexpr unsigned int kLineChars = 80;
-
     void encodeGroups(const unsigned char* p, unsigned int n);
     // Places encoded characters, completing and emitting the line when they do not fit.
     // `keepPair` never leaves a single character for the next line.
     void place(const char* chars, unsigned int n, bool keepPair = false);
-    void emitLine();
 
     unsigned char group_[4] = {};
     unsigned int groupCount_ = 0;
-    unsigned int lineLength_ = 0;
-    char eod_[15] = {};
-    unsigned int eodLength_ = 0;
-    char prefix_[3] = {};
-    unsigned int prefixLength_ = 0;
-    char line_[100] = {};
-    unsigned int linePos_ = 0; // next free byte of line_
     bool allowZ_;
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> target_;
+    StreamsFilterCommon::EncodedLines lines_;
 };
 
 // Reads ASCII85 text (ISO 32000-1, 7.4.2) from a stream and gives back the bytes. White
@@ -82,31 +72,19 @@ public:
     // True once the end of the data has been reached and every byte handed out.
     bool isAtEOD() const { return done_ && outPos_ == outLength_; }
     // Drops the source; later reads raise kZYRErrorFileOpFailed.
-    void close() { source_.reset(); }
+    void close() { input_.source.reset(); }
 
     const char* getFilterName() const { return "ASCII85Decode"; }
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return source_; }
+    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return input_.source; }
 
 private:
-    struct Failure {
-        const char* what = nullptr; // null: none
-        int character = -1;         // the offending byte, or -1
-        unsigned long long offset = 0;
-        int line = 0;
-    };
-
-    bool fill();
     void consume(unsigned char c, unsigned long long offset);
     void digit(unsigned int value, unsigned long long offset);
     void finish(unsigned long long offset);
     void emit(uint32_t value, unsigned int bytes);
     [[noreturn]] void fail(const char* what, int character, unsigned long long offset, int line);
 
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> source_;
-    CZYRMemBuffer<unsigned char> input_;
-    unsigned int inPos_ = 0;
-    unsigned int inLength_ = 0;
-    unsigned long long inOffset_ = 0; // of input_[0] in the encoded data
+    StreamsFilterCommon::DecodeInput input_;
     uint64_t value_ = 0;
     unsigned int digits_ = 0;
     unsigned long long groupOffset_ = 0;
@@ -122,7 +100,7 @@ private:
     // Where the caller's buffer is being filled during read().
     unsigned char* dest_ = nullptr;
     unsigned int destRoom_ = 0;
-    Failure failure_;
+    StreamsFilterCommon::DecodeFailure failure_;
 };
 
 } // namespace ZYRStd

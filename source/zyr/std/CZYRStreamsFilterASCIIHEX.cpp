@@ -2,7 +2,6 @@
 #include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
 
 #include <array>
-#include <cstdio>
 #include <cstring>
 
 #include "zyr/std/CZYRError.h"
@@ -12,7 +11,6 @@ namespace ZYRStd {
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/CZYRStreamsFilterASCIIHEX";
-constexpr unsigned int kInputChunk = 64 * 1024;
 
 // Two lower-case digits per byte value.
 constexpr std::array<char, 512> kHexPairs = [] {
@@ -52,103 +50,54 @@ constexpr std::array<unsigned char, 256> kClasses = [] {
 
 CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX(
     const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& target, const char* prefix, const char* eod)
-    : target_(target) {
-    const char* marker = eod ? eod : ">";
-    const size_t markerLength = std::strlen(marker);
-    if (markerLength >= sizeof eod_)
-        throw CZYRError(ZYRPublic::kZYRErrorBadParam,
-                        "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: eod is too long",
-                        kSource, __LINE__);
-    const char* lead = prefix ? prefix : "";
-    const size_t leadLength = std::strlen(lead);
-    if (leadLength >= sizeof prefix_)
-        throw CZYRError(ZYRPublic::kZYRErrorBadParam,
-                        "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: prefix is too long",
-                        kSource, __LINE__);
-    std::memcpy(eod_, marker, markerLength + 1);
-    eodLength_ = static_cast<unsigned int>(markerLength);
-    std::memcpy(prefix_, lead, leadLength + 1);
-    prefixLength_ = static_cast<unsigned int>(leadLength);
-    linePos_ = prefixLength_;
-}
+    : lines_(target, prefix, eod, ">",
+             "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: eod is too long",
+             "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: prefix is too long", kSource,
+             __LINE__) {}
 
 CZYRStreamFilterASCIIHEX::~CZYRStreamFilterASCIIHEX() {
-    try {
-        close();
-    } catch (...) {
-        // A destructor has no one to report to.
-    }
+    StreamsFilterCommon::closeQuietly(*this);
 }
 
 unsigned int CZYRStreamFilterASCIIHEX::write(const void* buf, unsigned int size,
                                              unsigned int count) {
-    if (!target_)
-        throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed,
-                        "CZYRStreamFilterASCIIHEX::write - stream invalid", kSource, __LINE__);
+    lines_.requireTarget("CZYRStreamFilterASCIIHEX::write - stream invalid", kSource, __LINE__);
     const unsigned int total = size * count;
     const auto* p = static_cast<const unsigned char*>(buf);
     unsigned int remaining = total;
     // Every byte adds two digits and a full line goes out at once, so lines break after
     // 40 bytes however the input is divided.
     while (remaining > 0) {
-        unsigned int n = (kLineChars - lineLength_) / 2;
+        unsigned int n = lines_.room() / 2;
         if (n > remaining)
             n = remaining;
-        char* out = line_ + linePos_;
+        char* out = lines_.next();
         for (unsigned int i = 0; i < n; ++i)
             std::memcpy(out + 2 * i, &kHexPairs[2 * p[i]], 2);
         p += n;
         remaining -= n;
-        lineLength_ += 2 * n;
-        linePos_ += 2 * n;
-        if (kLineChars - lineLength_ < 2)
-            emitLine();
+        lines_.advance(2 * n);
+        if (lines_.room() < 2)
+            lines_.emit();
     }
     return total;
 }
 
 unsigned int CZYRStreamFilterASCIIHEX::write(const void* buf, unsigned int size, unsigned int count,
                                              ZYRPublic::I_Error& err) {
-    if (err.errorOccurred())
-        return 0;
-    try {
-        return write(buf, size, count);
-    } catch (const CZYRError& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (const ZYRPublic::I_Error& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (...) {
-        err.setError(ZYRPublic::kZYRErrorFileOpFailed, "CZYRStreamFilterASCIIHEX::write - failed",
-                     kSource, __LINE__);
-    }
-    return 0;
-}
-
-void CZYRStreamFilterASCIIHEX::emitLine() {
-    std::memcpy(line_, prefix_, prefixLength_);
-    line_[linePos_] = '\r';
-    line_[linePos_ + 1] = '\n';
-    const unsigned int n = linePos_ + 2;
-    lineLength_ = 0;
-    linePos_ = prefixLength_;
-    try {
-        target_->write(line_, 1, n);
-    } catch (...) {
-        target_.reset();
-        throw;
-    }
+    return StreamsFilterCommon::recordingErrors(err, "CZYRStreamFilterASCIIHEX::write - failed",
+                                                kSource, __LINE__,
+                                                [&] { return write(buf, size, count); });
 }
 
 void CZYRStreamFilterASCIIHEX::close() {
-    if (!target_)
+    if (!lines_.target)
         return;
-    if (lineLength_ + eodLength_ > kLineChars)
-        emitLine();
-    std::memcpy(line_ + linePos_, eod_, eodLength_);
-    lineLength_ += eodLength_;
-    linePos_ += eodLength_;
-    emitLine();
-    target_.reset();
+    if (lines_.eodLength > lines_.room())
+        lines_.emit();
+    lines_.append(lines_.eod, lines_.eodLength);
+    lines_.emit();
+    lines_.target.reset();
 }
 
 unsigned int CZYRStreamFilterASCIIHEX::approximateEncodedLength(unsigned int n, const char* prefix,
@@ -165,53 +114,38 @@ unsigned int CZYRStreamFilterASCIIHEX::approximateEncodedLength(unsigned int n, 
 
 CZYRStreamFilterASCIIHEXDecode::CZYRStreamFilterASCIIHEXDecode(
     const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& source)
-    : source_(source) {
-    input_.grow(kInputChunk);
-}
+    : input_(source) {}
 
 CZYRStreamFilterASCIIHEXDecode::~CZYRStreamFilterASCIIHEXDecode() = default;
 
 [[noreturn]] void CZYRStreamFilterASCIIHEXDecode::fail(int character, unsigned long long offset,
                                                        int line) {
-    failedCharacter_ = character;
-    failedOffset_ = offset;
-    failedLine_ = line;
-    // Error texts are not owned by the errors that carry them; this one lives until the
-    // next decoding error on the same thread.
+    failure_ = {"invalid character", character, offset, line};
+    // Lives until the next decoding error of this filter on the same thread.
     thread_local char text[128];
-    std::snprintf(text, sizeof text, "ASCIIHexDecode: invalid character 0x%02X at offset %llu",
-                  character, offset);
-    throw CZYRError(ZYRPublic::kZYRErrorInvalidData, text, kSource, line);
-}
-
-bool CZYRStreamFilterASCIIHEXDecode::fill() {
-    inOffset_ += inLength_;
-    inPos_ = 0;
-    inLength_ = source_->read(input_.data(), 1, input_.count());
-    return inLength_ > 0;
+    failure_.raise(text, "ASCIIHexDecode", kSource);
 }
 
 unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size,
                                                   unsigned int count) {
-    if (failedCharacter_ >= 0)
-        fail(failedCharacter_, failedOffset_, failedLine_);
-    if (!source_)
-        throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed,
-                        "CZYRStreamFilterASCIIHEXDecode::read - stream invalid", kSource, __LINE__);
+    if (failure_.what)
+        fail(failure_.character, failure_.offset, failure_.line);
+    input_.requireSource("CZYRStreamFilterASCIIHEXDecode::read - stream invalid", kSource,
+                         __LINE__);
     const unsigned int wanted = size * count;
     auto* out = static_cast<unsigned char*>(buf);
     unsigned int got = 0;
     while (got < wanted && !done_) {
-        if (inPos_ == inLength_ && !fill()) {
+        if (input_.pos == input_.length && !input_.fill()) {
             if (high_ >= 0)
                 out[got++] = static_cast<unsigned char>(high_ << 4);
             high_ = -1;
             done_ = true;
             break;
         }
-        const unsigned char* in = input_.data();
-        unsigned int pos = inPos_;
-        while (got < wanted && pos < inLength_) {
+        const unsigned char* in = input_.buffer.data();
+        unsigned int pos = input_.pos;
+        while (got < wanted && pos < input_.length) {
             const unsigned char c = in[pos];
             const unsigned char cls = kClasses[c];
             if (cls < 16) {
@@ -229,31 +163,21 @@ unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size,
                 ++pos;
                 break;
             } else if (cls == kInvalid) {
-                inPos_ = pos;
-                fail(c, inOffset_ + pos, __LINE__);
+                input_.pos = pos;
+                fail(c, input_.offset + pos, __LINE__);
             }
             ++pos;
         }
-        inPos_ = pos;
+        input_.pos = pos;
     }
     return got;
 }
 
 unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size, unsigned int count,
                                                   ZYRPublic::I_Error& err) {
-    if (err.errorOccurred())
-        return 0;
-    try {
-        return read(buf, size, count);
-    } catch (const CZYRError& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (const ZYRPublic::I_Error& e) {
-        err.setError(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
-    } catch (...) {
-        err.setError(ZYRPublic::kZYRErrorFileOpFailed,
-                     "CZYRStreamFilterASCIIHEXDecode::read - failed", kSource, __LINE__);
-    }
-    return 0;
+    return StreamsFilterCommon::recordingErrors(
+        err, "CZYRStreamFilterASCIIHEXDecode::read - failed", kSource, __LINE__,
+        [&] { return read(buf, size, count); });
 }
 
 } // namespace ZYRStd

@@ -6,8 +6,8 @@
 #include "I_Error.h"
 #include "ZYRStdExport.h"
 #include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRMemBuffer.h"
 #include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/ZYRStreamsFilterCommon.h"
 
 namespace ZYRStd {
 
@@ -36,7 +36,7 @@ public:
     void close();
 
     const char* getFilterName() const { return "ASCIIHEX"; }
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getTargetStream() const { return target_; }
+    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getTargetStream() const { return lines_.target; }
 
     // An upper estimate of the encoded size of n bytes, for sizing a buffer; saturates at
     // the largest unsigned value.
@@ -44,18 +44,7 @@ public:
                                                  const char* eod);
 
 private:
-    static constexpr unsigned int kLineChars = 80;
-
-    void emitLine();
-
-    unsigned int lineLength_ = 0;
-    char eod_[15] = {};
-    unsigned int eodLength_ = 0;
-    char prefix_[3] = {};
-    unsigned int prefixLength_ = 0;
-    char line_[100] = {};
-    unsigned int linePos_ = 0; // next free byte of line_
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> target_;
+    StreamsFilterCommon::EncodedLines lines_;
 };
 
 // Reads ASCIIHex text (ISO 32000-1, 7.4.3) from a stream and gives back the bytes. White
@@ -76,25 +65,18 @@ public:
     unsigned int read(void* buf, unsigned int size, unsigned int count, ZYRPublic::I_Error& err);
     bool isAtEOD() const { return done_; }
     // Drops the source; later reads raise kZYRErrorFileOpFailed.
-    void close() { source_.reset(); }
+    void close() { input_.source.reset(); }
 
     const char* getFilterName() const { return "ASCIIHexDecode"; }
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return source_; }
+    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return input_.source; }
 
 private:
-    bool fill();
     [[noreturn]] void fail(int character, unsigned long long offset, int line);
 
-    CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> source_;
-    CZYRMemBuffer<unsigned char> input_;
-    unsigned int inPos_ = 0;
-    unsigned int inLength_ = 0;
-    unsigned long long inOffset_ = 0; // of input_[0] in the encoded data
-    int high_ = -1;                   // a first digit waiting for its pair
+    StreamsFilterCommon::DecodeInput input_;
+    int high_ = -1; // a first digit waiting for its pair
     bool done_ = false;
-    int failedCharacter_ = -1; // -1: no failure
-    unsigned long long failedOffset_ = 0;
-    int failedLine_ = 0;
+    StreamsFilterCommon::DecodeFailure failure_;
 };
 
 } // namespace ZYRStd
