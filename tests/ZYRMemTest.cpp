@@ -12,6 +12,7 @@
 #include "zyr/std/CZYRErrorStk.h"
 #include "zyr/std/ZYRMem.h"
 #include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/ZYRThread.h"
 
 using namespace ZYRStd;
 
@@ -148,6 +149,42 @@ TEST_F(ZYRMemTest, LimitTestAndNestedDisables) {
     EnableMemUsageCheck();
     EXPECT_EQ(ZYRMalloc(overBy8), nullptr);
     ZYRFree(small);
+}
+
+TEST_F(ZYRMemTest, RecentFreesAreReusedAndNeverRefuse) {
+    zyrtest::installFront(0);
+    const CZYRErrorStk notices;
+    ZYRSetMemLimit(400 * kMiB);
+    const auto room = static_cast<unsigned int>(400 * kMiB - GetMemUsage());
+    void* filler = ZYRMalloc(room - 4096);
+    void* small = ZYRMalloc(4096);
+    ASSERT_NE(filler, nullptr);
+    ASSERT_NE(small, nullptr);
+    EXPECT_EQ(GetMemUsage(), 400 * kMiB);
+    ZYRFree(small);
+    EXPECT_EQ(GetMemUsage(), 400 * kMiB - 4096) << "a thread's own frees are always counted";
+    small = ZYRMalloc(2048);
+    void* other = ZYRMalloc(2048);
+    EXPECT_NE(small, nullptr);
+    EXPECT_NE(other, nullptr) << "freed bytes are available again at once";
+    EXPECT_EQ(ZYRMalloc(8), nullptr);
+    ZYRFree(other);
+    std::thread([] {
+        // Another thread sees the freed bytes too.
+        void* p = ZYRMalloc(2048);
+        EXPECT_NE(p, nullptr);
+        ZYRFree(p);
+    }).join();
+    ZYRFree(small);
+    ZYRFree(filler);
+}
+
+TEST_F(ZYRMemTest, FreesWhileAThreadEndsAreCounted) {
+    zyrtest::installFront(0);
+    const unsigned long long before = GetMemUsage();
+    // The thread's only free is its record's, made while the thread is torn down.
+    std::thread([] { SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("short", true)); }).join();
+    EXPECT_EQ(GetMemUsage(), before);
 }
 
 TEST_F(ZYRMemTest, LimitSetterOnlyLowersAndClamps) {

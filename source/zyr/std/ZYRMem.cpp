@@ -2,6 +2,8 @@
 // the leak report.
 #include "zyr/std/ZYRMem.h"
 
+#include <pthread.h>
+
 #include <algorithm>
 #include <atomic>
 #include <chrono>
@@ -69,6 +71,97 @@ constinit std::atomic<uint64_t> memReserveBytes{detail::kDefaultMemReserve};
 constinit std::atomic<uint64_t> totalUsage{0};
 constinit std::atomic<int> usageCheckCounter{1};
 constinit std::atomic<bool> testAvailablePhysical{true};
+
+// Bytes a thread freed that the total still counts. The thread hands them straight to its
+// next allocations, so most allocations and frees touch no shared cache line, while the
+// total never counts less than is held. It runs ahead by at most kPendingFreeLimit per
+// thread, and a limit test about to refuse first takes back every thread's pending bytes.
+constexpr uint64_t kPendingFreeLimit = 64 * 1024;
+
+struct PendingFrees {
+    std::atomic<uint64_t> bytes{0}; // taken by its thread, drained by a refusing one
+    PendingFrees* next = nullptr;   // in the list of threads that have pending frees
+    bool registered = false;
+    bool exited = false; // the thread is ending: frees go straight to the total
+};
+// Initial-exec: the hot path reads it without a call into the dynamic linker.
+[[gnu::tls_model("initial-exec")]] thread_local constinit PendingFrees pendingFrees{};
+
+struct PendingRegistry {
+    std::mutex mutex; // guards the list of threads
+    PendingFrees* head = nullptr;
+};
+PendingRegistry& pendingRegistry() {
+    static detail::NoDestructor<PendingRegistry> instance;
+    return *instance;
+}
+
+void flushPendingFrees(PendingFrees& pending) {
+    if (pending.bytes.load(std::memory_order_relaxed) != 0)
+        totalUsage.fetch_sub(pending.bytes.exchange(0, std::memory_order_relaxed),
+                             std::memory_order_relaxed);
+}
+
+// Returns true when some thread's pending bytes went back to the total.
+bool drainAllPendingFrees() {
+    PendingRegistry& registry = pendingRegistry();
+    std::lock_guard lock(registry.mutex);
+    bool drained = false;
+    for (PendingFrees* pending = registry.head; pending; pending = pending->next) {
+        const uint64_t bytes = pending->bytes.exchange(0, std::memory_order_relaxed);
+        if (bytes != 0) {
+            totalUsage.fetch_sub(bytes, std::memory_order_relaxed);
+            drained = true;
+        }
+    }
+    return drained;
+}
+
+// A thread's pending bytes go back when it ends. A pthread key rather than a thread_local
+// destructor: frees made while other per-thread data is torn down (the thread record, for
+// one) may register late, and key destructors are run again for keys set meanwhile.
+void pendingFreesThreadExit(void* data) {
+    auto* pending = static_cast<PendingFrees*>(data);
+    PendingRegistry& registry = pendingRegistry();
+    std::lock_guard lock(registry.mutex);
+    for (PendingFrees** link = &registry.head; *link; link = &(*link)->next) {
+        if (*link == pending) {
+            *link = pending->next;
+            break;
+        }
+    }
+    flushPendingFrees(*pending);
+    pending->exited = true;
+}
+
+pthread_key_t pendingFreesKey() {
+    static const pthread_key_t key = [] {
+        pthread_key_t created{};
+        ::pthread_key_create(&created, pendingFreesThreadExit);
+        return created;
+    }();
+    return key;
+}
+
+// On a thread's first free: list its pending bytes and have them given back at its end.
+void registerPendingFrees(PendingFrees& pending) {
+    ::pthread_setspecific(pendingFreesKey(), &pending);
+    PendingRegistry& registry = pendingRegistry();
+    std::lock_guard lock(registry.mutex);
+    pending.next = registry.head;
+    registry.head = &pending;
+    pending.registered = true;
+}
+
+// Takes `bytes` from this thread's pending frees when it has that many.
+bool takePendingFrees(PendingFrees& pending, uint64_t bytes) {
+    uint64_t available = pending.bytes.load(std::memory_order_relaxed);
+    while (available >= bytes)
+        if (pending.bytes.compare_exchange_weak(available, available - bytes,
+                                                std::memory_order_relaxed))
+            return true;
+    return false;
+}
 
 bool usageCheckOn() {
     return usageCheckCounter.load(std::memory_order_relaxed) >= 1;
@@ -144,7 +237,8 @@ void* plainAlloc(unsigned int size) {
     void* block = host.allocProc(size + kPlainHeader, host.clientData);
     if (!block)
         return nullptr;
-    if (!detail::plainLimitTest(round8(size), 0, true)) {
+    const uint64_t accounted = round8(size);
+    if (!takePendingFrees(pendingFrees, accounted) && !detail::plainLimitTest(accounted, 0, true)) {
         host.freeProc(block, host.clientData);
         detail::sendOutOfMemoryNotice();
         return nullptr;
@@ -157,7 +251,16 @@ void plainFree(void* p) {
     void* block = plainBlock(p);
     const uint64_t accounted = round8(plainSize(block));
     host.freeProc(block, host.clientData);
-    totalUsage.fetch_sub(accounted, std::memory_order_relaxed);
+    PendingFrees& pending = pendingFrees;
+    if (pending.exited) {
+        totalUsage.fetch_sub(accounted, std::memory_order_relaxed);
+        return;
+    }
+    if (!pending.registered)
+        registerPendingFrees(pending);
+    if (pending.bytes.fetch_add(accounted, std::memory_order_relaxed) + accounted >
+        kPendingFreeLimit)
+        flushPendingFrees(pending);
 }
 
 void* plainRealloc(void* p, unsigned int size) {
@@ -366,7 +469,7 @@ void DisableMemUsageCheck() {
 unsigned long long GetMemUsage() {
     if (statLevel != 0)
         return detail::trackerCurrentBytes();
-    return totalUsage.load(std::memory_order_relaxed);
+    return detail::plainUsage();
 }
 
 void* Memcpy(void* dst, const void* src, unsigned int n) {
@@ -446,6 +549,7 @@ void configureFront(int level) {
         if (level > 2)
             t.walker.reset(IImpStackWalkerStub::create());
     }
+    drainAllPendingFrees();
     statLevel = level;
     front = level != 0 ? kGuardedFront : kPlainFront;
 }
@@ -471,8 +575,13 @@ bool plainLimitTest(uint64_t add, uint64_t sub, bool move) {
     uint64_t current = totalUsage.load(std::memory_order_relaxed);
     for (;;) {
         const uint64_t next = current + add - sub;
-        if (next > memLimitBytes.load(std::memory_order_relaxed) && usageCheckOn())
-            return false;
+        if (next > memLimitBytes.load(std::memory_order_relaxed) && usageCheckOn()) {
+            // Bytes freed but not yet given back must never be what refuses a request.
+            if (!drainAllPendingFrees())
+                return false;
+            current = totalUsage.load(std::memory_order_relaxed);
+            continue;
+        }
         if (!move)
             return true;
         if (totalUsage.compare_exchange_weak(current, next, std::memory_order_relaxed))
@@ -487,6 +596,7 @@ void plainUsageSub(uint64_t bytes) {
     totalUsage.fetch_sub(bytes, std::memory_order_relaxed);
 }
 uint64_t plainUsage() {
+    flushPendingFrees(pendingFrees); // the caller's own frees are always counted
     return totalUsage.load(std::memory_order_relaxed);
 }
 
