@@ -19,11 +19,7 @@
 #define ZYR_POOL_UNPOISON(addr, size) ((void)(addr), (void)(size))
 #endif
 
-namespace ZYRStd {
-
-I_VariableSizeAllocator::~I_VariableSizeAllocator() = default;
-
-} // namespace ZYRStd
+namespace ZYRStd {} // namespace ZYRStd
 
 namespace {
 
