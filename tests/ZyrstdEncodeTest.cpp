@@ -6,36 +6,20 @@
 #include <cctype>
 #include <cerrno>
 #include <cstdlib>
-#include <fcntl.h>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <random>
-#include <spawn.h>
 #include <string>
-#include <sys/wait.h>
 #include <vector>
 
 #include "TestSupport.h"
 
-extern char** environ;
-
 namespace {
 
-struct Outcome {
-    int exitCode = -1;
-    std::string out;
-    std::string err;
-};
-
-std::string readFile(const std::string& path) {
-    std::ifstream in(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
-}
-
-void writeFile(const std::string& path, const std::string& bytes) {
-    std::ofstream(path, std::ios::binary) << bytes;
-}
+using zyrtest::Outcome;
+using zyrtest::readFile;
+using zyrtest::writeFile;
 
 std::string randomBytes(size_t n, unsigned int seed) {
     std::mt19937 random(seed);
@@ -43,41 +27,6 @@ std::string randomBytes(size_t n, unsigned int seed) {
     for (size_t i = 0; i < n; ++i)
         out[i] = (i / 16) % 5 == 0 ? '\0' : static_cast<char>(random());
     return out;
-}
-
-// Runs `program args...` (searched in PATH) with standard input from `input`; both output
-// streams go through files so that neither pipe can fill up. Exit code -1: not started.
-Outcome run(const std::string& program, const std::vector<std::string>& args,
-            const zyrtest::TempDir& dir, const std::string& input = "/dev/null") {
-    const std::string outPath = dir.file(".stdout"), errPath = dir.file(".stderr");
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 0, input.c_str(), O_RDONLY, 0);
-    posix_spawn_file_actions_addopen(&actions, 1, outPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
-    posix_spawn_file_actions_addopen(&actions, 2, errPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
-    std::vector<std::string> argvText{program};
-    argvText.insert(argvText.end(), args.begin(), args.end());
-    std::vector<char*> argv;
-    for (std::string& arg : argvText)
-        argv.push_back(arg.data());
-    argv.push_back(nullptr);
-
-    Outcome outcome;
-    pid_t pid = 0;
-    const int spawned =
-        posix_spawnp(&pid, program.c_str(), &actions, nullptr, argv.data(), environ);
-    posix_spawn_file_actions_destroy(&actions);
-    if (spawned != 0)
-        return outcome;
-    int status = 0;
-    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
-    }
-    outcome.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
-    outcome.out = readFile(outPath);
-    outcome.err = readFile(errPath);
-    return outcome;
 }
 
 class ZyrstdEncodeTest : public ::testing::Test {
@@ -89,7 +38,7 @@ protected:
         tool_ = path;
     }
     Outcome zyrstd(const std::vector<std::string>& args, const std::string& input = "/dev/null") {
-        return run(tool_, args, dir_, input);
+        return zyrtest::runProgram(tool_, args, dir_, input);
     }
     // The names in the directory, but for the captured output streams.
     std::vector<std::string> listing() const {
@@ -104,7 +53,7 @@ protected:
     }
     bool python(const std::string& script, const std::string& input, std::string& output) {
         writeFile(dir_.file("py.in"), input);
-        const Outcome o = run("python3", {"-c", script}, dir_, dir_.file("py.in"));
+        const Outcome o = zyrtest::runProgram("python3", {"-c", script}, dir_, dir_.file("py.in"));
         output = o.out;
         ::unlink(dir_.file("py.in").c_str());
         return o.exitCode == 0;
@@ -173,8 +122,8 @@ TEST_F(ZyrstdEncodeTest, AgreesWithIndependentCodecs) {
         ASSERT_EQ(o.exitCode, 0) << o.err;
         EXPECT_TRUE(o.out == bytes) << "we decode python3's ASCII85";
     }
-    if (run("basenc", {"--version"}, dir_).exitCode == 0) {
-        const Outcome b16 = run("basenc", {"--base16", in}, dir_);
+    if (zyrtest::runProgram("basenc", {"--version"}, dir_).exitCode == 0) {
+        const Outcome b16 = zyrtest::runProgram("basenc", {"--base16", in}, dir_);
         ASSERT_EQ(b16.exitCode, 0);
         writeFile(dir_.file("basenc.hex"), b16.out);
         const Outcome o = zyrstd({"decode", "asciihex", dir_.file("basenc.hex")});
@@ -187,7 +136,8 @@ TEST_F(ZyrstdEncodeTest, AgreesWithIndependentCodecs) {
             if (c != '\r')
                 upper += static_cast<char>(std::toupper(static_cast<unsigned char>(c)));
         writeFile(dir_.file("upper.hex"), upper);
-        const Outcome back2 = run("basenc", {"-d", "--base16", dir_.file("upper.hex")}, dir_);
+        const Outcome back2 =
+            zyrtest::runProgram("basenc", {"-d", "--base16", dir_.file("upper.hex")}, dir_);
         EXPECT_EQ(back2.exitCode, 0) << back2.err;
         EXPECT_TRUE(back2.out == bytes) << "basenc decodes our hex digits";
     }

@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <string>
+#include <vector>
 
 #include "ZYRStd.h"
 
@@ -22,6 +23,22 @@ struct FailingHost {
 // Installs a host record (C runtime by default) with the given statistics level and a
 // generous limit; restores "ZYR_MEMORY_STAT" afterwards.
 void installFront(int statLevel, ZYRStd::tZYRMemMgr* host = nullptr);
+
+std::string readFile(const std::string& path);
+void writeFile(const std::string& path, const std::string& bytes);
+
+class TempDir;
+
+struct Outcome {
+    int exitCode = -1; // -1: the program did not start
+    std::string out;
+    std::string err;
+};
+
+// Runs `program args...` (searched in PATH) with standard input from `input`; both output
+// streams go through files in `dir`, so that neither pipe can fill up and block.
+Outcome runProgram(const std::string& program, const std::vector<std::string>& args,
+                   const TempDir& dir, const std::string& input = "/dev/null");
 
 // A fresh directory under the system's temporary directory, removed by the destructor.
 class TempDir {
