@@ -1,19 +1,32 @@
 # Two commands do everything on a fresh Debian machine: `make demo` and `make test`.
-PACKAGES := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev \
-            libboost-system-dev libboost-date-time-dev googletest libgtest-dev \
-            libbenchmark-dev libssl-dev
-BUILD      ?= build
-ASAN_BUILD ?= build-asan
+# Each target installs the Debian packages it needs and no more.
+BUILD_PACKAGES   := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev
+TEST_PACKAGES    := $(BUILD_PACKAGES) googletest libgtest-dev python3 binutils
+BENCH_PACKAGES   := $(BUILD_PACKAGES) libbenchmark-dev libssl-dev libinih-dev libabsl-dev
+FUZZ_PACKAGES    := $(BUILD_PACKAGES) clang libclang-rt-14-dev
+PACKAGE_PACKAGES := $(BUILD_PACKAGES) dpkg-dev file
+
+BUILD       ?= build
+ASAN_BUILD  ?= build-asan
+TSAN_BUILD  ?= build-tsan
 BENCH_BUILD ?= build-bench
+FUZZ_BUILD  ?= build-fuzz
+PACKAGE_BUILD ?= build-package
 CMAKE_FLAGS := -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo
 CTEST_FLAGS := --output-on-failure -j2
+# Seconds each fuzz target runs under `make fuzz`.
+FUZZ_SECONDS ?= 60
+# Seconds the soak test runs under `make soak`.
+SOAK_SECONDS ?= 60
 
-.PHONY: all deps build demo test test-normal test-asan bench install clean format
+.PHONY: all deps deps-test deps-bench deps-fuzz deps-package build demo test test-normal \
+        test-asan test-tsan bench fuzz soak install package clean format
 
 all: build
 
-deps:
-	@missing=""; for p in $(PACKAGES); do \
+# Installs the packages named in $(1) that are missing (as root; otherwise says how).
+define install_packages
+	@missing=""; for p in $(1); do \
 	  dpkg-query -W -f='$${Status}' $$p 2>/dev/null | grep -q 'install ok installed' || missing="$$missing $$p"; \
 	done; \
 	if [ -n "$$missing" ]; then \
@@ -25,9 +38,22 @@ deps:
 	    echo "Install them with: sudo apt-get install$$missing"; exit 1; \
 	  fi; \
 	fi
+endef
 
+deps:
+	$(call install_packages,$(BUILD_PACKAGES))
+deps-test:
+	$(call install_packages,$(TEST_PACKAGES))
+deps-bench:
+	$(call install_packages,$(BENCH_PACKAGES))
+deps-fuzz:
+	$(call install_packages,$(FUZZ_PACKAGES))
+deps-package:
+	$(call install_packages,$(PACKAGE_PACKAGES))
+
+# `make build`, `make demo` and `make install` need no test framework.
 $(BUILD)/build.ninja: | deps
-	cmake -S . -B $(BUILD) $(CMAKE_FLAGS)
+	cmake -S . -B $(BUILD) $(CMAKE_FLAGS) -DZYRSTD_BUILD_TESTS=OFF
 
 build: deps $(BUILD)/build.ninja
 	cmake --build $(BUILD)
@@ -35,30 +61,63 @@ build: deps $(BUILD)/build.ninja
 demo: build
 	./$(BUILD)/zyrstd demo
 
-test-normal: build
-	cd $(BUILD) && ctest $(CTEST_FLAGS)
+install: build
+	cmake --install $(BUILD) $(if $(PREFIX),--prefix $(PREFIX))
 
-$(ASAN_BUILD)/build.ninja: | deps
-	cmake -S . -B $(ASAN_BUILD) $(CMAKE_FLAGS) -DZYRSTD_SANITIZE=ON
+# The tests build in directories of their own, with the test framework switched on.
+test-normal: deps-test
+	cmake -S . -B $(BUILD)-test $(CMAKE_FLAGS) -DZYRSTD_BUILD_TESTS=ON -DZYRSTD_SANITIZE=
+	cmake --build $(BUILD)-test
+	cd $(BUILD)-test && ctest $(CTEST_FLAGS)
 
-test-asan: deps $(ASAN_BUILD)/build.ninja
+test-asan: deps-test
+	cmake -S . -B $(ASAN_BUILD) $(CMAKE_FLAGS) -DZYRSTD_SANITIZE=address
 	cmake --build $(ASAN_BUILD)
 	cd $(ASAN_BUILD) && ASAN_OPTIONS=detect_leaks=1 UBSAN_OPTIONS=print_stacktrace=1 ctest $(CTEST_FLAGS)
 
-test: test-normal test-asan
+# ThreadSanitizer runs the suites that start threads. Address-space randomisation of
+# recent kernels is too wide for its shadow layout, so the tests run with it narrowed.
+test-tsan: deps-test
+	cmake -S . -B $(TSAN_BUILD) $(CMAKE_FLAGS) -DZYRSTD_SANITIZE=thread
+	cmake --build $(TSAN_BUILD)
+	cd $(TSAN_BUILD) && TSAN_OPTIONS="halt_on_error=1 second_deadlock_stack=1" \
+	  setarch $$(uname -m) -R ctest $(CTEST_FLAGS) -L threads
 
-$(BENCH_BUILD)/build.ninja: | deps
+test: test-normal test-asan test-tsan
+
+bench: deps-bench
 	cmake -S . -B $(BENCH_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=Release -DZYRSTD_BUILD_TESTS=OFF -DZYRSTD_BUILD_BENCH=ON
-
-bench: deps $(BENCH_BUILD)/build.ninja
 	cmake --build $(BENCH_BUILD)
 	@for b in $(BENCH_BUILD)/*Bench; do echo "== $$b"; $$b --benchmark_min_time=0.2 || exit 1; done
 
-install: build
-	cmake --install $(BUILD) $(if $(PREFIX),--prefix $(PREFIX))
+# Each libFuzzer target runs for FUZZ_SECONDS from its seed corpus (new finds go to a
+# scratch corpus, so the tree only changes when someone copies a case in).
+fuzz: deps-fuzz
+	CC=clang CXX=clang++ cmake -S . -B $(FUZZ_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+	  -DZYRSTD_SANITIZE=address -DZYRSTD_BUILD_TESTS=OFF -DZYRSTD_BUILD_FUZZ=ON
+	cmake --build $(FUZZ_BUILD)
+	@for f in fuzz/*Fuzz.cpp; do \
+	  name=$$(basename $$f .cpp); scratch=$(FUZZ_BUILD)/corpus/$$name; mkdir -p $$scratch; \
+	  echo "== $$name ($(FUZZ_SECONDS) s)"; \
+	  ASAN_OPTIONS=detect_leaks=1 ./$(FUZZ_BUILD)/$$name -max_total_time=$(FUZZ_SECONDS) \
+	    -print_final_stats=1 $$scratch fuzz/corpus/$$name 2>&1 | \
+	    grep -E 'stat::number_of_executed_units|ERROR|SUMMARY|Done' || exit 1; \
+	done
+
+soak: deps-test
+	cmake -S . -B $(BUILD)-test $(CMAKE_FLAGS) -DZYRSTD_BUILD_TESTS=ON -DZYRSTD_SANITIZE=
+	cmake --build $(BUILD)-test --target ZYRSoak
+	ZYRSTD_SOAK_SECONDS=$(SOAK_SECONDS) ./$(BUILD)-test/ZYRSoak
+
+# Debian packages of the runtime library with the tool, and of the development files.
+package: deps-package
+	cmake -S . -B $(PACKAGE_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=Release -DZYRSTD_BUILD_TESTS=OFF
+	cmake --build $(PACKAGE_BUILD)
+	cd $(PACKAGE_BUILD) && cpack -G DEB
+	@ls -1 $(PACKAGE_BUILD)/*.deb
 
 format:
 	clang-format -i $$(git ls-files '*.cpp' '*.h')
 
 clean:
-	rm -rf $(BUILD) $(ASAN_BUILD) $(BENCH_BUILD)
+	rm -rf $(BUILD) $(BUILD)-test $(ASAN_BUILD) $(TSAN_BUILD) $(BENCH_BUILD) $(FUZZ_BUILD) $(PACKAGE_BUILD)

@@ -1,5 +1,6 @@
 // Shared helpers for the benchmarks.
 #include "BenchSupport.h"
+#include "ZYRHostKit.h"
 
 #include <benchmark/benchmark.h>
 
@@ -53,9 +54,7 @@ private:
 } // namespace
 
 void installFront() {
-    ZYRStd::tZYRMemMgr host{[](size_t n, void*) { return std::malloc(n); },
-                            [](void* p, size_t n, void*) { return std::realloc(p, n); },
-                            [](void* p, void*) { std::free(p); }, nullptr};
+    ZYRStd::tZYRMemMgr host = ZYRHostKit::crtMemMgr();
     ZYRStd::ZYRStdInit_ZYRMemMgrSet(&host);
 }
 

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "CZYRBaseRefCnt.h"
 
 namespace ZYRStd {
 class CZYRString;

@@ -6,7 +6,7 @@
 #include "IZYRStream.h"
 #include "ZYRPDLFileSysRec.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "CZYRBaseRefCnt.h"
 
 namespace ZYRFileSys {
 

@@ -4,8 +4,10 @@
 #pragma once
 
 #include "IZYRFileName.h"
+#include "IZYRFileSys.h"
 #include "ZYRPDLFileSysRec.h"
 #include "zyr/std/CZYRString.h"
+#include "zyr/std/ZYRStdInit.h"
 
 namespace ZYRHostKit {
 
@@ -47,5 +49,28 @@ ZYRPublic::_t_ZYRPDLFileSysRec posixFileProcs();
 
 // UTF-8 to UTF-16; malformed bytes become U+FFFD.
 ZYRStd::CZYRWString utf8ToUTF16(const char* text);
+
+// The host memory procedures over the C runtime heap (malloc, realloc, free).
+ZYRStd::tZYRMemMgr crtMemMgr();
+
+// The library as a small host sets it up: the common strings and the dynamic string
+// cache, the POSIX file-name factory and the native file system as the default one; all
+// undone in reverse order by the destructor. The memory procedures must be installed
+// first (ZYRStdInit_ZYRMemMgrSet). One session at a time; throws CZYRError when the file
+// system cannot be created, with nothing left set up.
+class HostSession {
+public:
+    HostSession();
+    ~HostSession();
+    HostSession(const HostSession&) = delete;
+    HostSession& operator=(const HostSession&) = delete;
+
+    ZYRFileSys::IZYRFileSys& fileSystem() const { return *fileSys_; }
+
+private:
+    void shutDown() noexcept;
+
+    ZYRFileSys::IZYRFileSys* fileSys_ = nullptr;
+};
 
 } // namespace ZYRHostKit

@@ -3,7 +3,7 @@
 
 #include "I_Error.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "CZYRBaseRefCnt.h"
 
 namespace ZYRStd {
 class CZYRUniString;

@@ -1,5 +1,6 @@
 // Helpers shared by the test suites.
 #include "TestSupport.h"
+#include "ZYRHostKit.h"
 
 #include <cerrno>
 #include <cstdlib>
@@ -40,9 +41,7 @@ void installFront(int statLevel, ZYRStd::tZYRMemMgr* host) {
     const char* previous = std::getenv("ZYR_MEMORY_STAT");
     const std::string saved = previous ? previous : "";
     ::setenv("ZYR_MEMORY_STAT", std::to_string(statLevel).c_str(), 1);
-    ZYRStd::tZYRMemMgr crt{[](size_t n, void*) { return std::malloc(n); },
-                           [](void* p, size_t n, void*) { return std::realloc(p, n); },
-                           [](void* p, void*) { std::free(p); }, nullptr};
+    ZYRStd::tZYRMemMgr crt = ZYRHostKit::crtMemMgr();
     ZYRStd::ZYRStdInit_ZYRMemMgrSet(host ? host : &crt);
     if (previous)
         ::setenv("ZYR_MEMORY_STAT", saved.c_str(), 1);

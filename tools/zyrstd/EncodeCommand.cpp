@@ -49,41 +49,6 @@ std::string describe(const CZYRError& e) {
     return e.getMessage() ? e.getMessage() : "error " + std::to_string(e.getError());
 }
 
-// The library as this host sets it up: string tables, the POSIX file-name factory and
-// the native file system; all undone in reverse order.
-class LibrarySession {
-public:
-    LibrarySession() {
-        ZYRStd::InitCommonUniStrings();
-        ZYRStd::InitDynamicUniStringCache();
-        ZYRStd::ZYRStdInit_SetZYRFactoryProc(ZYRHostKit::posixFileNameFactory);
-        fileSys_ = ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(),
-                                                       ZYRStd::CZYRUniString(), nullptr);
-        if (!fileSys_) {
-            shutDown();
-            failWith("cannot create the file system");
-        }
-        current_ = fileSys_;
-        ZYRStd::ZYRStdInit_SetDefaultFileSysProc([] { return current_; });
-    }
-    ~LibrarySession() { shutDown(); }
-    LibrarySession(const LibrarySession&) = delete;
-    LibrarySession& operator=(const LibrarySession&) = delete;
-
-private:
-    void shutDown() {
-        ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
-        current_ = nullptr;
-        delete fileSys_;
-        ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
-        ZYRStd::ReleaseDynamicUniStringCache();
-        ZYRStd::ReleaseCommonUniStrings();
-    }
-
-    static inline ZYRFileSys::IZYRFileSys* current_ = nullptr;
-    ZYRFileSys::IZYRFileSys* fileSys_ = nullptr;
-};
-
 // Standard input or output as a stream; the descriptor is borrowed.
 class DescriptorStream : public IZYRStream, public ZYRStd::CZYRClientBase {
 public:
@@ -404,7 +369,7 @@ int run(int argc, char** argv, bool encoding) {
         return usage;
     const std::string inName = displayName(args.in, "standard input");
     try {
-        LibrarySession session;
+        ZYRHostKit::HostSession session;
         CZYRSmartZYRRefPtr<IZYRStream> in = openInput(args.in);
         Output out(args.out);
         try {

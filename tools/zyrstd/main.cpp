@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "Commands.h"
+#include "ZYRHostKit.h"
 #include "ZYRStd.h"
 
 namespace {
@@ -39,10 +40,8 @@ void printUsage(std::FILE* out) {
 }
 
 void installHostMemory() {
-    ZYRStd::tZYRMemMgr host{[](size_t n, void*) { return std::malloc(n); },
-                            [](void* p, size_t n, void*) { return std::realloc(p, n); },
-                            [](void* p, void*) { std::free(p); }, nullptr};
-    // The front copies the record, so a local one is enough.
+    // The front copies the record, so a temporary is enough.
+    ZYRStd::tZYRMemMgr host = ZYRHostKit::crtMemMgr();
     ZYRStd::ZYRStdInit_ZYRMemMgrSet(&host);
 }
 

@@ -3,13 +3,28 @@
 
 namespace ZYRStd {
 
-namespace {
-// Taking the addresses makes the compiler emit one out-of-line copy of each function,
-// exported for callers that do not inline them (function pointers, other languages).
-[[gnu::used]] constexpr int32_t (*kExported2[])(int32_t, int32_t) = {&FixedMul, &fracmul,
-                                                                     &TFixedDiv, &fixratio};
-[[gnu::used]] constexpr int32_t (*kExportedMulDiv)(int32_t, int32_t, int32_t, bool) = &FixedMulDiv;
-[[gnu::used]] constexpr int32_t (*kExportedFloat)(float*) = &PFloatToFixed;
-} // namespace
+int32_t FixedMul(int32_t a, int32_t b) {
+    return fixed_detail::fixedMul(a, b);
+}
+
+int32_t fracmul(int32_t a, int32_t b) {
+    return fixed_detail::fracMul(a, b);
+}
+
+int32_t TFixedDiv(int32_t a, int32_t b) {
+    return fixed_detail::fixedDiv(a, b);
+}
+
+int32_t fixratio(int32_t a, int32_t b) {
+    return fixed_detail::fixRatio(a, b);
+}
+
+int32_t FixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded) {
+    return fixed_detail::fixedMulDiv(a, b, c, rounded);
+}
+
+int32_t PFloatToFixed(float* p) {
+    return fixed_detail::floatToFixed(p);
+}
 
 } // namespace ZYRStd

@@ -11,23 +11,6 @@
 
 namespace ZYRStd {
 
-// Every result saturates to 0x80000000 or 0x7FFFFFFF instead of wrapping, and every
-// rounding is half away from zero, computed exactly. The functions are inline because
-// rasterising loops call them per pixel; the library still exports a copy of each.
-
-// a times b / 2^16, rounded.
-ZYRSTD_API inline int32_t FixedMul(int32_t a, int32_t b);
-// a times b / 2^30, rounded.
-ZYRSTD_API inline int32_t fracmul(int32_t a, int32_t b);
-// a / b times 2^16, truncated; b = 0 gives the extreme of a's sign (0 / 0 is positive).
-ZYRSTD_API inline int32_t TFixedDiv(int32_t a, int32_t b);
-// a / b times 2^30, rounded; b = 0 as for TFixedDiv.
-ZYRSTD_API inline int32_t fixratio(int32_t a, int32_t b);
-// a times b / c through a 64-bit product, truncated or rounded; c = 0 saturates.
-ZYRSTD_API inline int32_t FixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded);
-// *p times 2^16, rounded; NaN gives 0.
-ZYRSTD_API inline int32_t PFloatToFixed(float* p);
-
 namespace fixed_detail {
 
 inline constexpr int32_t kMin = std::numeric_limits<int32_t>::min();
@@ -57,18 +40,15 @@ inline int32_t divideByZero(int32_t a) {
     return a < 0 ? kMin : kMax;
 }
 
-} // namespace fixed_detail
-
-inline int32_t FixedMul(int32_t a, int32_t b) {
-    return fixed_detail::mulShiftRounded(a, b, 16);
+inline int32_t fixedMul(int32_t a, int32_t b) {
+    return mulShiftRounded(a, b, 16);
 }
 
-inline int32_t fracmul(int32_t a, int32_t b) {
-    return fixed_detail::mulShiftRounded(a, b, 30);
+inline int32_t fracMul(int32_t a, int32_t b) {
+    return mulShiftRounded(a, b, 30);
 }
 
-inline int32_t TFixedDiv(int32_t a, int32_t b) {
-    using namespace fixed_detail;
+inline int32_t fixedDiv(int32_t a, int32_t b) {
     if (b == 0)
         return divideByZero(a);
     // 2^47 at most, and 64-bit division truncates toward zero as required.
@@ -76,8 +56,7 @@ inline int32_t TFixedDiv(int32_t a, int32_t b) {
     return static_cast<int32_t>(std::clamp<int64_t>(q, kMin, kMax));
 }
 
-inline int32_t fixratio(int32_t a, int32_t b) {
-    using namespace fixed_detail;
+inline int32_t fixRatio(int32_t a, int32_t b) {
     if (b == 0)
         return divideByZero(a);
     const uint64_t num = magnitude(a) << 30;
@@ -88,8 +67,7 @@ inline int32_t fixratio(int32_t a, int32_t b) {
     return saturate((a < 0) != (b < 0), q);
 }
 
-inline int32_t FixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded) {
-    using namespace fixed_detail;
+inline int32_t fixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded) {
     const bool negative = ((a < 0) ^ (b < 0) ^ (c < 0)) != 0;
     if (c == 0)
         return negative ? kMin : kMax;
@@ -102,8 +80,7 @@ inline int32_t FixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded) {
     return saturate(negative, q);
 }
 
-inline int32_t PFloatToFixed(float* p) {
-    using namespace fixed_detail;
+inline int32_t floatToFixed(float* p) {
     const float x = *p;
     // Truncating NaN to an integer is undefined; it has no magnitude, so it becomes 0.
     if (std::isnan(x))
@@ -117,6 +94,45 @@ inline int32_t PFloatToFixed(float* p) {
     if (t >= 2147483648.0)
         return kMax;
     return static_cast<int32_t>(t);
+}
+
+} // namespace fixed_detail
+
+// Every result saturates to 0x80000000 or 0x7FFFFFFF instead of wrapping, and every
+// rounding is half away from zero, computed exactly. Rasterising loops call these per
+// pixel, so the bodies below are visible for inlining; they are gnu_inline, which makes
+// them inline-only: a call that is not inlined goes to the library's one exported copy,
+// and no program or library emits a weak copy of its own.
+
+// a times b / 2^16, rounded.
+[[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t FixedMul(int32_t a, int32_t b) {
+    return fixed_detail::fixedMul(a, b);
+}
+
+// a times b / 2^30, rounded.
+[[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t fracmul(int32_t a, int32_t b) {
+    return fixed_detail::fracMul(a, b);
+}
+
+// a / b times 2^16, truncated; b = 0 gives the extreme of a's sign (0 / 0 is positive).
+[[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t TFixedDiv(int32_t a, int32_t b) {
+    return fixed_detail::fixedDiv(a, b);
+}
+
+// a / b times 2^30, rounded; b = 0 as for TFixedDiv.
+[[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t fixratio(int32_t a, int32_t b) {
+    return fixed_detail::fixRatio(a, b);
+}
+
+// a times b / c through a 64-bit product, truncated or rounded; c = 0 saturates.
+[[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t FixedMulDiv(int32_t a, int32_t b, int32_t c,
+                                                                 bool rounded) {
+    return fixed_detail::fixedMulDiv(a, b, c, rounded);
+}
+
+// *p times 2^16, rounded; NaN gives 0.
+[[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t PFloatToFixed(float* p) {
+    return fixed_detail::floatToFixed(p);
 }
 
 } // namespace ZYRStd

@@ -1,0 +1,45 @@
+#!/usr/bin/env bash
+# Installs the build into a fresh prefix, moves the prefix, and checks what a new user
+# does there: the tool starts without LD_LIBRARY_PATH, and a program including ZYRStd.h
+# builds and runs through pkg-config and through find_package.
+set -euo pipefail
+build="$1"
+here="$2"
+work="$(mktemp -d)"
+trap 'rm -rf "$work"' EXIT
+unset LD_LIBRARY_PATH
+
+cmake --install "$build" --prefix "$work/first" >/dev/null
+# Relocatable: nothing may remember where it was installed.
+mv "$work/first" "$work/prefix"
+prefix="$work/prefix"
+
+"$prefix/bin/zyrstd" --help >/dev/null
+
+# Only the interface is installed.
+if find "$prefix/include" -name '*.cpp' | grep -q .; then
+    echo "sources installed"; exit 1
+fi
+for internal in ZYRMemInternal.h ZYRNoDestructor.h ZYRFileSys_Posix.h ZYRFileSys_helper.h; do
+    if find "$prefix/include" -name "$internal" | grep -q .; then
+        echo "internal header installed: $internal"; exit 1
+    fi
+done
+if grep -rlE '#include <(unicode|boost)/' "$prefix/include"; then
+    echo "an installed header needs ICU or Boost"; exit 1
+fi
+
+pcdir="$(dirname "$(find "$prefix" -name zyrstd.pc)")"
+export PKG_CONFIG_PATH="$pcdir"
+if ! pkg-config --cflags zyrstd | grep -q -- "$prefix"; then
+    echo "zyrstd.pc does not point into the prefix: $(pkg-config --cflags zyrstd)"; exit 1
+fi
+# shellcheck disable=SC2046
+g++ -std=c++20 "$here/consumer/app.cpp" -o "$work/app-pc" \
+    $(pkg-config --cflags --libs zyrstd-hostkit) -Wl,-rpath,"$(dirname "$pcdir")"
+"$work/app-pc"
+
+cmake -S "$here/consumer" -B "$work/consumer" -G Ninja -DCMAKE_PREFIX_PATH="$prefix" >/dev/null
+cmake --build "$work/consumer" >/dev/null
+"$work/consumer/app"
+echo "install test: ok"
