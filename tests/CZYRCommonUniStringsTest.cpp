@@ -47,6 +47,21 @@ TEST(CZYRCommonUniStringsTest, RowsAccessorsAndLookup) {
     EXPECT_STREQ(CommonUniStringText(693), "*");
 }
 
+TEST(CZYRCommonUniStringsTest, EveryAccessorAnswersItsOwnRowAndText) {
+    IZYRCommonUniStrings* table = GetCommonUniStrings();
+    unsigned int row = 0;
+    auto check = [&](C_SmartPtr<I_UniString> s, const char* name) {
+        EXPECT_EQ(s.get(), table->GetCachedCommonUniString(row).get()) << name << " at row " << row;
+        EXPECT_STREQ(CommonUniStringText(row), name);
+        const std::string text(name);
+        EXPECT_EQ(textOf(s), std::u16string(text.begin(), text.end())) << row;
+        ++row;
+    };
+#define ZYR_COMMON_STRING(Name) check(table->str_##Name(), #Name);
+#include "zyr/std/CZYRCommonUniStrings.def"
+    EXPECT_EQ(row, kCommonUniStringAccessors);
+}
+
 TEST(CZYRCommonUniStringsTest, CacheIsBoundedAndLeastRecentlyUsedGoesFirst) {
     ReleaseDynamicUniStringCache();
     InitDynamicUniStringCache();
