@@ -220,9 +220,8 @@ void ParseConfigData(unsigned char* data, ZYRPublic::eZYRConfigDataType type, un
     const CZYRUniString path = type == ZYRPublic::kZYRConfigDataFilePath
                                    ? CZYRUniString(reinterpret_cast<const char*>(data), "UTF-8")
                                    : CZYRUniString(reinterpret_cast<const char16_t*>(data));
-    CZYRBaseStream stream(
-        CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>(CZYRFileSys::createFileStream(
-            CZYRFileName(path), ZYRStreams::kZYRStreamRead, false)));
+    CZYRBaseStream stream(CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>(
+        CZYRFileSys::createFileStream(CZYRFileName(path), ZYRStreams::kZYRStreamRead, false)));
     ParseConfigsBuffer(stream, cb);
 }
 

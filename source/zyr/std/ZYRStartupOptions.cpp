@@ -168,9 +168,9 @@ struct NamedValue {
 };
 
 constexpr NamedValue kGROptionWords[] = {
-    {"Adaptive", kZYRGROptionAdaptive},       {"HOV", kZYRGROptionHOV},
-    {"Alternate", kZYRGROptionHOV},           {"XPDevice", kZYRGROptionXPDevice},
-    {"Consistency", kZYRGROptionXPDevice},    {"Performance", kZYRGROptionPerformance},
+    {"Adaptive", kZYRGROptionAdaptive},    {"HOV", kZYRGROptionHOV},
+    {"Alternate", kZYRGROptionHOV},        {"XPDevice", kZYRGROptionXPDevice},
+    {"Consistency", kZYRGROptionXPDevice}, {"Performance", kZYRGROptionPerformance},
 };
 
 constexpr NamedValue kCopyDotWords[] = {{"OldDefault", 0}, {"CheckArea", 1}, {"AdjustMatrix", 2}};
@@ -240,8 +240,9 @@ void ZYRParseDLCacheOptions(sDLCacheOptions* options, const char* key, const cha
         // A negative value, or none at all, gives the default budget.
         bool found = false;
         const long long bytes = detail::readInt64(value, &found);
-        options->maxRAM = found && bytes >= 0 ? roundUpToPage(static_cast<unsigned long long>(bytes))
-                                              : defaultDLCacheRAM();
+        options->maxRAM = found && bytes >= 0
+                              ? roundUpToPage(static_cast<unsigned long long>(bytes))
+                              : defaultDLCacheRAM();
         return;
     }
     if (!options)

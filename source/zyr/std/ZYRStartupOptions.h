@@ -14,33 +14,33 @@ class CZYRUniString;
 // ---- records the host fills, parses and stores whole ------------------------------------------
 
 struct sMTOptions {
-    int32_t numMTRThreads;       // "NumMTRThreads"
-    int32_t numMTBThreads;       // "NumMTBThreads"
-    int32_t mtrThreshold;        // "MTRThreshold"
-    bool mtrFallbackPerBand;     // "MTRFallbackPerBand"
+    int32_t numMTRThreads;      // "NumMTRThreads"
+    int32_t numMTBThreads;      // "NumMTBThreads"
+    int32_t mtrThreshold;       // "MTRThreshold"
+    bool mtrFallbackPerBand;    // "MTRFallbackPerBand"
     bool hasExternalCompositor; // "HasExternalCompositor"
 };
 
 struct sDLCacheOptions {
-    unsigned long long maxRAM; // "XObjDLCacheMaxRAM": bytes, a whole number of pages
-    long long maxDisk;         // "XObjDLCacheMaxDisk": bytes
-    unsigned char reserved[16]; // the engine's own fields; no key sets them
-    bool vdpThroughFlattener;   // "VDPThroughFlattener"
-    bool sharedCache;           // "XObjDLSharedCache"
+    unsigned long long maxRAM;    // "XObjDLCacheMaxRAM": bytes, a whole number of pages
+    long long maxDisk;            // "XObjDLCacheMaxDisk": bytes
+    unsigned char reserved[16];   // the engine's own fields; no key sets them
+    bool vdpThroughFlattener;     // "VDPThroughFlattener"
+    bool sharedCache;             // "XObjDLSharedCache"
     int32_t maxPatternCacheEntry; // "MaxPatternCacheEntry"
 };
 
 struct sMarkerOptions {
-    int32_t imageMarkerType;             // "ImageMarkerType"
-    int32_t imageMarkerTiling;           // "ImageMarkerTiling"
-    float imageMarkerFactorSourceStep;   // "ImageMarkerFactorSourceStep"
-    int32_t imageMarkerFactorTiling;     // "ImageMarkerFactorTiling"
-    float meshMarkerFactorD11;           // "MeshMarkerFactorD11"
-    float meshMarkerFactorD18;           // "MeshMarkerFactorD18"
-    float meshMarkerFactorD48;           // "MeshMarkerFactorD48"
-    int32_t sse2;                        // "SSE2"
-    int32_t useNewImageMarker;           // "UseNewImageMarker"
-    bool overScanIdntImageMaskMarking;   // "OverScanIdntImageMaskMarking"
+    int32_t imageMarkerType;           // "ImageMarkerType"
+    int32_t imageMarkerTiling;         // "ImageMarkerTiling"
+    float imageMarkerFactorSourceStep; // "ImageMarkerFactorSourceStep"
+    int32_t imageMarkerFactorTiling;   // "ImageMarkerFactorTiling"
+    float meshMarkerFactorD11;         // "MeshMarkerFactorD11"
+    float meshMarkerFactorD18;         // "MeshMarkerFactorD18"
+    float meshMarkerFactorD48;         // "MeshMarkerFactorD48"
+    int32_t sse2;                      // "SSE2"
+    int32_t useNewImageMarker;         // "UseNewImageMarker"
+    bool overScanIdntImageMaskMarking; // "OverScanIdntImageMaskMarking"
 };
 
 struct sSLDLOptions {
@@ -75,7 +75,8 @@ ZYRSTD_API void ZYRParseSLDLOptions(sSLDLOptions* options, const char* key, cons
 ZYRSTD_API void ZYRSetSLDLOptions(const sSLDLOptions& options);
 ZYRSTD_API sSLDLOptions& ZYRGetSLDLOptions();
 
-// ---- enumerations --------------------------------------------------------------------------------
+// ---- enumerations
+// --------------------------------------------------------------------------------
 
 enum eZYRGROption : int32_t {
     kZYRGROptionAdaptive = 0,    // "Adaptive"
@@ -87,7 +88,8 @@ enum eZYRGROption : int32_t {
 enum eZYRPlanarmapPrecisionOption : int32_t {};
 enum eZYRAtomicRegionDirectCMYKOption : int32_t {};
 
-// ---- key setters: each acts on its own keys and ignores every other ------------------------------
+// ---- key setters: each acts on its own keys and ignores every other
+// ------------------------------
 
 ZYRSTD_API void ZYRGraphicsOptions(const char* key, const char* value);
 ZYRSTD_API void ZYRMaxCacheShadesOption(const char* key, const char* value);
@@ -128,7 +130,8 @@ ZYRSTD_API void ZYRXPShadeCacheOptions(const char* key, const char* value);
 // the allocation front.
 ZYRSTD_API void ZYRParseMemoryOptions(const char* key, const char* value);
 
-// ---- getters of the key options --------------------------------------------------------------------
+// ---- getters of the key options
+// --------------------------------------------------------------------
 
 ZYRSTD_API bool ZYRUseNullGraphics();
 ZYRSTD_API int32_t ZYRMaxCacheShades();
@@ -198,7 +201,8 @@ ZYRSTD_API bool ZYRUseNullXPImage();
 ZYRSTD_API bool ZYRXPShadeCache();
 ZYRSTD_API bool ZYRGetRasterizeAllTransparencyShades();
 
-// ---- options with typed setters -------------------------------------------------------------------
+// ---- options with typed setters
+// -------------------------------------------------------------------
 
 ZYRSTD_API void ZYRSetDeferImageInterpolation(bool on);
 ZYRSTD_API bool ZYRGetDeferImageInterpolation();
