@@ -1,7 +1,7 @@
 # Two commands do everything on a fresh Debian machine: `make demo` and `make test`.
 PACKAGES := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev \
             libboost-system-dev libboost-date-time-dev googletest libgtest-dev \
-            libbenchmark-dev libssl-dev
+            libbenchmark-dev libssl-dev libinih-dev
 BUILD      ?= build
 ASAN_BUILD ?= build-asan
 BENCH_BUILD ?= build-bench
