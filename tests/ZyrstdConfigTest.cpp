@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
-#include <regex>
 #include <string>
 #include <vector>
 
@@ -138,13 +137,15 @@ protected:
     // The defaults' RAM line, taken from --defaults.
     std::string ramLine() {
         const Outcome defaults = zyrstd({"config", "--defaults"});
-        std::smatch match;
-        const std::regex ram("XObjDLCacheMaxRAM = [0-9]+\n");
-        if (!std::regex_search(defaults.out, match, ram)) {
+        const std::string key = "\nXObjDLCacheMaxRAM = ";
+        const size_t at = defaults.out.find(key);
+        const size_t end = defaults.out.find('\n', at + 1);
+        if (at == std::string::npos || end == std::string::npos ||
+            defaults.out.find_first_not_of("0123456789", at + key.size()) != end) {
             ADD_FAILURE() << "no RAM budget in " << defaults.out;
             return "";
         }
-        return match.str();
+        return defaults.out.substr(at + 1, end - at);
     }
 
     std::string tool_;
