@@ -12,5 +12,7 @@ int runMd5(int argc, char** argv);
 int runEncode(int argc, char** argv);
 // decode ascii85|asciihex [IN [OUT]]: the bytes of ASCII85 or ASCIIHex text.
 int runDecode(int argc, char** argv);
+// config FILE... | config --defaults: the effective start-up options after the setup files.
+int runConfig(int argc, char** argv);
 
 } // namespace zyrtool

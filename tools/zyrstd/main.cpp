@@ -26,6 +26,12 @@ constexpr Command kCommands[] = {
     {"decode", zyrtool::runDecode,
      "decode ascii85|asciihex [IN [OUT]]\n"
      "                  decode ASCII85 or ASCIIHex text from IN into OUT"},
+    {"config", zyrtool::runConfig,
+     "config FILE...  read the setup FILEs as a host does at start-up and print the effective\n"
+     "                  options, one 'Key = value' line each; unknown keys are reported\n"
+     "                  on standard error\n"
+     "  config --defaults\n"
+     "                  print the options' defaults"},
     {"demo", zyrtool::runDemo,
      "demo            run a host start-up, allocation under a limit and the leak report"},
 };

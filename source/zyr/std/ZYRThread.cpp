@@ -31,10 +31,7 @@ void SetCZYRThreadSpecificPtr(CZYRThreadSpecificPtr* record) {
         slot.reset(record);
 }
 
-bool ZYRSingleThreadProcess() {
-    // The option store arrives later; until then every process counts as multi-threaded.
-    return false;
-}
+// ZYRSingleThreadProcess reads the start-up option store, in ZYRStartupOptions.cpp.
 
 uint32_t ZYRGetCurrentThreadId() {
     return static_cast<uint32_t>(::syscall(SYS_gettid));

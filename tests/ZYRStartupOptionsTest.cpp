@@ -1,0 +1,473 @@
+// The start-up option store: every key through the host's start-up order to its getter,
+// the rules of the special keys, records, typed setters and the allocation front's options.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <limits>
+#include <map>
+#include <set>
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include "TestSupport.h"
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/ZYRMem.h"
+#include "zyr/std/ZYRStartupOptionKeys.h"
+#include "zyr/std/ZYRStartupOptions.h"
+#include "zyr/std/ZYRThread.h"
+#include "zyr/std/ZYRVirtualMem.h"
+
+using namespace ZYRStd;
+
+namespace {
+
+using Snapshot = std::map<std::string, std::string>;
+
+// Every printable option as the getters give it.
+Snapshot snapshot() {
+    Snapshot values;
+    for (const sZYRStartupOptionKey& row : kZYRStartupOptionKeys) {
+        if (row.show)
+            values[row.key] = row.show();
+    }
+    return values;
+}
+
+// The keys whose printed value changed from `before` to now.
+std::set<std::string> changedSince(const Snapshot& before) {
+    std::set<std::string> changed;
+    for (const auto& [key, value] : snapshot()) {
+        if (before.at(key) != value)
+            changed.insert(key);
+    }
+    return changed;
+}
+
+struct Sample {
+    const char* value;
+    const char* shown;
+};
+
+// Values every key of a reading takes as they are (no key of the reading clamps them), in
+// an order that ends on a value that leaves the other keys' rules alone.
+std::vector<Sample> samplesFor(eZYRStartupReading reading) {
+    switch (reading) {
+    case eZYRStartupReading::kBool:
+        return {{"TRUE", "true"},   {"yes", "false"}, {"7", "true"},
+                {"true ", "false"}, {"True", "true"}, {"0", "false"}};
+    case eZYRStartupReading::kHighLow:
+        return {{"LOW", "false"}, {"lo", "true"}, {"low", "false"}, {"high", "true"}};
+    case eZYRStartupReading::kInt:
+        return {{"42", "42"}, {"  123abc", "123"}, {"2147483648", "2147483647"}, {"57", "57"}};
+    case eZYRStartupReading::kUnsigned:
+        return {{"42", "42"}, {"77", "77"}};
+    case eZYRStartupReading::kInt64:
+        return {{"12345678901", "12345678901"},
+                {"99999999999999999999", "9223372036854775807"},
+                {"-5", "0"},
+                {"4096", "4096"}};
+    case eZYRStartupReading::kFloat:
+        return {{"2.5", "2.5"}, {"0.125", "0.125"}, {"75", "75"}};
+    case eZYRStartupReading::kText:
+        return {{"/opt/trap/libtrap.so", "/opt/trap/libtrap.so"}};
+    default:
+        return {}; // the words and special rules have tests of their own
+    }
+}
+
+// Feeds one pair the way a host does and stores the records.
+struct Host {
+    CZYRStartupOptionFeeder feeder;
+    void feed(const char* key, const char* value) {
+        feeder.feed(key, value);
+        feeder.store();
+    }
+};
+
+// Runs `check` in a fresh process (the store is process-wide and never reset); a
+// non-empty result is the failure, printed for the parent to show.
+[[noreturn]] void checkInFreshProcess(std::string (*check)()) {
+    const std::string failure = check();
+    if (!failure.empty())
+        std::fprintf(stderr, "%s\n", failure.c_str());
+    std::exit(failure.empty() ? 0 : 1);
+}
+
+unsigned long long pageRoundUp(unsigned long long bytes) {
+    const unsigned long long page = GetPageSize();
+    return (bytes + page - 1) / page * page;
+}
+
+unsigned long long expectedDefaultRAM() {
+    tZYRVirtualMemoryInfo info{};
+    VirtualMemStatus(&info);
+    return pageRoundUp(std::min(info.totalPhysical, info.totalVirtual) / 20);
+}
+
+} // namespace
+
+TEST(ZYRStartupOptionsTest, KeyListIsSound) {
+    std::set<std::string> keys;
+    for (const sZYRStartupOptionKey& row : kZYRStartupOptionKeys) {
+        EXPECT_TRUE(keys.insert(row.key).second) << row.key << " is listed twice";
+        EXPECT_TRUE(ZYRIsStartupOptionKey(row.key));
+    }
+    EXPECT_EQ(keys.size(), 90u) << "23 record keys and 67 store keys";
+    EXPECT_FALSE(ZYRIsStartupOptionKey("usenullgraphics")) << "keys are case-sensitive";
+    EXPECT_FALSE(ZYRIsStartupOptionKey(""));
+}
+
+// Each key, read by its rule, changes its own getter and nothing else.
+TEST(ZYRStartupOptionsTest, EveryKeyReachesItsGetter) {
+    Host host;
+    host.feed("UseNew1pxImageMaskHandler", "true"); // lets "OverscanImageMasksThreshold" in
+    host.feed("SingleThreadProcess", "false");      // lets "SurfaceOverLap" show through
+    unsigned int checked = 0;
+    for (const sZYRStartupOptionKey& row : kZYRStartupOptionKeys) {
+        for (const Sample& sample : samplesFor(row.reading)) {
+            const Snapshot before = snapshot();
+            host.feed(row.key, sample.value);
+            EXPECT_EQ(row.show(), sample.shown) << row.key << " " << sample.value;
+            std::set<std::string> changed = changedSince(before);
+            changed.erase(row.key);
+            if (std::string(row.key) == "SingleThreadProcess")
+                changed.erase("SurfaceOverLap"); // 1 while single-threaded, by design
+            EXPECT_TRUE(changed.empty())
+                << row.key << " " << sample.value << " also changed " << *changed.begin();
+            ++checked;
+        }
+    }
+    EXPECT_GT(checked, 250u);
+
+    // Unknown and misspelt keys, and missing texts, change nothing.
+    const Snapshot before = snapshot();
+    for (const char* key : {"usenullgraphics", "UseNullGraphics ", "Unknown", ""})
+        host.feed(key, "1");
+    host.feed(nullptr, "1");
+    host.feed("UseNullGraphics", nullptr);
+    EXPECT_TRUE(changedSince(before).empty());
+}
+
+TEST(ZYRStartupOptionsTest, RulesOfSingleKeys) {
+    Host host;
+    const auto shown = [](const char* key) { return snapshot().at(key); };
+
+    host.feed("MaxCacheShades", "3");
+    EXPECT_EQ(ZYRMaxCacheShades(), 10);
+    host.feed("MaxCacheShades", "11");
+    EXPECT_EQ(ZYRMaxCacheShades(), 11);
+
+    host.feed("SingleThreadProcess", "false");
+    host.feed("SurfaceOverLap", "0");
+    EXPECT_EQ(ZYRSurfaceOverlap(), 1);
+    host.feed("SurfaceOverLap", "5");
+    host.feed("SingleThreadProcess", "true");
+    EXPECT_TRUE(ZYRSingleThreadProcess());
+    EXPECT_EQ(ZYRSurfaceOverlap(), 1);
+    host.feed("SurfaceOverLap", "7");
+    EXPECT_EQ(ZYRSurfaceOverlap(), 1);
+    host.feed("SingleThreadProcess", "false");
+    EXPECT_EQ(ZYRSurfaceOverlap(), 7) << "the stored overlap comes back";
+
+    for (const auto& [value, threshold] : std::vector<std::pair<const char*, unsigned int>>{
+             {"500", 101}, {"101", 101}, {"-1", 101}, {"100", 100}, {"0", 0}}) {
+        host.feed("XPVDPCacheOverlapThreshold", value);
+        EXPECT_EQ(ZYRGetXPVDPCacheOverlapThreshold(), threshold) << value;
+    }
+    host.feed("XPVDPOptimizeFlattening", "false");
+    EXPECT_EQ(ZYRGetXPVDPExperimentalOption(), 0u);
+    host.feed("XPVDPOptimizeFlattening", "true");
+    EXPECT_EQ(ZYRGetXPVDPExperimentalOption(), 1u);
+
+    const struct {
+        const char* key;
+        const char* value;
+        eZYRGROption option;
+    } grOptions[] = {
+        {"GROption", "HOV", kZYRGROptionHOV},
+        {"GROption", "Performance", kZYRGROptionPerformance},
+        {"GROption", "2", kZYRGROptionXPDevice},
+        {"GROption", "7", kZYRGROptionXPDevice},   // out of range: unchanged
+        {"GROption", "abc", kZYRGROptionXPDevice}, // not a word: unchanged, not 0
+        {"GROption", "hov", kZYRGROptionXPDevice}, // words are exact
+        {"GROption", "1x", kZYRGROptionXPDevice},
+        {"GROption", "-1", kZYRGROptionXPDevice},
+        {"GROption", "0", kZYRGROptionAdaptive},
+        {"GROption", "Consistency", kZYRGROptionXPDevice},
+        {"GROption", "Alternate", kZYRGROptionHOV},
+        {"GROption", "Adaptive", kZYRGROptionAdaptive},
+        {"AutomaticGlobalRasterizationOption", "XPDevice", kZYRGROptionXPDevice},
+        {"AutomaticGlobalRasterizationOption", "1", kZYRGROptionHOV},
+    };
+    for (const auto& g : grOptions) {
+        host.feed(g.key, g.value);
+        EXPECT_EQ(ZYRGetGROption(), g.option) << g.key << " " << g.value;
+    }
+
+    host.feed("CopyDotMethod", "AdjustMatrix");
+    EXPECT_EQ(ZYRGetCopyDotApproach(), 2);
+    host.feed("CopyDotMethod", "Unknown");
+    EXPECT_EQ(ZYRGetCopyDotApproach(), 2);
+    host.feed("CopyDotMethod", "0");
+    EXPECT_EQ(ZYRGetCopyDotApproach(), 2) << "the method is chosen by name only";
+    host.feed("CopyDotMethod", "OldDefault");
+    EXPECT_EQ(ZYRGetCopyDotApproach(), 0);
+    host.feed("CopyDotMethod", "CheckArea");
+    EXPECT_EQ(ZYRGetCopyDotApproach(), 1);
+
+    host.feed("UseNew1pxImageMaskHandler", "false");
+    host.feed("OverscanImageMasksThreshold", "5");
+    EXPECT_EQ(ZYRGetOverscanImageMasksThreshold(), 0u);
+    host.feed("UseNew1pxImageMaskHandler", "true");
+    EXPECT_EQ(ZYRGetOverscanImageMasksThreshold(), 1u);
+    host.feed("OverscanImageMasksThreshold", "5");
+    EXPECT_EQ(ZYRGetOverscanImageMasksThreshold(), 5u);
+
+    host.feed("XObjDLCachePurgePercentage", "50");
+    for (const char* ignored : {"150", "-1", "0", "100.5", "nan"})
+        host.feed("XObjDLCachePurgePercentage", ignored);
+    EXPECT_EQ(ZYRXObjDLCachePurgePercentage(), 50.0f);
+    host.feed("XObjDLCachePurgePercentage", "100");
+    EXPECT_EQ(ZYRXObjDLCachePurgePercentage(), 100.0f);
+
+    host.feed("UseFasterOpaqueMarking", "true");
+    EXPECT_EQ(ZYRGetUseFasterOpaqueMarking(), 1);
+    host.feed("UseFasterOpaqueMarking", "no");
+    EXPECT_EQ(ZYRGetUseFasterOpaqueMarking(), 0);
+
+    host.feed("MaxGlyphCache", "-99999999999");
+    EXPECT_EQ(ZYRGetMaxGlyphCache(), std::numeric_limits<int32_t>::min());
+    host.feed("PDFGCMainThreadMemoryThreshold", "-99999999999999999999");
+    EXPECT_EQ(ZYRGetPDFGCMainThreadMemoryThreshold(), 0u);
+    host.feed("ImageMarkerFactorSourceStep", "1e300");
+    EXPECT_EQ(shown("ImageMarkerFactorSourceStep"), "inf") << "beyond the float range";
+    host.feed("AtomicRegionDirectCMYKOption", "3");
+    EXPECT_EQ(ZYRAtomicRegionDirectCMYKOption(), eZYRAtomicRegionDirectCMYKOption{3});
+
+    for (const auto& [value, stored, line] :
+         std::vector<std::tuple<const char*, float, const char*>>{
+             {"-2", 1.0f, "\n   TrapPixelOverlap set to 1.000000\n\n"},
+             {"0", 1.0f, "\n   TrapPixelOverlap set to 1.000000\n\n"},
+             {"0.5", 0.5f, "\n   TrapPixelOverlap set to 0.500000\n\n"},
+             {"nan", 1.0f, "\n   TrapPixelOverlap set to 1.000000\n\n"}}) {
+        ::testing::internal::CaptureStdout();
+        host.feed("TrapPixelOverlap", value);
+        EXPECT_EQ(::testing::internal::GetCapturedStdout(), line) << value;
+        EXPECT_EQ(ZYRGetTrapPixelOverlap(), stored) << value;
+    }
+}
+
+TEST(ZYRStartupOptionsTest, DisplayListCacheRecord) {
+    const unsigned long long page = GetPageSize();
+    sDLCacheOptions options;
+    std::memset(&options, 0x5A, sizeof options);
+    ZYRFillDefaultDLCacheOptions(options, CZYRUniString());
+    EXPECT_EQ(options.maxRAM, expectedDefaultRAM());
+    EXPECT_EQ(options.maxRAM % page, 0u);
+    EXPECT_EQ(options.maxDisk, std::numeric_limits<long long>::max());
+    for (const unsigned char byte : options.reserved)
+        EXPECT_EQ(byte, 0);
+    EXPECT_TRUE(options.vdpThroughFlattener);
+    EXPECT_FALSE(options.sharedCache);
+    EXPECT_EQ(options.maxPatternCacheEntry, 50);
+
+    const struct {
+        const char* value;
+        unsigned long long ram;
+    } budgets[] = {
+        {"1000", page},     {"0", 0}, {"-5", expectedDefaultRAM()}, {"abc", expectedDefaultRAM()},
+        {"  12288", 12288},
+    };
+    for (const auto& b : budgets) {
+        ZYRParseDLCacheOptions(&options, "XObjDLCacheMaxRAM", b.value);
+        EXPECT_EQ(options.maxRAM, b.ram) << b.value;
+    }
+    const std::string oddBytes = std::to_string(3 * page + 1);
+    ZYRParseDLCacheOptions(&options, "XObjDLCacheMaxRAM", oddBytes.c_str());
+    EXPECT_EQ(options.maxRAM, 4 * page);
+
+    // Given a budget, a shared cache keeps it.
+    ZYRParseDLCacheOptions(&options, "XObjDLCacheMaxRAM", "1000");
+    ZYRParseDLCacheOptions(&options, "XObjDLSharedCache", "true");
+    EXPECT_TRUE(options.sharedCache);
+    EXPECT_EQ(options.maxRAM, page);
+
+    for (const auto& [value, disk] : std::vector<std::pair<const char*, long long>>{
+             {"-1", std::numeric_limits<long long>::max()},
+             {"123", 123},
+             {"99999999999999999999", std::numeric_limits<long long>::max()},
+             {"0", 0}}) {
+        ZYRParseDLCacheOptions(&options, "XObjDLCacheMaxDisk", value);
+        EXPECT_EQ(options.maxDisk, disk) << value;
+    }
+
+    // The record parser sets two store options, and a null record leaves the rest alone.
+    ZYRParseDLCacheOptions(nullptr, "TileSuperCell", "false");
+    EXPECT_FALSE(ZYRTileSuperCell());
+    ZYRParseDLCacheOptions(nullptr, "TileSuperCell", "true");
+    EXPECT_TRUE(ZYRTileSuperCell());
+    ZYRParseDLCacheOptions(nullptr, "MaxPatternCacheEntry", "9");
+    ZYRParseMTOptions(nullptr, "NumMTRThreads", "9");
+    ZYRParseMarkerOptions(nullptr, "SSE2", "9");
+    ZYRParseSLDLOptions(nullptr, "SLCompression", "9");
+
+    ZYRSetDLCacheOptions(options);
+    EXPECT_EQ(ZYRGetDLCacheOptions().maxDisk, 0);
+    ZYRGetDLCacheOptions().maxDisk = 77; // the store copy is handed out by reference
+    EXPECT_EQ(ZYRGetDLCacheOptions().maxDisk, 77);
+}
+
+TEST(ZYRStartupOptionsTest, RecordDefaults) {
+    sMTOptions mt;
+    ZYRFillDefaultMTOptions(mt);
+    EXPECT_EQ(mt.numMTRThreads, -1);
+    EXPECT_EQ(mt.numMTBThreads, -1);
+    EXPECT_EQ(mt.mtrThreshold, 100000);
+    EXPECT_TRUE(mt.mtrFallbackPerBand);
+    EXPECT_FALSE(mt.hasExternalCompositor);
+
+    sMarkerOptions marker;
+    ZYRFillDefaultMarkerOptions(marker);
+    EXPECT_EQ(marker.imageMarkerType, 0);
+    EXPECT_EQ(marker.imageMarkerTiling, 0);
+    EXPECT_EQ(marker.imageMarkerFactorSourceStep, 1.5f);
+    EXPECT_EQ(marker.imageMarkerFactorTiling, 1);
+    EXPECT_EQ(marker.meshMarkerFactorD11, 0.125f);
+    EXPECT_EQ(marker.meshMarkerFactorD18, 0.125f);
+    EXPECT_EQ(marker.meshMarkerFactorD48, 0.25f);
+    EXPECT_EQ(marker.sse2, 1);
+    EXPECT_EQ(marker.useNewImageMarker, 1);
+    EXPECT_TRUE(marker.overScanIdntImageMaskMarking);
+
+    sSLDLOptions sldl;
+    ZYRFillDefaultSLDLOptions(sldl);
+    EXPECT_EQ(sldl.slCompression, 1);
+    EXPECT_EQ(sldl.slCompressionRatio, 1.5f);
+    EXPECT_EQ(sldl.sl0CompressionRatio, 2.0f);
+}
+
+// The store copies and the once-only budget flag are process state: look at them fresh.
+TEST(ZYRStartupOptionsTest, FreshProcessState) {
+    EXPECT_EXIT(checkInFreshProcess([]() -> std::string {
+                    const sMTOptions& mt = ZYRGetMTOptions();
+                    const sDLCacheOptions& dl = ZYRGetDLCacheOptions();
+                    if (mt.numMTRThreads != 0 || mt.mtrThreshold != 0 || dl.maxRAM != 0 ||
+                        dl.maxPatternCacheEntry != 0 || ZYRGetMarkerOptions().sse2 != 0 ||
+                        ZYRGetSLDLOptions().slCompressionRatio != 0.0f)
+                        return "a store copy is not zero before its setter";
+                    sDLCacheOptions options;
+                    ZYRFillDefaultDLCacheOptions(options, CZYRUniString());
+                    ZYRParseDLCacheOptions(&options, "XObjDLSharedCache", "true");
+                    if (options.maxRAM != 1073741824)
+                        return "a shared cache without a budget gets " +
+                               std::to_string(options.maxRAM);
+                    ZYRParseDLCacheOptions(&options, "XObjDLCacheMaxRAM", "-1");
+                    sDLCacheOptions later;
+                    ZYRFillDefaultDLCacheOptions(later, CZYRUniString());
+                    ZYRParseDLCacheOptions(&later, "XObjDLSharedCache", "1");
+                    if (later.maxRAM != expectedDefaultRAM())
+                        return "the budget flag did not stay set";
+                    return "";
+                }),
+                ::testing::ExitedWithCode(0), "");
+}
+
+TEST(ZYRStartupOptionsTest, MemoryOptionsReachTheFront) {
+    EXPECT_EXIT(checkInFreshProcess([]() -> std::string {
+                    ZYRParseMemoryOptions("MaxMemLimit", "100000000");
+                    if (ZYRGetMemLimit() != 419430400 || ZYRGetMemReserve() != 314572800)
+                        return "MaxMemLimit gave " + std::to_string(ZYRGetMemLimit());
+                    ZYRParseMemoryOptions("MaxMemLimit", "500000000");
+                    if (ZYRGetMemLimit() != 419430400)
+                        return "a higher limit was taken";
+                    ZYRParseMemoryOptions("TestAvailablePhysicalMemory", "false");
+                    if (ZYRGetTestAvailablePhysicalMemory())
+                        return "TestAvailablePhysicalMemory false did not arrive";
+                    ZYRParseMemoryOptions("TestAvailablePhysicalMemory", "TRUE");
+                    if (!ZYRGetTestAvailablePhysicalMemory())
+                        return "TestAvailablePhysicalMemory true did not arrive";
+                    ZYRParseMemoryOptions("BreakOnAllocationCount",
+                                          "5"); // breaks only under a debugger
+                    void* block = ZYRMalloc(64);
+                    ZYRFree(block);
+                    return "";
+                }),
+                ::testing::ExitedWithCode(0), "");
+    EXPECT_EXIT(checkInFreshProcess([]() -> std::string {
+                    ZYRParseMemoryOptions("MaxMemLimit", "-7");
+                    return ZYRGetMemLimit() == 419430400 ? "" : "a negative limit is not 0";
+                }),
+                ::testing::ExitedWithCode(0), "");
+}
+
+TEST(ZYRStartupOptionsTest, TypedSetters) {
+    const struct {
+        void (*set)(bool);
+        bool (*get)();
+    } flags[] = {
+        {ZYRSetDeferImageInterpolation, ZYRGetDeferImageInterpolation},
+        {ZYRSetDisableMatrixRoundingOption, ZYRGetDisableMatrixRoundingOption},
+        {ZYRSetDisablePatternGstateReset, ZYRGetDisablePatternGstateReset},
+        {ZYRSetUseAbsoluteColorimetricForLabAlt, ZYRGetUseAbsoluteColorimetricForLabAlt},
+        {ZYRSetUseFindScreenSetEx, ZYRGetUseFindScreenSetEx},
+        {ZYRSetUseMainXP, ZYRGetUseMainXP},
+        {ZYRSetUseNewellMixing, ZYRGetUseNewellMixing},
+        {ZYRSetAnalyticsActive, ZYRIsAnalyticsActive},
+    };
+    for (const auto& flag : flags) {
+        flag.set(true);
+        EXPECT_TRUE(flag.get());
+        flag.set(false);
+        EXPECT_FALSE(flag.get());
+    }
+    // Each setter has its own variable.
+    flags[0].set(true);
+    for (size_t i = 1; i < std::size(flags); ++i)
+        EXPECT_FALSE(flags[i].get()) << i;
+
+    const char16_t folder[] = u"/var/log/analytics";
+    ZYRSetAnalyticsLogFolder(folder);
+    EXPECT_EQ(ZYRGetAnalyticsLogFolder(), folder) << "the pointer itself is kept";
+    ZYRSetImageBufferSize(4096);
+    EXPECT_EQ(ZYRGetImageBufferSize(), 4096u);
+    ZYRSetXPShadeMarkerOption(0xFFFFFFFFu);
+    EXPECT_EQ(ZYRGetXPShadeMarkerOption(), 0xFFFFFFFFu);
+    ZYRSetMaxXobjToInvestigate(-3);
+    EXPECT_EQ(ZYRGetMaxXobjToInvestigate(), -3);
+    ZYRSetLimitPlanarmapPrecision(eZYRPlanarmapPrecisionOption{2});
+    EXPECT_EQ(ZYRGetLimitPlanarmapPrecision(), eZYRPlanarmapPrecisionOption{2});
+    ZYRSetMaxDiskUsage(1LL << 40);
+    ZYRSetMaxSLInMemory(-1);
+    ZYRSetMaxSurfacesOnQueue(1LL << 33);
+    EXPECT_EQ(ZYRGetMaxDiskUsage(), 1LL << 40);
+    EXPECT_EQ(ZYRGetMaxSLInMemory(), -1);
+    EXPECT_EQ(ZYRGetMaxSurfacesOnQueue(), 1LL << 33);
+    ZYRSetShadeQuadLimit(0.75);
+    EXPECT_EQ(ZYRGetShadeQuadLimit(), 0.75);
+
+    long long queue = 0;
+    ZYRSetDefaultMaxSurfacesOnQueue(queue);
+    EXPECT_EQ(queue, 200);
+    EXPECT_EQ(ZYRGetMaxSurfacesOnQueue(), 1LL << 33) << "the store is not touched";
+
+    ZYRSetObjectInfoOptions(0x00000003u);
+    EXPECT_EQ(ZYRGetObjectInfoOptions(), 0u) << "without the top bit the option is off";
+    ZYRSetObjectInfoOptions(0x80000004u);
+    EXPECT_EQ(ZYRGetObjectInfoOptions(), 0x80000004u);
+    ZYRSetObjectInfoOptions(0x80000000u);
+    EXPECT_EQ(ZYRGetObjectInfoOptions(), 0x80000000u);
+    try {
+        ZYRSetObjectInfoOptions(0x80000003u);
+        ADD_FAILURE() << "two extensions at once were accepted";
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInitFailed);
+        EXPECT_STREQ(e.getMessage(), "Multiple ObjectInfoExtensions cannot be enabled at once");
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRStartupOptions");
+        EXPECT_EQ(e.getSrcLineNumber(), 1273);
+    }
+    EXPECT_EQ(ZYRGetObjectInfoOptions(), 0x80000003u) << "the value stays stored";
+}

@@ -1,0 +1,136 @@
+// zyrstd config: plays a host's start-up over setup files and prints the effective options.
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <fcntl.h>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <unistd.h>
+#include <vector>
+
+#include "Commands.h"
+#include "ZYRHostKit.h"
+#include "ZYRStd.h"
+#include "zyr/std/ZYRStartupOptionKeys.h"
+
+namespace zyrtool {
+
+namespace {
+
+constexpr int kUsageError = 2;
+
+struct Pair {
+    std::string key;
+    std::string value;
+    const char* file;
+    unsigned int line;
+};
+
+// Returns 0 and the file's bytes, or the errno value that stopped the reading.
+int readWholeFile(const char* path, std::vector<unsigned char>& bytes) {
+    const int fd = ::open(path, O_RDONLY | O_CLOEXEC);
+    if (fd < 0)
+        return errno;
+    int error = 0;
+    unsigned char chunk[64 * 1024];
+    for (;;) {
+        const ssize_t got = ::read(fd, chunk, sizeof chunk);
+        if (got < 0) {
+            if (errno == EINTR)
+                continue;
+            error = errno;
+            break;
+        }
+        if (got == 0)
+            break;
+        bytes.insert(bytes.end(), chunk, chunk + got);
+    }
+    ::close(fd);
+    return error;
+}
+
+// Keeps every pair with where it came from.
+class PairCollector : public ZYRStd::IZYRConfigParserLineCBProc {
+public:
+    PairCollector(const char* file, std::vector<Pair>& pairs) : file_(file), pairs_(pairs) {}
+    void atLine(unsigned int line) override { line_ = line; }
+    void proc(const char* key, const char* value) override {
+        pairs_.push_back({key, value, file_, line_});
+    }
+    unsigned int line() const { return line_; }
+
+private:
+    const char* file_;
+    std::vector<Pair>& pairs_;
+    unsigned int line_ = 0;
+};
+
+// Parses one file into `pairs`; false after printing why it could not.
+bool collectPairs(const char* file, std::vector<Pair>& pairs) {
+    std::vector<unsigned char> bytes;
+    if (const int error = readWholeFile(file, bytes)) {
+        std::fprintf(stderr, "zyrstd: config: cannot read '%s': %s\n", file, std::strerror(error));
+        return false;
+    }
+    if (bytes.empty())
+        return true; // no pairs; the parser takes an empty buffer for a missing one
+    PairCollector collector(file, pairs);
+    try {
+        ZYRStd::ParseConfigData(bytes.data(), ZYRPublic::kZYRConfigDataBuffer,
+                                static_cast<unsigned int>(bytes.size()), collector);
+    } catch (const ZYRStd::CZYRError& e) {
+        std::fprintf(stderr, "%s:%u: %s\n", file, collector.line(),
+                     e.getMessage() ? e.getMessage() : "error");
+        return false;
+    }
+    return true;
+}
+
+void printOptions() {
+    for (const ZYRStd::sZYRStartupOptionKey& row : ZYRStd::kZYRStartupOptionKeys) {
+        if (row.show)
+            std::printf("%s = %s\n", row.key, row.show().c_str());
+    }
+}
+
+} // namespace
+
+int runConfig(int argc, char** argv) {
+    const std::vector<const char*> files(argv + 1, argv + argc);
+    const bool defaults = files.size() == 1 && std::string_view(files[0]) == "--defaults";
+    if (files.empty()) {
+        std::fputs("zyrstd: config: no setup file given\nTry 'zyrstd --help'.\n", stderr);
+        return kUsageError;
+    }
+
+    // Everything is parsed before anything is set, so that a bad file leaves no output.
+    std::vector<Pair> pairs;
+    // The parser reads through the installed file system's memory streams.
+    const ZYRHostKit::HostSession session;
+    if (!defaults) {
+        for (const char* file : files) {
+            if (!collectPairs(file, pairs))
+                return 1;
+        }
+    }
+
+    ZYRStd::CZYRStartupOptionFeeder feeder;
+    for (const Pair& pair : pairs) {
+        if (!ZYRStd::ZYRIsStartupOptionKey(pair.key.c_str())) {
+            std::fflush(stdout); // keep both streams in order when they go to one place
+            std::fprintf(stderr, "%s:%u: unknown key '%s'\n", pair.file, pair.line,
+                         pair.key.c_str());
+        }
+        feeder.feed(pair.key.c_str(), pair.value.c_str());
+    }
+    feeder.store();
+    printOptions();
+    if (std::fflush(stdout) != 0 || std::ferror(stdout)) {
+        std::fprintf(stderr, "zyrstd: config: write error: %s\n", std::strerror(errno));
+        return 1;
+    }
+    return 0;
+}
+
+} // namespace zyrtool
