@@ -1,5 +1,6 @@
 // Values: dictionary set/get against std::unordered_map, building interned strings against
 // ICU, and string equality against std::u16string.
+#include <absl/container/flat_hash_map.h>
 #include <benchmark/benchmark.h>
 #include <unicode/unistr.h>
 
@@ -73,6 +74,20 @@ void BM_UnorderedMapSetGet(benchmark::State& state) {
     }
 }
 
+// The stronger peer: an open-addressing table with SIMD probing.
+void BM_AbslFlatHashMapSetGet(benchmark::State& state) {
+    const auto& keys = peerKeys();
+    for (auto _ : state) {
+        absl::flat_hash_map<std::u16string, uint32_t> map;
+        for (unsigned int n = 0; n < kKeys; ++n)
+            map[keys[n]] = n;
+        unsigned int sum = 0;
+        for (unsigned int n = 0; n < kKeys; ++n)
+            sum += map.find(keys[n])->second;
+        benchmark::DoNotOptimize(sum);
+    }
+}
+
 void BM_InternedUniString(benchmark::State& state) {
     for (auto _ : state) {
         CZYRUniString s("DeviceCMYK");
@@ -106,6 +121,7 @@ void BM_U16StringEquals(benchmark::State& state) {
 
 BENCHMARK(BM_DictSetGet)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_UnorderedMapSetGet)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_AbslFlatHashMapSetGet)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_InternedUniString);
 BENCHMARK(BM_IcuUnicodeString);
 BENCHMARK(BM_UniStringEquals);
@@ -122,6 +138,7 @@ int main(int argc, char** argv) {
     const int result = zyrbench::runWithRatios(
         argc, argv,
         {{"dict_set_get_100k", "BM_DictSetGet", "BM_UnorderedMapSetGet"},
+         {"dict_vs_absl", "BM_DictSetGet", "BM_AbslFlatHashMapSetGet"},
          {"unistring_interned_build", "BM_InternedUniString", "BM_IcuUnicodeString"},
          {"unistring_equals_32", "BM_UniStringEquals", "BM_U16StringEquals"}});
     ReleaseDynamicUniStringCache();

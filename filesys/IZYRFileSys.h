@@ -2,11 +2,11 @@
 // enumeration callback and the low-level file under every file stream.
 #pragma once
 
+#include "CZYRBaseRefCnt.h"
 #include "IZYRFileName.h"
 #include "IZYRStream.h"
 #include "ZYRPDLFileSysRec.h"
 #include "ZYRStdExport.h"
-#include "CZYRBaseRefCnt.h"
 
 namespace ZYRFileSys {
 
@@ -75,8 +75,9 @@ public:
 
 // The library's file system: native files, and the host's procedures for files the host
 // names by its own paths when `record` is given. Null when it cannot be allocated.
-ZYRSTD_API IZYRFileSys* createDefaultFileSystem(const ZYRStd::CZYRUniString& tempDir,
-                                                const ZYRStd::CZYRUniString& dlCacheDir,
-                                                ZYRPublic::_t_ZYRPDLFileSysRec* record);
+[[nodiscard]] ZYRSTD_API IZYRFileSys*
+createDefaultFileSystem(const ZYRStd::CZYRUniString& tempDir,
+                        const ZYRStd::CZYRUniString& dlCacheDir,
+                        ZYRPublic::_t_ZYRPDLFileSysRec* record);
 
 } // namespace ZYRFileSys

@@ -86,7 +86,7 @@ public:
     T& operator*() const noexcept { return *p_; }
     explicit operator bool() const noexcept { return p_ != nullptr; }
     // Gives up the reference without releasing it.
-    T* detach() noexcept { return std::exchange(p_, nullptr); }
+    [[nodiscard]] T* detach() noexcept { return std::exchange(p_, nullptr); }
 
 private:
     // The new object gains its reference before the old one may be deleted.

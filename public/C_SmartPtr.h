@@ -54,7 +54,7 @@ public:
     explicit operator bool() const noexcept { return p_ != nullptr; }
     bool isNull() const noexcept { return p_ == nullptr; }
     // Hands the reference to the caller without releasing it.
-    T* detach() noexcept { return std::exchange(p_, nullptr); }
+    [[nodiscard]] T* detach() noexcept { return std::exchange(p_, nullptr); }
 
 private:
     T* p_ = nullptr;

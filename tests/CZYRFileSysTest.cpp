@@ -177,21 +177,21 @@ TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
     const std::string tooLong = longest + "x";
     expectError(
         [&] {
-            ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(tooLong.c_str()),
-                                                ZYRStd::CZYRUniString(), nullptr);
+            delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(tooLong.c_str()),
+                                                       ZYRStd::CZYRUniString(), nullptr);
         },
         ZYRPublic::kZYRErrorLimitCheck, "temp dir filename too long", kWindowsSource);
     expectError(
         [&] {
-            ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(),
-                                                ZYRStd::CZYRUniString(tooLong.c_str()), nullptr);
+            delete ZYRFileSys::createDefaultFileSystem(
+                ZYRStd::CZYRUniString(), ZYRStd::CZYRUniString(tooLong.c_str()), nullptr);
         },
         ZYRPublic::kZYRErrorLimitCheck, "DL Cache dir filename too long", kWindowsSource);
     const std::string twoLevels = dir.file("missing/child");
     expectError(
         [&] {
-            ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(twoLevels.c_str()),
-                                                ZYRStd::CZYRUniString(), nullptr);
+            delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(twoLevels.c_str()),
+                                                       ZYRStd::CZYRUniString(), nullptr);
         },
         ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed", kWindowsSource);
 }

@@ -157,7 +157,7 @@ TEST(CZYRSmartPtrTest, ContainerAllocationFailureThrows) {
     ZYRStd::tZYRMemMgr record = host.record();
     zyrtest::installFront(0, &record);
     try {
-        czyrsmartptralloc(16);
+        czyrsmartptrfree(czyrsmartptralloc(16));
         ADD_FAILURE() << "must throw";
     } catch (const CZYRError& e) {
         EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);

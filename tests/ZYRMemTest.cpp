@@ -104,7 +104,7 @@ TEST_F(ZYRMemTest, SureVariantsThrowWithTheirLines) {
     void* p = ZYRSureMalloc(8);
     host.failAll = true;
     try {
-        ZYRSureRealloc(p, 64);
+        p = ZYRSureRealloc(p, 64);
         ADD_FAILURE() << "a failed resize must throw";
     } catch (const CZYRError& e) {
         EXPECT_EQ(e.getSrcLineNumber(), 2058);

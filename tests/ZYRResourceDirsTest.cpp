@@ -104,11 +104,20 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     std::vector<std::u16string> expected = kUnderR;
     expected.insert(expected.end(), {u"/usr/share/fonts", kNull, u"/tmp/a b", u"", u"C:/Fonts"});
     EXPECT_EQ(takeList(list, count), expected);
-    EXPECT_EQ(takeText(cacheFile), u"/cache/OrmunFnt14_VELT_1001.lst");
+    // The numbering is process-wide, and other tests may have drawn names already: the
+    // first names of a process are checked in a fresh one below.
+    const std::u16string first = takeText(cacheFile);
+    ASSERT_EQ(first.rfind(u"/cache/OrmunFnt14_VELT_", 0), 0u);
+    const int firstNumber = std::stoi(std::string(first.begin() + 23, first.end() - 4));
+    EXPECT_GE(firstNumber, 1001);
+    auto nthName = [&](int n) {
+        const std::string digits = std::to_string(firstNumber + n);
+        return u"/cache/OrmunFnt14_VELT_" + std::u16string(digits.begin(), digits.end()) + u".lst";
+    };
     count = 0;
     ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
     takeList(list, count);
-    EXPECT_EQ(takeText(cacheFile), u"/cache/OrmunFnt14_VELT_1002.lst");
+    EXPECT_EQ(takeText(cacheFile), nthName(1));
 
     EXPECT_EQ(text(ZYRGetSystemCacheFile()), u"/cache/OrmunFnt14_sys.lst");
     EXPECT_EQ(text(ZYRGetCommonCacheFile()), u"/cache/OrmunFnt14_com.lst");
@@ -121,10 +130,10 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     EXPECT_EQ(takeList(list, 8), expected);
     ASSERT_NE(names, nullptr);
     EXPECT_EQ(names[4], nullptr);
-    EXPECT_EQ(takeList(names, 4), (std::vector<std::u16string>{u"/cache/OrmunFnt14_VELT_1003.lst",
-                                                               u"/cache/OrmunFnt14_sys.lst",
-                                                               u"/cache/OrmunFnt14_com.lst",
-                                                               u"/cache/OrmunFnt14_Cmap.lst"}));
+    EXPECT_EQ(
+        takeList(names, 4),
+        (std::vector<std::u16string>{nthName(2), u"/cache/OrmunFnt14_sys.lst",
+                                     u"/cache/OrmunFnt14_com.lst", u"/cache/OrmunFnt14_Cmap.lst"}));
     ASSERT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(), list, names), 3);
     takeList(list, 3);
     takeList(names, 4);
@@ -149,6 +158,26 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
 
 // Whichever allocation fails, the call either throws or hands out what it built, and
 // nothing is lost.
+TEST(ZYRResourceDirsTest, FirstCacheNamesOfAProcessAre1001And1002) {
+    // The death-test child runs only this statement, so its counter is untouched.
+    EXPECT_EXIT(
+        {
+            ZYRSetFontCacheDir(u"/cache");
+            unsigned short** list = nullptr;
+            unsigned short* cacheFile = nullptr;
+            unsigned int count = 0;
+            ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
+            takeList(list, count);
+            const bool first = takeText(cacheFile) == u"/cache/OrmunFnt14_VELT_1001.lst";
+            count = 0;
+            ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
+            takeList(list, count);
+            const bool second = takeText(cacheFile) == u"/cache/OrmunFnt14_VELT_1002.lst";
+            std::exit(first && second ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
+}
+
 TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
     zyrtest::FailingHost host;
     tZYRMemMgr record = host.record();

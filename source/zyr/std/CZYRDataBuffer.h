@@ -14,8 +14,8 @@ using ZYRPublic::I_DataBuffer;
 
 // A private copy of `length` bytes, one reference for the caller; null data or zero length
 // gives a valid empty buffer.
-ZYRSTD_API I_DataBuffer* createDataBuffer(const char* data, unsigned int length,
-                                          ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_DataBuffer* createDataBuffer(const char* data, unsigned int length,
+                                                        ZYRPublic::I_Error& err);
 
 class ZYRSTD_API CZYRDataBuffer : public CZYRInterfaceValue<I_DataBuffer> {
 public:

@@ -18,8 +18,8 @@ using ZYRPublic::I_Dict;
 using ZYRPublic::I_DictEnumProcs;
 
 // New empty containers with one reference for the caller.
-ZYRSTD_API I_Dict* createDict(ZYRPublic::I_Error& err);
-ZYRSTD_API I_Array* createArray(ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_Dict* createDict(ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_Array* createArray(ZYRPublic::I_Error& err);
 
 class CZYRArray;
 class CZYRDictEnumProcs;

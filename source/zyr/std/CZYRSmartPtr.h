@@ -18,7 +18,7 @@ ZYRSTD_API bool ZYRIsShared_ThreadSafe(const unsigned int* count);
 ZYRSTD_API unsigned int ZYRPeekValue_ThreadSafe(const unsigned int* count);
 
 // Storage for smart-pointer containers, from the front; throws on failure.
-ZYRSTD_API void* czyrsmartptralloc(unsigned int size);
+[[nodiscard]] ZYRSTD_API void* czyrsmartptralloc(unsigned int size);
 ZYRSTD_API void czyrsmartptrfree(void* p);
 
 // The count member behind every library implementation of a public interface.
@@ -35,7 +35,9 @@ public:
 
     void addRef() const noexcept { count_.fetch_add(1, std::memory_order_relaxed); }
     // True exactly for the call that took the count from 1 to 0; the owner deletes.
-    bool release() const noexcept { return count_.fetch_sub(1, std::memory_order_acq_rel) == 1; }
+    [[nodiscard]] bool release() const noexcept {
+        return count_.fetch_sub(1, std::memory_order_acq_rel) == 1;
+    }
     // A count of 0 also answers true.
     bool isShared() const noexcept { return count_.load(std::memory_order_acquire) != 1; }
     unsigned int debugGetRefCount() const noexcept {

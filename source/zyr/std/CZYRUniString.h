@@ -21,12 +21,14 @@ class CZYRWString;
 
 // New strings with one reference for the caller, never interned. Null when `err` already
 // holds an error or the text is null (the encoding overload records the null text).
-ZYRSTD_API I_UniString* createUniString(const char* text, const char* encoding,
-                                        ZYRPublic::I_Error& err);
-ZYRSTD_API I_UniString* createUniString(const char* text, ZYRPublic::I_Error& err);
-ZYRSTD_API I_UniString* createUniString(const char* text, unsigned int length, const char* encoding,
-                                        ZYRPublic::I_Error& err);
-ZYRSTD_API I_UniString* createUniString(const char16_t* text, ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_UniString* createUniString(const char* text, const char* encoding,
+                                                      ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_UniString* createUniString(const char* text, ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_UniString* createUniString(const char* text, unsigned int length,
+                                                      const char* encoding,
+                                                      ZYRPublic::I_Error& err);
+[[nodiscard]] ZYRSTD_API I_UniString* createUniString(const char16_t* text,
+                                                      ZYRPublic::I_Error& err);
 
 // A shared, immutable Unicode string; null inside means invalid. Built from text, equal
 // texts share one interned object.

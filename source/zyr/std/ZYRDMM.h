@@ -19,15 +19,16 @@ enum eZYRMemoryClientType : int {
 
 // `requester` is the caller's I_FlushableMemoryClient*, never asked to flush for itself.
 // With a sub-allocator, `actualSize` receives the bytes it took from its supplier.
-ZYRSTD_API void* ZYRDMMMalloc(unsigned int size, const char* clientName,
-                              I_VariableSizeAllocator* subAllocator, unsigned int* actualSize,
-                              void* requester, eFlushMemorySeverity severity);
+[[nodiscard]] ZYRSTD_API void* ZYRDMMMalloc(unsigned int size, const char* clientName,
+                                            I_VariableSizeAllocator* subAllocator,
+                                            unsigned int* actualSize, void* requester,
+                                            eFlushMemorySeverity severity);
 ZYRSTD_API void ZYRDMMFree(void* p, const char* clientName, I_VariableSizeAllocator* subAllocator);
 // No recovery for a resize; the sub-allocator argument is not used.
-ZYRSTD_API void* ZYRDMMReAlloc(void* p, unsigned int size, const char* clientName,
-                               I_VariableSizeAllocator* subAllocator);
-ZYRSTD_API void* ZYRDMMVirtualMemAlloc(unsigned int size, const char* clientName,
-                                       eFlushMemorySeverity severity);
+[[nodiscard]] ZYRSTD_API void* ZYRDMMReAlloc(void* p, unsigned int size, const char* clientName,
+                                             I_VariableSizeAllocator* subAllocator);
+[[nodiscard]] ZYRSTD_API void* ZYRDMMVirtualMemAlloc(unsigned int size, const char* clientName,
+                                                     eFlushMemorySeverity severity);
 ZYRSTD_API void ZYRDMMVirtualMemFree(void* p, const char* clientName);
 
 ZYRSTD_API bool ZYRFlushMemory(I_FlushableMemoryClient* requester, unsigned int bytesNeeded,
@@ -45,12 +46,12 @@ ZYRSTD_API void GetClientsMemoryUsedAndMemoryLimit(unsigned long long& flushable
                                                    unsigned long long& used);
 
 // The PDF library client; `ctx` is accepted and not used.
-ZYRSTD_API void* DMM_TUMAAlloc(void* ctx, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* DMM_TUMAAlloc(void* ctx, unsigned int size);
 ZYRSTD_API void DMM_TUMAFree(void* ctx, void* p);
-ZYRSTD_API void* DMM_TUMAReAlloc(void* ctx, void* p, unsigned int size);
-ZYRSTD_API void* DMM_JOVAlloc(unsigned int size);
+[[nodiscard]] ZYRSTD_API void* DMM_TUMAReAlloc(void* ctx, void* p, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* DMM_JOVAlloc(unsigned int size);
 ZYRSTD_API void DMM_JOVFree(void* p);
-ZYRSTD_API void* DMM_JOVRealloc(void* p, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* DMM_JOVRealloc(void* p, unsigned int size);
 ZYRSTD_API unsigned int DMM_JOVMemSize(void* p);
 ZYRSTD_API unsigned long long DMM_GetCurrTUMAMem(eZYRMemoryClientType type,
                                                  unsigned long long* peak);

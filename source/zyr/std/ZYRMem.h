@@ -16,16 +16,16 @@ struct sZYRDbgMemState {
 };
 
 // Blocks are 16-byte aligned. Null on failure; these never throw.
-ZYRSTD_API void* ZYRMalloc(unsigned int size);
-ZYRSTD_API void* ZYRCalloc(unsigned int count, unsigned int size);
-ZYRSTD_API void* ZYRRealloc(void* p, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* ZYRMalloc(unsigned int size);
+[[nodiscard]] ZYRSTD_API void* ZYRCalloc(unsigned int count, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* ZYRRealloc(void* p, unsigned int size);
 ZYRSTD_API void ZYRFree(void* p);
 ZYRSTD_API unsigned int ZYRMemSize(void* p);
 
 // As above, but a null result throws CZYRError of kZYRErrorOutOfMemory.
-ZYRSTD_API void* ZYRSureMalloc(unsigned int size);
-ZYRSTD_API void* ZYRSureCalloc(unsigned int count, unsigned int size);
-ZYRSTD_API void* ZYRSureRealloc(void* p, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* ZYRSureMalloc(unsigned int size);
+[[nodiscard]] ZYRSTD_API void* ZYRSureCalloc(unsigned int count, unsigned int size);
+[[nodiscard]] ZYRSTD_API void* ZYRSureRealloc(void* p, unsigned int size);
 
 // Throws kZYRErrorFatal when a guarded block's head or tail guard is damaged.
 ZYRSTD_API void ZYRDbgCheckZYRMemAllocPtr(void* p);

@@ -15,7 +15,7 @@ struct tZYRVirtualMemoryInfo {
 };
 
 // Committed, read-write, page-aligned; null for size 0, on failure or over the limit.
-ZYRSTD_API void* VirtualMemAlloc(unsigned int size);
+[[nodiscard]] ZYRSTD_API void* VirtualMemAlloc(unsigned int size);
 ZYRSTD_API void VirtualMemFree(void* p);
 // Gives back the whole pages of [addr, addr + size) inside the block at `base`.
 ZYRSTD_API void VirtualMemDecommit(void* base, void* addr, unsigned int size);
