@@ -6,6 +6,10 @@
 #include <cstring>
 #include <new>
 
+#if defined(__x86_64__)
+#include <immintrin.h>
+#endif
+
 #include "zyr/std/CZYRError.h"
 #include "zyr/std/ZYRMem.h"
 #include "zyr/std/ZYRVirtualMem.h"
@@ -48,39 +52,121 @@ constexpr std::array<unsigned char, 256> kSwappedNibbles = [] {
     return table;
 }();
 
-// The same mappings on eight bytes at once; the compiler widens these to vector code.
-uint64_t swapNibblesOfBytes(uint64_t x) {
-    return ((x >> 4) & 0x0F0F0F0F0F0F0F0Full) | ((x & 0x0F0F0F0F0F0F0F0Full) << 4);
-}
-uint64_t reverseBitsOfBytes(uint64_t x) {
-    x = ((x >> 1) & 0x5555555555555555ull) | ((x & 0x5555555555555555ull) << 1);
-    x = ((x >> 2) & 0x3333333333333333ull) | ((x & 0x3333333333333333ull) << 2);
-    return swapNibblesOfBytes(x);
-}
-
-template <bool FourBit>
-void convertRow(const unsigned char* src, unsigned char* dst, unsigned int bytes) {
-    unsigned int i = 0;
-    for (; i + 8 <= bytes; i += 8) {
-        uint64_t word;
-        std::memcpy(&word, src + i, sizeof word);
-        word = FourBit ? swapNibblesOfBytes(word) : reverseBitsOfBytes(word);
-        std::memcpy(dst + i, &word, sizeof word);
-    }
-    const auto& table = FourBit ? kSwappedNibbles : kReversedBits;
-    for (; i < bytes; ++i)
-        dst[i] = table[src[i]];
-}
-
-template <bool FourBit>
-void convertRows(const unsigned char* src, unsigned int srcRowBytes, unsigned int rowBytes,
-                 unsigned char* dst, unsigned int maskRow, unsigned int height) {
+// Byte by byte through the table, where the processor has no byte shuffle.
+void convertRowsByTable(const unsigned char* src, unsigned int srcRowBytes, unsigned int rowBytes,
+                        unsigned char* dst, unsigned int maskRow, unsigned int height,
+                        bool fourBit) {
+    const auto& table = fourBit ? kSwappedNibbles : kReversedBits;
     for (unsigned int row = 0; row < height; ++row) {
-        convertRow<FourBit>(src, dst, rowBytes);
+        for (unsigned int i = 0; i < rowBytes; ++i)
+            dst[i] = table[src[i]];
         std::memset(dst + rowBytes, 0, maskRow - rowBytes);
         src += srcRowBytes;
         dst += maskRow;
     }
+}
+
+#if defined(__x86_64__)
+// Shuffle tables indexed by a nibble. For 1-bit sources each nibble is reversed and moved to
+// the other half of the byte; for 4-bit ones the nibbles only change places.
+const __m128i kReverseLowToHigh =
+    _mm_setr_epi8(0x00, char(0x80), 0x40, char(0xC0), 0x20, char(0xA0), 0x60, char(0xE0), 0x10,
+                  char(0x90), 0x50, char(0xD0), 0x30, char(0xB0), 0x70, char(0xF0));
+const __m128i kReverseHighToLow =
+    _mm_setr_epi8(0x0, 0x8, 0x4, 0xC, 0x2, 0xA, 0x6, 0xE, 0x1, 0x9, 0x5, 0xD, 0x3, 0xB, 0x7, 0xF);
+const __m128i kSwapLowToHigh =
+    _mm_setr_epi8(0x00, 0x10, 0x20, 0x30, 0x40, 0x50, 0x60, 0x70, char(0x80), char(0x90),
+                  char(0xA0), char(0xB0), char(0xC0), char(0xD0), char(0xE0), char(0xF0));
+const __m128i kSwapHighToLow = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15);
+
+__attribute__((target("ssse3"))) inline void convert16(const unsigned char* from, unsigned char* to,
+                                                       __m128i lowToHigh, __m128i highToLow) {
+    const __m128i nibble = _mm_set1_epi8(0x0F);
+    const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
+    const __m128i low = _mm_and_si128(bytes, nibble);
+    const __m128i high = _mm_and_si128(_mm_srli_epi16(bytes, 4), nibble);
+    _mm_storeu_si128(
+        reinterpret_cast<__m128i*>(to),
+        _mm_or_si128(_mm_shuffle_epi8(lowToHigh, low), _mm_shuffle_epi8(highToLow, high)));
+}
+
+// Sixteen bytes at a time through two nibble look-ups, several times faster than the table.
+// Chosen at run time, as the baseline x86-64 target has no byte shuffle.
+__attribute__((target("ssse3"))) void
+convertRowsShuffled(const unsigned char* src, unsigned int srcRowBytes, unsigned int rowBytes,
+                    unsigned char* dst, unsigned int maskRow, unsigned int height, bool fourBit) {
+    const __m128i lowToHigh = fourBit ? kSwapLowToHigh : kReverseLowToHigh;
+    const __m128i highToLow = fourBit ? kSwapHighToLow : kReverseHighToLow;
+    const auto& table = fourBit ? kSwappedNibbles : kReversedBits;
+    for (unsigned int row = 0; row < height; ++row) {
+        if (rowBytes >= 16) {
+            unsigned int i = 0;
+            for (; i + 16 <= rowBytes; i += 16)
+                convert16(src + i, dst + i, lowToHigh, highToLow);
+            // The last sixteen bytes again rather than a byte loop: rewriting a few bytes
+            // with the same values costs less than a loop per row.
+            if (i < rowBytes)
+                convert16(src + rowBytes - 16, dst + rowBytes - 16, lowToHigh, highToLow);
+        } else {
+            for (unsigned int i = 0; i < rowBytes; ++i)
+                dst[i] = table[src[i]];
+        }
+        for (unsigned int i = rowBytes; i < maskRow; ++i) // at most 3 bytes of padding
+            dst[i] = 0;
+        src += srcRowBytes;
+        dst += maskRow;
+    }
+}
+
+// The same with 32 bytes at a time; shorter rows go sixteen bytes at a time.
+__attribute__((target("avx2"))) void
+convertRowsShuffledWide(const unsigned char* src, unsigned int srcRowBytes, unsigned int rowBytes,
+                        unsigned char* dst, unsigned int maskRow, unsigned int height,
+                        bool fourBit) {
+    if (rowBytes < 32) {
+        convertRowsShuffled(src, srcRowBytes, rowBytes, dst, maskRow, height, fourBit);
+        return;
+    }
+    const __m128i lowToHigh = fourBit ? kSwapLowToHigh : kReverseLowToHigh;
+    const __m128i highToLow = fourBit ? kSwapHighToLow : kReverseHighToLow;
+    const __m256i wideLowToHigh = _mm256_broadcastsi128_si256(lowToHigh);
+    const __m256i wideHighToLow = _mm256_broadcastsi128_si256(highToLow);
+    const __m256i nibble = _mm256_set1_epi8(0x0F);
+    const auto convert32 = [&](const unsigned char* from, unsigned char* to)
+        __attribute__((target("avx2"))) {
+        const __m256i bytes = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(from));
+        const __m256i low = _mm256_and_si256(bytes, nibble);
+        const __m256i high = _mm256_and_si256(_mm256_srli_epi16(bytes, 4), nibble);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(to),
+                            _mm256_or_si256(_mm256_shuffle_epi8(wideLowToHigh, low),
+                                            _mm256_shuffle_epi8(wideHighToLow, high)));
+    };
+    for (unsigned int row = 0; row < height; ++row) {
+        unsigned int i = 0;
+        for (; i + 32 <= rowBytes; i += 32)
+            convert32(src + i, dst + i);
+        if (i < rowBytes)
+            convert32(src + rowBytes - 32, dst + rowBytes - 32);
+        for (unsigned int pad = rowBytes; pad < maskRow; ++pad)
+            dst[pad] = 0;
+        src += srcRowBytes;
+        dst += maskRow;
+    }
+}
+
+#endif
+
+void convertRows(const unsigned char* src, unsigned int srcRowBytes, unsigned int rowBytes,
+                 unsigned char* dst, unsigned int maskRow, unsigned int height, bool fourBit) {
+#if defined(__x86_64__)
+    static const bool wide = __builtin_cpu_supports("avx2");
+    static const bool shuffle = __builtin_cpu_supports("ssse3");
+    if (wide)
+        return convertRowsShuffledWide(src, srcRowBytes, rowBytes, dst, maskRow, height, fourBit);
+    if (shuffle)
+        return convertRowsShuffled(src, srcRowBytes, rowBytes, dst, maskRow, height, fourBit);
+#endif
+    convertRowsByTable(src, srcRowBytes, rowBytes, dst, maskRow, height, fourBit);
 }
 
 void requireRecordableExtent(unsigned int width, unsigned int height) {
@@ -275,10 +361,7 @@ ZYR_MaskRec* CZYRMaskCache::CreateBitmapMask(unsigned char* const src, unsigned 
     // Every byte of the mask is written: the converted source bytes (the last one whole,
     // padding bits included) and zeros to the end of each row.
     const unsigned int srcBytes = (bitsPerRow + 7) / 8;
-    if (fourBit)
-        convertRows<true>(src, srcRowBytes, srcBytes, rec->data, maskRow, height);
-    else
-        convertRows<false>(src, srcRowBytes, srcBytes, rec->data, maskRow, height);
+    convertRows(src, srcRowBytes, srcBytes, rec->data, maskRow, height, fourBit);
     rec->width = static_cast<unsigned short>(width);
     rec->height = static_cast<unsigned short>(height);
     return rec;
