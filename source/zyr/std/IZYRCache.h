@@ -163,9 +163,9 @@ public:
     // included) and makes its predecessor link `to`, so the chain stays intact.
     static void hcRelocateEntry(_t_Nlink* from, _t_Nlink* to, int32_t size);
 
-    // Debug check: chain counts equal chain lengths, touched counts within them, chains
-    // close on their heads, and the current entries cover the linked ones. Entries taken
-    // with hcGetEntry and not yet linked are counted but in no chain, hence "cover".
+    // Debug check: chain counts equal chain lengths, touched counts stay within them, chains
+    // close on their heads, and the current entries equal the linked ones (so call it while
+    // no entry from hcGetEntry waits to be linked).
     bool checkInvariants() const;
 
 private:
