@@ -1,0 +1,798 @@
+// The generic hash cache: head table, look-up and touched prefixes, second-chance sweeps,
+// entry requests under pressure, a random run against a model, and failing allocations.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <random>
+#include <set>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include "TestSupport.h"
+#include "zyr/std/CZYRError.h"
+#include "zyr/std/IZYRCache.h"
+#include "zyr/std/ZYRMem.h"
+
+using namespace ZYRStd;
+
+namespace {
+
+struct Entry : _t_Nlink {
+    uint64_t key;
+    uint64_t value;
+};
+
+uint64_t valueFor(uint64_t key) {
+    return key * 2654435761u + 17;
+}
+
+// Keys hash to themselves, so a test picks a key's chain as key mod H.
+class TestCache final : public IZYRCache {
+public:
+    TestCache(int32_t numEntries, int32_t releaseQuota, unsigned char chainLength,
+              unsigned int entriesPerChunk = 64)
+        : IZYRCache(0, numEntries, releaseQuota, chainLength),
+          pool(sizeof(Entry), entriesPerChunk) {
+        hcSetPool(&pool);
+    }
+
+    unsigned int hash(void* key) override {
+        return static_cast<unsigned int>(*static_cast<uint64_t*>(key));
+    }
+    bool match(_t_Nlink* entry, void* key) override {
+        return static_cast<Entry*>(entry)->key == *static_cast<uint64_t*>(key);
+    }
+    bool HCFlushEntry(_t_Nlink* link, void* ctx) override {
+        const auto* entry = static_cast<Entry*>(link);
+        EXPECT_EQ(entry->value, valueFor(entry->key)) << "entry damaged before its flush";
+        offered.push_back(entry->key);
+        flushContexts.push_back(ctx);
+        return keepAll || kept.count(entry->key) != 0;
+    }
+    bool HCReportFlush(void* ctx) override {
+        if (!ctx)
+            return recycle;
+        reports.push_back(ctx);
+        return false;
+    }
+
+    // An entry for `key` from hcGetEntry, linked into its chain; null when refused.
+    Entry* add(uint64_t key, bool force = false) {
+        auto* entry = static_cast<Entry*>(hcGetEntry(&key, force));
+        if (entry) {
+            entry->key = key;
+            entry->value = valueFor(key);
+            hcLinkEntry(hcGetHashHead(&key), entry);
+        }
+        return entry;
+    }
+    Entry* find(uint64_t key) { return static_cast<Entry*>(hcGetCachedEntry(&key)); }
+    _t_HashHead* head(unsigned int index) { return hcGetTopHashTable() + index; }
+    // The keys of a chain, front first.
+    std::vector<uint64_t> chain(unsigned int index) {
+        std::vector<uint64_t> keys;
+        _t_HashHead* h = head(index);
+        for (_t_Nlink* e = h->next; e != h; e = e->next)
+            keys.push_back(static_cast<Entry*>(e)->key);
+        return keys;
+    }
+
+    ZYRFixedSizePool pool;
+    std::set<uint64_t> kept;
+    bool keepAll = false;
+    bool recycle = false;
+    std::vector<uint64_t> offered;
+    std::vector<void*> flushContexts;
+    std::vector<void*> reports;
+};
+
+using Keys = std::vector<uint64_t>;
+
+void expectAssertion(const std::function<void()>& action, const char* source, int line) {
+    try {
+        action();
+        ADD_FAILURE() << "no assertion from " << source << ":" << line;
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorAssertionFailed);
+        EXPECT_STREQ(e.getMessage(), "assertion failed");
+        EXPECT_STREQ(e.getSrcFileName(), source);
+        EXPECT_EQ(e.getSrcLineNumber(), line);
+    }
+}
+
+} // namespace
+
+TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
+    struct Case {
+        int32_t entries;
+        unsigned char chainLength;
+        int32_t heads;
+        unsigned char chainLimit;
+    };
+    for (const Case& c : {Case{100, 4, 37, 17}, Case{10, 10, 3, 20}, Case{1000000, 2, 32771, 184},
+                          Case{3, 1, 3, 6}, Case{10000000, 1, 32771, 255}}) {
+        TestCache cache(c.entries, 1, c.chainLength);
+        EXPECT_EQ(cache.hcGetNumHeads(), c.heads) << c.entries << "/" << int(c.chainLength);
+        EXPECT_TRUE(cache.ValidateHashCtrl());
+        EXPECT_EQ(cache.hcGetBotHashTable(), cache.hcGetTopHashTable() + (c.heads - 1));
+        EXPECT_EQ(cache.hcGetToBeCleaned(), cache.hcGetTopHashTable());
+        EXPECT_EQ(cache.hcMemUsed(), c.heads * 16u + sizeof(IZYRCache));
+        for (int32_t i = 0; i < c.heads; ++i) {
+            const _t_HashHead* h = cache.head(i);
+            ASSERT_EQ(h->next, h) << "an empty chain points at its own head";
+            ASSERT_EQ(h->count + h->touched, 0);
+            ASSERT_EQ(h->chainLimit, c.chainLimit);
+        }
+        EXPECT_TRUE(cache.checkInvariants());
+    }
+
+    TestCache widest(42, 42, 42);
+    EXPECT_EQ(widest.hcGetNumHeads(), 3);
+    const char* source = "source/zyr/std/ZYRCache";
+    expectAssertion([] { TestCache(100, 4, 43); }, source, 92);
+    expectAssertion([] { TestCache(41, 4, 42); }, source, 92);   // fewer entries than L
+    expectAssertion([] { TestCache(100, 101, 4); }, source, 92); // quota above the entries
+    expectAssertion([] { TestCache(100, 4, 0); }, source, 92);   // would divide by zero
+
+    struct Unusable final : IZYRCache {
+        unsigned int hash(void*) override { return 0; }
+        bool match(_t_Nlink*, void*) override { return false; }
+    } unusable;
+    EXPECT_FALSE(unusable.ValidateHashCtrl());
+    EXPECT_TRUE(unusable.checkInvariants());
+    uint64_t key = 1;
+    EXPECT_THROW(unusable.hcGetCachedEntry(&key), CZYRError) << "no table to look in";
+    EXPECT_THROW(unusable.hcGetEntry(&key, true), CZYRError);
+    EXPECT_EQ(unusable.hcScavenger(5, nullptr), 0);
+}
+
+TEST(ZYRCacheTest, LookupMovesToFrontAndGrowsTheTouchedPrefix) {
+    TestCache cache(100, 4, 4); // 37 heads: keys 0, 37, 74, ... share chain 0
+    for (uint64_t k : {0u, 37u, 74u, 111u})
+        ASSERT_NE(cache.add(k), nullptr);
+    _t_HashHead* h = cache.head(0);
+    EXPECT_EQ(cache.chain(0), (Keys{111, 74, 37, 0}));
+    EXPECT_EQ(h->touched, 4) << "new entries count as used";
+    EXPECT_EQ(cache.CleanupUnTouched(h, nullptr), 0);
+    EXPECT_EQ(h->touched, 0);
+
+    EXPECT_EQ(cache.find(111)->value, valueFor(111)); // first of an untouched chain
+    EXPECT_EQ(h->touched, 1);
+    EXPECT_EQ(cache.chain(0), (Keys{111, 74, 37, 0}));
+    EXPECT_EQ(cache.find(37)->key, 37u); // third, beyond the prefix of 1
+    EXPECT_EQ(cache.chain(0), (Keys{37, 111, 74, 0}));
+    EXPECT_EQ(h->touched, 2);
+    cache.find(111); // second, inside the prefix: moves, the prefix stays
+    EXPECT_EQ(cache.chain(0), (Keys{111, 37, 74, 0}));
+    EXPECT_EQ(h->touched, 2);
+    cache.find(0); // last
+    EXPECT_EQ(cache.chain(0), (Keys{0, 111, 37, 74}));
+    EXPECT_EQ(h->touched, 3);
+
+    _t_HashHead* missHead = nullptr;
+    uint64_t missing = 148;
+    EXPECT_EQ(cache.hcLookup(&missing, &missHead), nullptr);
+    EXPECT_EQ(missHead, h) << "a miss still names the key's chain";
+    EXPECT_EQ(cache.chain(0), (Keys{0, 111, 37, 74}));
+    EXPECT_EQ(h->touched, 3);
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, SweepsGiveUntouchedEntriesOneChance) {
+    TestCache cache(100, 4, 4);
+    for (uint64_t k : {0u, 37u, 74u, 111u, 148u})
+        cache.add(k);
+    _t_HashHead* h = cache.head(0);
+    cache.CleanupUnTouched(h, nullptr);
+    cache.find(0);   // prefix 1: {0, 148, 111, 74, 37}
+    cache.find(111); // prefix 2: {111, 0, 148, 74, 37}
+    ASSERT_EQ(h->touched, 2);
+    cache.kept = {74};
+    int context = 0;
+    EXPECT_EQ(cache.CleanupUnTouched(h, &context), 2);
+    EXPECT_EQ(cache.offered, (Keys{148, 74, 37})) << "entries 3 to 5 are offered, in order";
+    EXPECT_EQ(cache.flushContexts, (std::vector<void*>(3, &context)));
+    EXPECT_EQ(cache.chain(0), (Keys{111, 0, 74}));
+    EXPECT_EQ(h->count, 3);
+    EXPECT_EQ(h->touched, 0) << "survivors must be used again to stay";
+    EXPECT_EQ(cache.GetCurrEntries(), 3);
+    EXPECT_TRUE(cache.checkInvariants());
+
+    // Untouched now, all three are offered next time; the kept one stays.
+    cache.offered.clear();
+    EXPECT_EQ(cache.CleanupUnTouched(h, nullptr), 2);
+    EXPECT_EQ(cache.offered, (Keys{111, 0, 74}));
+    EXPECT_EQ(cache.chain(0), (Keys{74}));
+    EXPECT_EQ(cache.GetCurrEntries(), 1);
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, AnAllTouchedChainKeepsOnlyLEntries) {
+    TestCache cache(1000, 10, 4); // 257 heads
+    for (uint64_t i = 0; i < 50; ++i)
+        ASSERT_NE(cache.add(i * 257), nullptr);
+    ASSERT_EQ(cache.head(0)->touched, 50);
+    int context = 0;
+    EXPECT_EQ(cache.hcScavenger(1000, &context), 46);
+    EXPECT_EQ(cache.chain(0), (Keys{49 * 257, 48 * 257, 47 * 257, 46 * 257}));
+    EXPECT_EQ(cache.head(0)->touched, 0);
+    EXPECT_EQ(cache.reports, (std::vector<void*>{&context})) << "one report per sweep";
+    EXPECT_EQ(cache.hcGetToBeCleaned(), cache.hcGetTopHashTable()) << "a full round";
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, ScavengerStopsAtItsQuotaAndGoesOnFromThere) {
+    TestCache cache(100, 4, 4); // 37 heads
+    for (uint64_t k = 0; k < 6; ++k)
+        cache.add(k); // one entry in each of chains 0 to 5
+    EXPECT_EQ(cache.hcScavenger(100, nullptr), 0) << "all were just used";
+    EXPECT_TRUE(cache.reports.empty()) << "nothing dropped, nothing reported";
+    EXPECT_EQ(cache.hcGetToBeCleaned(), cache.head(0));
+
+    int context = 0;
+    EXPECT_EQ(cache.hcScavenger(2, &context), 2);
+    EXPECT_EQ(cache.offered, (Keys{0, 1}));
+    EXPECT_EQ(cache.hcGetToBeCleaned(), cache.head(2));
+    cache.find(3);
+    cache.offered.clear();
+    EXPECT_EQ(cache.hcScavenger(2, &context), 2);
+    EXPECT_EQ(cache.offered, (Keys{2, 4})) << "the used entry 3 had its second chance";
+    EXPECT_EQ(cache.hcGetToBeCleaned(), cache.head(5));
+    EXPECT_EQ(cache.reports.size(), 2u);
+
+    cache.offered.clear();
+    EXPECT_EQ(cache.hcScavenger(100, nullptr), 2); // wraps round to chain 3 again
+    EXPECT_EQ(cache.offered, (Keys{5, 3}));
+    EXPECT_EQ(cache.GetCurrEntries(), 0);
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, RecycledEntriesWaitForTheReport) {
+    TestCache cache(100, 4, 4);
+    cache.recycle = true;
+    Entry* first = cache.add(0);
+    Entry* second = cache.add(1);
+    uint64_t key = 0;
+    ASSERT_TRUE(cache.hcRemoveEntry(&key, nullptr));
+    Entry* reused = cache.add(2);
+    EXPECT_NE(reused, first) << "a recycled entry is not reused before the recycler empties";
+    cache.hcEmptyRecycler();
+    EXPECT_EQ(cache.add(3), first);
+    cache.CleanupUnTouched(cache.head(1), nullptr);
+    cache.CleanupUnTouched(cache.head(3), nullptr);
+    int context = 0;
+    EXPECT_EQ(cache.hcScavenger(1, &context), 1);
+    EXPECT_EQ(cache.reports, (std::vector<void*>{&context}));
+    EXPECT_EQ(cache.add(4), second) << "the sweep's report empties the recycler";
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, FullCacheSweepsThenSkipsThenRefusesOverlongChains) {
+    TestCache cache(10, 2, 2); // 5 heads
+    for (uint64_t k = 0; k < 10; ++k)
+        ASSERT_NE(cache.add(k), nullptr);
+    // Every entry was just used: the sweep finds nothing, the cache grows past N, and the
+    // next R full-cache requests skip sweeping.
+    ASSERT_NE(cache.add(10), nullptr);
+    EXPECT_TRUE(cache.offered.empty());
+    EXPECT_EQ(cache.GetCurrEntries(), 11);
+    ASSERT_NE(cache.add(11), nullptr);
+    ASSERT_NE(cache.add(12), nullptr);
+    EXPECT_TRUE(cache.offered.empty()) << "two requests skip";
+    EXPECT_EQ(cache.GetMaxEntries(), 13);
+    ASSERT_NE(cache.add(13), nullptr);
+    EXPECT_FALSE(cache.offered.empty()) << "the third sweeps again";
+    EXPECT_LT(cache.GetCurrEntries(), 13);
+    EXPECT_EQ(cache.GetMaxEntries(), 13);
+    EXPECT_TRUE(cache.checkInvariants());
+
+    // 20 entries in one chain that nobody lets go: above 8 L, a request fails unless forced.
+    TestCache crowded(20, 1, 1); // 37 heads
+    crowded.keepAll = true;
+    for (uint64_t i = 0; i < 20; ++i)
+        ASSERT_NE(crowded.add(i * 37), nullptr);
+    EXPECT_EQ(crowded.add(20 * 37), nullptr);
+    EXPECT_EQ(crowded.GetCurrEntries(), 20);
+    EXPECT_NE(crowded.add(21 * 37), nullptr) << "a skipped sweep measures nothing either";
+    EXPECT_EQ(crowded.add(22 * 37), nullptr);
+    EXPECT_EQ(crowded.GetCurrEntries(), 21);
+    EXPECT_NE(crowded.add(23 * 37, true), nullptr);
+    EXPECT_EQ(crowded.GetCurrEntries(), 22);
+    EXPECT_TRUE(crowded.checkInvariants());
+
+    // Beyond 250 entries in a chain even a forced request fails.
+    TestCache nearlyFull(251, 1, 1); // 257 heads
+    nearlyFull.keepAll = true;
+    for (uint64_t i = 0; i < 251; ++i)
+        ASSERT_NE(nearlyFull.add(i * 257), nullptr);
+    EXPECT_EQ(nearlyFull.add(251 * 257, true), nullptr);
+    EXPECT_EQ(nearlyFull.GetCurrEntries(), 251);
+    EXPECT_TRUE(nearlyFull.checkInvariants());
+}
+
+TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
+    zyrtest::FailingHost host;
+    tZYRMemMgr record = host.record();
+    zyrtest::installFront(0, &record);
+    {
+        TestCache cache(100, 2, 4, 4); // one chunk of 4 entries, then the front fails
+        for (uint64_t k = 0; k < 4; ++k)
+            ASSERT_NE(cache.add(k), nullptr);
+        host.failAll = true;
+
+        // Nothing flushable: refused, and no count moves.
+        cache.keepAll = true;
+        EXPECT_EQ(cache.add(4), nullptr);
+        EXPECT_EQ(cache.GetCurrEntries(), 4);
+        EXPECT_EQ(cache.GetMaxEntries(), 4);
+        for (unsigned int i = 0; i < 4; ++i)
+            EXPECT_EQ(cache.head(i)->count, 1);
+        EXPECT_TRUE(cache.checkInvariants());
+
+        // Untouched entries are swept to make room.
+        cache.keepAll = false;
+        cache.find(0);
+        cache.find(1);
+        cache.offered.clear();
+        ASSERT_NE(cache.add(4), nullptr);
+        EXPECT_EQ(cache.offered, (Keys{2, 3}));
+        EXPECT_EQ(cache.GetCurrEntries(), 3);
+
+        ASSERT_NE(cache.add(5), nullptr); // the last element freed by the sweep
+        EXPECT_EQ(cache.GetCurrEntries(), 4);
+
+        // All used: the sweep only resets the prefixes, so the quota of 2 goes from the
+        // ends of the first chains instead.
+        for (uint64_t k : {0u, 1u})
+            cache.find(k);
+        cache.offered.clear();
+        ASSERT_NE(cache.add(6), nullptr);
+        EXPECT_EQ(cache.offered, (Keys{0, 1}));
+        EXPECT_EQ(cache.GetCurrEntries(), 3);
+        for (uint64_t k : {4u, 5u, 6u})
+            EXPECT_NE(cache.find(k), nullptr) << k;
+        EXPECT_TRUE(cache.checkInvariants());
+        host.failAll = false;
+    }
+    zyrtest::installFront(0);
+}
+
+TEST(ZYRCacheTest, RemoveReleaseAndTraverse) {
+    TestCache cache(100, 4, 4); // 37 heads
+    for (uint64_t k : {0u, 37u, 74u, 1u, 38u, 2u})
+        cache.add(k);
+    cache.CleanupUnTouched(cache.head(0), nullptr);
+    cache.find(37); // chain 0: {37, 74, 0}, prefix 1
+
+    uint64_t key = 5;
+    EXPECT_FALSE(cache.hcRemoveEntry(&key, nullptr));
+    key = 0;
+    cache.kept = {0};
+    EXPECT_FALSE(cache.hcRemoveEntry(&key, nullptr)) << "kept by its flush";
+    EXPECT_EQ(cache.chain(0), (Keys{0, 37, 74})) << "the look-up still moved it";
+    EXPECT_EQ(cache.head(0)->touched, 2);
+    cache.kept.clear();
+    int context = 0;
+    EXPECT_TRUE(cache.hcRemoveEntry(&key, &context));
+    EXPECT_EQ(cache.flushContexts.back(), &context);
+    EXPECT_EQ(cache.chain(0), (Keys{37, 74}));
+    EXPECT_EQ(cache.head(0)->touched, 1);
+    EXPECT_EQ(cache.GetCurrEntries(), 5);
+    EXPECT_TRUE(cache.checkInvariants());
+
+    // A traversal that drops odd keys and stops at key 2.
+    struct Visit {
+        TestCache* cache;
+        std::vector<std::pair<uint64_t, bool>> seen;
+    } visit{&cache, {}};
+    const RetCode stopped = cache.hcTraverse(
+        [](_t_HashHead* head, bool touched, _t_Nlink* previous, void* ctx) -> RetCode {
+            auto* v = static_cast<Visit*>(ctx);
+            auto* entry = static_cast<Entry*>(previous->next);
+            v->seen.emplace_back(entry->key, touched);
+            if (entry->key == 2)
+                return 7;
+            if (entry->key % 2 == 1) {
+                v->cache->hcReleaseEntry(head, touched, previous, entry);
+                return kHCStayOnPrevious;
+            }
+            return kHCSuccess;
+        },
+        &visit);
+    EXPECT_EQ(stopped, 7);
+    const std::vector<std::pair<uint64_t, bool>> expected{
+        {37, true}, {74, false}, {38, true}, {1, true}, {2, true}};
+    EXPECT_EQ(visit.seen, expected);
+    EXPECT_EQ(cache.chain(0), (Keys{74}));
+    EXPECT_EQ(cache.head(0)->touched, 0);
+    EXPECT_EQ(cache.chain(1), (Keys{38}));
+    EXPECT_EQ(cache.head(1)->touched, 1);
+    EXPECT_EQ(cache.GetCurrEntries(), 3);
+    EXPECT_TRUE(cache.checkInvariants());
+
+    // A callback that asks to stay without removing anything must not loop for ever.
+    int calls = 0;
+    EXPECT_EQ(cache.hcTraverse(
+                  [](_t_HashHead*, bool, _t_Nlink*, void* ctx) -> RetCode {
+                      ++*static_cast<int*>(ctx);
+                      return kHCStayOnPrevious;
+                  },
+                  &calls),
+              kHCSuccess);
+    EXPECT_EQ(calls, 3);
+
+    // An entry that was never linked goes straight back.
+    Entry* loose = static_cast<Entry*>(cache.hcGetEntry(&key, false));
+    loose->key = 99;
+    loose->value = valueFor(99);
+    EXPECT_EQ(cache.GetCurrEntries(), 4);
+    cache.hcReturnUnlinkedEntry(loose, &context);
+    EXPECT_EQ(cache.offered.back(), 99u);
+    EXPECT_EQ(cache.GetCurrEntries(), 3);
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, LastEntriesGoOnePerChainPerPass) {
+    TestCache cache(100, 4, 4);
+    for (uint64_t k : {0u, 37u, 74u, 1u, 2u, 39u})
+        cache.add(k); // chain 0 {74, 37, 0}, chain 1 {1}, chain 2 {39, 2}
+    EXPECT_EQ(cache.hcRemoveLastEntries(0, nullptr), 0);
+    int context = 0;
+    EXPECT_EQ(cache.hcRemoveLastEntries(4, &context), 4);
+    EXPECT_EQ(cache.offered, (Keys{0, 1, 2, 37}));
+    EXPECT_EQ(cache.chain(0), (Keys{74}));
+    EXPECT_EQ(cache.chain(2), (Keys{39}));
+    EXPECT_EQ(cache.reports.size(), 1u);
+    EXPECT_EQ(cache.head(0)->touched, 0);
+    cache.kept = {74};
+    EXPECT_EQ(cache.hcRemoveLastEntries(100, nullptr), 1) << "a pass that drops nothing ends";
+    EXPECT_EQ(cache.GetCurrEntries(), 1);
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+TEST(ZYRCacheTest, FreeControlUpdatesAndBrokenTables) {
+    TestCache cache(100, 4, 4);
+    for (uint64_t k = 0; k < 40; ++k)
+        cache.add(k);
+    EXPECT_EQ(cache.hcUpdateCacheSize(100, 4), kHCSuccess);
+    EXPECT_EQ(cache.head(0)->chainLimit, 17) << "same values: nothing changes";
+    EXPECT_EQ(cache.hcUpdateCacheSize(200, 5), kHCSuccess);
+    EXPECT_EQ(cache.GetNumEntries(), 200);
+    EXPECT_EQ(cache.GetChainLength(), 5);
+    EXPECT_EQ(cache.hcGetNumHeads(), 37);
+    EXPECT_EQ(cache.head(36)->chainLimit, 255);
+    EXPECT_EQ(cache.hcUpdateHowManyToRelease(9), kHCSuccess);
+    EXPECT_EQ(cache.GetAvailEntries(), 9);
+
+    cache.kept = {3};
+    EXPECT_EQ(cache.hcFreeCacheControl(), kHCEntriesRemain);
+    EXPECT_EQ(cache.hcCountEntries(), 1);
+    EXPECT_TRUE(cache.ValidateHashCtrl());
+    cache.kept.clear();
+    EXPECT_EQ(cache.hcFreeCacheControl(), kHCSuccess);
+    EXPECT_EQ(cache.GetCurrEntries(), 0);
+    EXPECT_EQ(cache.hcGetTopHashTable(), nullptr);
+    EXPECT_FALSE(cache.ValidateHashCtrl());
+    EXPECT_TRUE(cache.checkInvariants());
+
+    const char* header = "source/zyr/std/IZYRCache";
+    expectAssertion([&] { (void)cache.hcUpdateCacheSize(1, 1); }, header, 539);
+    expectAssertion([&] { (void)cache.hcUpdateHowManyToRelease(1); }, header, 561);
+    EXPECT_THROW((void)cache.hcFreeCacheControl(), CZYRError);
+}
+
+TEST(ZYRCacheTest, The255thEntryOfAChainIsAnAssertionAfterLinking) {
+    TestCache cache(1000, 1, 1, 300); // 1031 heads
+    for (uint64_t i = 0; i < 254; ++i)
+        ASSERT_NE(cache.add(i * 1031), nullptr);
+    const char* header = "source/zyr/std/IZYRCache";
+    expectAssertion([&] { cache.add(254 * 1031); }, header, 551);
+    EXPECT_EQ(cache.head(0)->count, 255);
+    EXPECT_TRUE(IZYRCache::hcIsChainFull(cache.head(0)));
+    EXPECT_TRUE(cache.checkInvariants()) << "linked and counted before the assertion";
+
+    // Nothing more fits the 8-bit count: refused before linking.
+    uint64_t key = 255 * 1031;
+    auto* extra = static_cast<Entry*>(cache.pool.Alloc());
+    extra->key = key;
+    extra->value = valueFor(key);
+    expectAssertion([&] { cache.hcInsertEntry(&key, extra); }, header, 533);
+    expectAssertion([&] { cache.hcLinkEntry(cache.head(0), extra); }, header, 551);
+    EXPECT_EQ(cache.head(0)->count, 255);
+    EXPECT_EQ(cache.find(key), nullptr);
+    EXPECT_TRUE(cache.checkInvariants());
+    cache.pool.Free(extra);
+
+    uint64_t second = 1;
+    auto* inserted = static_cast<Entry*>(cache.pool.Alloc());
+    inserted->key = second;
+    inserted->value = valueFor(second);
+    cache.hcInsertEntry(&second, inserted);
+    EXPECT_EQ(cache.find(1), inserted);
+    EXPECT_EQ(cache.GetCurrEntries(), 256);
+    EXPECT_TRUE(cache.checkInvariants());
+    EXPECT_EQ(cache.hcFreeCacheControl(), kHCSuccess);
+}
+
+TEST(ZYRCacheTest, RelocationKeepsTheChainIntact) {
+    TestCache cache(100, 4, 4);
+    for (uint64_t k : {0u, 37u, 74u})
+        cache.add(k); // {74, 37, 0}
+    Entry moved{};
+    Entry* middle = cache.find(37); // now first: {37, 74, 0}
+    cache.find(74);                 // {74, 37, 0}
+    middle = static_cast<Entry*>(cache.head(0)->next->next);
+    ASSERT_EQ(middle->key, 37u);
+    IZYRCache::hcRelocateEntry(middle, &moved, sizeof(Entry));
+    EXPECT_EQ(cache.head(0)->next->next, &moved);
+    EXPECT_EQ(cache.chain(0), (Keys{74, 37, 0}));
+    EXPECT_TRUE(cache.checkInvariants());
+
+    Entry front{};
+    Entry* first = static_cast<Entry*>(cache.head(0)->next);
+    IZYRCache::hcRelocateEntry(first, &front, sizeof(Entry));
+    EXPECT_EQ(cache.head(0)->next, &front) << "the head is the first entry's predecessor";
+    EXPECT_EQ(cache.find(74), &front);
+    EXPECT_TRUE(cache.checkInvariants());
+
+    const char* source = "source/zyr/std/ZYRCache";
+    Entry loose{};
+    expectAssertion([&] { IZYRCache::hcRelocateEntry(nullptr, &loose, 8); }, source, 172);
+    expectAssertion([&] { IZYRCache::hcRelocateEntry(&loose, &moved, 8); }, source, 172);
+    expectAssertion([&] { IZYRCache::hcRelocateEntry(&front, &loose, 0); }, source, 172);
+    // Put the entries back into pool memory before the pool sees them again.
+    Entry* home = first;
+    IZYRCache::hcRelocateEntry(&front, home, sizeof(Entry));
+    IZYRCache::hcRelocateEntry(&moved, middle, sizeof(Entry));
+    EXPECT_EQ(cache.chain(0), (Keys{74, 37, 0}));
+    EXPECT_TRUE(cache.checkInvariants());
+}
+
+namespace {
+
+// The cache's rules written out plainly over vectors of keys, front first.
+struct Model {
+    struct Chain {
+        std::vector<uint64_t> keys;
+        unsigned int touched = 0;
+    };
+    std::vector<Chain> chains;
+    int32_t numEntries, release, chainLength;
+    int32_t current = 0;
+    int32_t skip = 0;
+    size_t cursor = 0;
+    std::set<uint64_t> kept;
+
+    Model(size_t heads, int32_t n, int32_t r, int32_t l)
+        : chains(heads), numEntries(n), release(r), chainLength(l) {}
+
+    Chain& chainOf(uint64_t key) { return chains[key % chains.size()]; }
+
+    bool lookup(uint64_t key) {
+        Chain& c = chainOf(key);
+        const auto found = std::find(c.keys.begin(), c.keys.end(), key);
+        if (found == c.keys.end())
+            return false;
+        const auto position = static_cast<unsigned int>(found - c.keys.begin()) + 1;
+        c.keys.erase(found);
+        c.keys.insert(c.keys.begin(), key);
+        if (position == 1)
+            c.touched = std::max(c.touched, 1u);
+        else if (position > c.touched)
+            ++c.touched;
+        return true;
+    }
+    int32_t cleanup(Chain& c) {
+        std::vector<uint64_t> survivors(
+            c.keys.begin(), c.keys.begin() + std::min<size_t>(c.touched, c.keys.size()));
+        for (size_t i = survivors.size(); i < c.keys.size(); ++i)
+            if (kept.count(c.keys[i]))
+                survivors.push_back(c.keys[i]);
+        const auto dropped = static_cast<int32_t>(c.keys.size() - survivors.size());
+        c.keys = survivors;
+        c.touched = 0;
+        current -= dropped;
+        return dropped;
+    }
+    int32_t scavenge(int32_t count) {
+        const size_t first = cursor;
+        int32_t dropped = 0;
+        do {
+            Chain& c = chains[cursor];
+            if (c.touched == c.keys.size() && c.touched > static_cast<unsigned>(chainLength))
+                c.touched = chainLength;
+            dropped += cleanup(c);
+            cursor = (cursor + 1) % chains.size();
+        } while (dropped < count && cursor != first);
+        return dropped;
+    }
+    int32_t removeLast(int32_t count) {
+        const int32_t target = std::min(count, current);
+        int32_t dropped = 0;
+        while (target >= 1) {
+            int32_t pass = 0;
+            for (size_t i = 0; i < chains.size() && dropped + pass < target; ++i) {
+                if (chains[i].keys.empty())
+                    continue;
+                chains[i].touched = static_cast<unsigned>(chains[i].keys.size() - 1);
+                pass += cleanup(chains[i]);
+            }
+            dropped += pass;
+            if (dropped >= target || pass == 0)
+                break;
+        }
+        return dropped;
+    }
+    // The pool never runs dry in the random run.
+    bool getEntry(bool force) {
+        if (current >= numEntries) {
+            if (skip > 0) {
+                --skip;
+            } else if (scavenge(release) == 0) {
+                skip = release;
+                if (current > 8 * chainLength) {
+                    size_t longest = 0;
+                    for (const Chain& c : chains)
+                        longest = std::max(longest, c.keys.size());
+                    if (longest > 250 || (longest > size_t(8 * chainLength) && !force))
+                        return false;
+                }
+            }
+        }
+        ++current;
+        return true;
+    }
+    void link(uint64_t key) {
+        Chain& c = chainOf(key);
+        c.keys.insert(c.keys.begin(), key);
+        ++c.touched;
+    }
+    bool remove(uint64_t key) {
+        if (!lookup(key) || kept.count(key))
+            return false;
+        Chain& c = chainOf(key);
+        c.keys.erase(c.keys.begin());
+        --c.touched;
+        --current;
+        return true;
+    }
+};
+
+::testing::AssertionResult sameState(TestCache& cache, const Model& model) {
+    if (!cache.checkInvariants())
+        return ::testing::AssertionFailure() << "invariants broken";
+    if (cache.GetCurrEntries() != model.current)
+        return ::testing::AssertionFailure()
+               << "current " << cache.GetCurrEntries() << " vs " << model.current;
+    if (cache.hcGetToBeCleaned() != cache.head(static_cast<unsigned>(model.cursor)))
+        return ::testing::AssertionFailure() << "sweep cursor differs";
+    for (size_t i = 0; i < model.chains.size(); ++i) {
+        const auto index = static_cast<unsigned int>(i);
+        if (cache.chain(index) != model.chains[i].keys)
+            return ::testing::AssertionFailure() << "chain " << i << " differs";
+        if (cache.head(index)->touched != model.chains[i].touched)
+            return ::testing::AssertionFailure() << "touched count of chain " << i << " differs";
+        if (cache.head(index)->count != model.chains[i].keys.size())
+            return ::testing::AssertionFailure() << "count of chain " << i << " differs";
+    }
+    return ::testing::AssertionSuccess();
+}
+
+} // namespace
+
+TEST(ZYRCacheTest, RandomRunMatchesAModel) {
+    for (const unsigned int seed : {1u, 2u, 3u}) {
+        std::mt19937 random(seed);
+        const int32_t n = 60, r = 5;
+        const unsigned char l = static_cast<unsigned char>(2 + seed);
+        TestCache cache(n, r, l, 16);
+        Model model(static_cast<size_t>(cache.hcGetNumHeads()), n, r, l);
+        const uint64_t keySpace = seed == 3 ? 300 : 150;
+        for (int step = 0; step < 6000; ++step) {
+            // Keys that share few chains now and then, so that chains grow long.
+            uint64_t key = random() % keySpace;
+            if (random() % 4 == 0)
+                key = (random() % 40) * static_cast<uint64_t>(cache.hcGetNumHeads());
+            const unsigned int action = random() % 100;
+            std::string what;
+            if (action < 40) {
+                what = "look-up";
+                Entry* found = cache.find(key);
+                ASSERT_EQ(found != nullptr, model.lookup(key)) << "step " << step;
+                if (found) {
+                    ASSERT_EQ(found->value, valueFor(key));
+                }
+            } else if (action < 70) {
+                what = "insert";
+                if (model.chainOf(key).keys.size() >= 250 ||
+                    std::find(model.chainOf(key).keys.begin(), model.chainOf(key).keys.end(),
+                              key) != model.chainOf(key).keys.end())
+                    continue;
+                const bool force = random() % 8 == 0;
+                const bool expected = model.getEntry(force);
+                Entry* entry = cache.add(key, force);
+                ASSERT_EQ(entry != nullptr, expected) << "step " << step;
+                if (entry)
+                    model.link(key);
+            } else if (action < 82) {
+                what = "remove";
+                ASSERT_EQ(cache.hcRemoveEntry(&key, nullptr), model.remove(key)) << "step " << step;
+            } else if (action < 90) {
+                what = "sweep";
+                const auto count = static_cast<int32_t>(random() % 10);
+                ASSERT_EQ(cache.hcScavenger(count, nullptr), model.scavenge(count));
+            } else if (action < 93) {
+                what = "last entries";
+                const auto count = static_cast<int32_t>(random() % 6);
+                ASSERT_EQ(cache.hcRemoveLastEntries(count, nullptr), model.removeLast(count));
+            } else if (action < 97) {
+                what = "keep";
+                if (cache.kept.count(key)) {
+                    cache.kept.erase(key);
+                    model.kept.erase(key);
+                } else {
+                    cache.kept.insert(key);
+                    model.kept.insert(key);
+                }
+            } else {
+                what = "recycle";
+                cache.recycle = !cache.recycle;
+                cache.hcEmptyRecycler();
+            }
+            ASSERT_TRUE(sameState(cache, model))
+                << "after " << what << " at step " << step << " (seed " << seed << ")";
+        }
+        cache.kept.clear();
+        EXPECT_EQ(cache.hcFreeCacheControl(), kHCSuccess);
+    }
+}
+
+namespace {
+
+// A cache's life: build, fill past capacity, look up, remove, tear down.
+void cacheWorkload() {
+    TestCache cache(50, 5, 3, 8);
+    for (uint64_t k = 0; k < 200; ++k) {
+        cache.add(k * 7);
+        cache.find(k * 7 / 2);
+        if (k % 5 == 0) {
+            uint64_t key = k * 3;
+            cache.hcRemoveEntry(&key, nullptr);
+        }
+        if (!cache.checkInvariants())
+            throw std::logic_error("invariants broken");
+    }
+    (void)cache.hcFreeCacheControl();
+}
+
+} // namespace
+
+TEST(ZYRCacheTest, EveryAllocationMayFail) {
+    zyrtest::FailingHost host;
+    tZYRMemMgr record = host.record();
+    zyrtest::installFront(0, &record);
+    const unsigned long long baseline = GetMemUsage();
+    host.calls = 0;
+    cacheWorkload();
+    EXPECT_EQ(GetMemUsage(), baseline);
+    const unsigned int callsPerRun = host.calls;
+    ASSERT_GT(callsPerRun, 3u);
+    for (unsigned int failing = 1; failing <= callsPerRun; ++failing) {
+        host.calls = 0;
+        host.failAt = failing;
+        try {
+            cacheWorkload();
+        } catch (const CZYRError& e) {
+            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory) << "allocation " << failing;
+        } catch (const std::logic_error& e) {
+            ADD_FAILURE() << e.what() << " when allocation " << failing << " failed";
+        }
+        host.failAt = 0;
+        ASSERT_EQ(GetMemUsage(), baseline) << "allocation " << failing << " failed";
+    }
+    zyrtest::installFront(0);
+}
