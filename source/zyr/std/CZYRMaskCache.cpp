@@ -203,10 +203,12 @@ CZYRMaskCache::CZYRMaskCache(unsigned int recordsPerBlock) : recordsPerBlock_(re
         reserved_.data = static_cast<unsigned char*>(VirtualMemAlloc(RESERVED_MASK_BYTES));
         if (!reserved_.data)
             throwNoStorage(__LINE__);
+        // Chosen as a value: a conditional of the two constants would be an lvalue and
+        // make the compiler emit (and export) storage for them.
+        const unsigned int initPages =
+            recordsPerBlock > MIN_THRESHOLD ? unsigned{NUM_INIT_PAGES} : unsigned{MIN_INIT_PAGES};
         allocator_ = std::make_unique<VariableSizeAllocator>(
-            ALLOCATOR_CLIENT_NAME,
-            recordsPerBlock > MIN_THRESHOLD ? NUM_INIT_PAGES : MIN_INIT_PAGES, 0,
-            VAR_ALLOC_PAGE_SIZE, chunkAlloc, chunkFree, this);
+            ALLOCATOR_CLIENT_NAME, initPages, 0, VAR_ALLOC_PAGE_SIZE, chunkAlloc, chunkFree, this);
     } catch (...) {
         releaseAll();
         throw;
