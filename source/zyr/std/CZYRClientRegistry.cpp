@@ -9,8 +9,12 @@
 namespace ZYRStd {
 
 namespace {
+// Hosts see these in the error record; they stay put when this file changes.
+constexpr const char* kSource = "source/zyr/std/CZYRClientRegistry";
+constexpr int kUnknownClientLine = 61;
+
 constinit std::atomic<unsigned int> lastClientID{0};
-}
+} // namespace
 
 CZYRClientRegistry::~CZYRClientRegistry() = default;
 
@@ -18,7 +22,7 @@ bool CZYRClientRegistry::notificationReceived(unsigned int id) const {
     const auto found = clients_.find(id);
     if (found == clients_.end())
         throw CZYRError(ZYRPublic::kZYRErrorBadParam, "CZYRClientRegistry:: Unknown clientID",
-                        "source/zyr/std/CZYRClientRegistry", 61);
+                        kSource, kUnknownClientLine);
     return found->second;
 }
 

@@ -9,6 +9,10 @@
 namespace ZYRStd {
 
 namespace {
+// Hosts see these in the error record; they stay put when this file changes.
+constexpr const char* kSource = "source/zyr/std/CZYRSmartPtr";
+constexpr int kContainerAllocationLine = 242;
+
 std::atomic_ref<unsigned int> countOf(unsigned int* count) {
     return std::atomic_ref<unsigned int>(*count);
 }
@@ -37,8 +41,8 @@ unsigned int ZYRPeekValue_ThreadSafe(const unsigned int* count) {
 void* czyrsmartptralloc(unsigned int size) {
     void* p = ZYRMalloc(size == 0 ? 1 : size);
     if (!p)
-        throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "allocating smart ptr container",
-                        "source/zyr/std/CZYRSmartPtr", 242);
+        throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "allocating smart ptr container", kSource,
+                        kContainerAllocationLine);
     return p;
 }
 

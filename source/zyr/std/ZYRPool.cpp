@@ -24,6 +24,10 @@ namespace ZYRStd {} // namespace ZYRStd
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/ZYRPool";
+// The lines of the pools' out-of-memory records, as hosts see them; they stay put when
+// this file changes.
+constexpr int kFixedPoolAllocationLine = 102;
+constexpr int kAllocatorPoolAllocationLine = 173;
 
 // Bit 0 of a header's first word: the block is free.
 constexpr uint32_t kFreeBit = 1;
@@ -759,7 +763,7 @@ void* ZYRFixedSizePool::SureAlloc() {
     void* element = Alloc();
     if (!element)
         throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "ZYRFixedSizePool allocation failed",
-                        kSource, 102);
+                        kSource, kFixedPoolAllocationLine);
     return element;
 }
 
@@ -837,7 +841,8 @@ void* ZYRStdAllocatorFixedSizePool::SureAlloc(unsigned int count) {
     void* run = Alloc(count);
     if (!run)
         throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory,
-                        "ZYRStdAllocatorFixedSizePool allocation failed", kSource, 173);
+                        "ZYRStdAllocatorFixedSizePool allocation failed", kSource,
+                        kAllocatorPoolAllocationLine);
     return run;
 }
 
