@@ -4,7 +4,7 @@
 #include <utility>
 
 #include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRHash.h"
+#include "zyr/std/ZYRUniqueID.h"
 #include "zyr/std/CZYRSmartPtr.h"
 #include "zyr/std/ZYRErrorBoundary.h"
 #include "zyr/std/ZYRMem.h"

@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRHash.h"
+#include "zyr/std/ZYRUniqueID.h"
 #include "zyr/std/CZYRSmartPtr.h"
 #include "zyr/std/CZYRStdAllocator.h"
 #include "zyr/std/ZYRErrorBoundary.h"

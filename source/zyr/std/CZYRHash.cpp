@@ -14,7 +14,6 @@
 namespace ZYRStd {
 
 namespace {
-constinit std::atomic<unsigned long long> lastUniqueID{0};
 
 constexpr const char* kHashSource = "source/zyr/std/CZYRHash";
 
@@ -218,11 +217,6 @@ private:
 } // namespace
 
 CZYRHash::~CZYRHash() = default;
-
-unsigned long long createUniqueID() {
-    // Only distinctness matters, which the atomic increment alone guarantees.
-    return lastUniqueID.fetch_add(1, std::memory_order_relaxed) + 1;
-}
 
 CZYRHash* createMD5Hash() {
     try {

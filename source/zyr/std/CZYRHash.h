@@ -23,7 +23,4 @@ public:
 ZYRSTD_API CZYRHash* createMD5Hash();
 ZYRSTD_API CZYRHash* createMD5Hash(unsigned char* data, unsigned int length);
 
-// 1 first, never reused within a process; safe from any thread.
-ZYRSTD_API unsigned long long createUniqueID();
-
 } // namespace ZYRStd

@@ -14,7 +14,7 @@
 
 #include "zyr/std/CZYRCommonUniStrings.h"
 #include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRHash.h"
+#include "zyr/std/ZYRUniqueID.h"
 #include "zyr/std/CZYRSmartPtr.h"
 #include "zyr/std/CZYRString.h"
 #include "zyr/std/ZYRErrorBoundary.h"

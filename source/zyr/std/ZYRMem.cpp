@@ -733,10 +733,4 @@ void dumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data) {
 
 } // namespace detail
 
-IStackWalker::~IStackWalker() = default;
-IImpStackWalkerStub::~IImpStackWalkerStub() = default;
-IStackWalker* IImpStackWalkerStub::create() {
-    return new IImpStackWalkerStub;
-}
-
 } // namespace ZYRStd

@@ -5,7 +5,7 @@
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include "zyr/std/CZYRHash.h"
+#include "zyr/std/ZYRUniqueID.h"
 
 namespace ZYRStd {
 
