@@ -1,8 +1,10 @@
 // The allocation front: plain and guarded variants, the limit, the tracker, the leak report.
 #include <gtest/gtest.h>
 
+#include <condition_variable>
 #include <cstdint>
 #include <cstring>
+#include <mutex>
 #include <string>
 #include <thread>
 #include <vector>
@@ -375,4 +377,39 @@ TEST_F(ZYRMemTest, MemOperationsCompareAsUnsignedBytes) {
     char buffer[8] = "abcdefg";
     Memmove(buffer + 1, buffer, 6);
     EXPECT_STREQ(buffer, "aabcdef");
+}
+
+namespace {
+
+std::u16string fetchNotices() {
+    CZYRErrorStk stack;
+    std::u16string text;
+    return stack.getErrorMessage(text) ? text : u"<none>";
+}
+
+} // namespace
+
+TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
+    zyrtest::installFront(0);
+    ZYRSetMemLimit(400 * kMiB);
+    const unsigned long long used = GetMemUsage();
+    DisableMemUsageCheck();
+    void* over = ZYRMalloc(static_cast<unsigned int>(400 * kMiB - used + 4096));
+    void* recent = ZYRMalloc(2000);
+    EnableMemUsageCheck();
+    ASSERT_NE(over, nullptr);
+    ASSERT_NE(recent, nullptr);
+    fetchNotices(); // start from an empty stack
+
+    ZYRFree(recent);
+    void* again = ZYRMalloc(2000);
+    EXPECT_EQ(again, nullptr) << "usage is still above the limit";
+    EXPECT_EQ(fetchNotices(), u"Insufficient Memory.\n");
+    ZYRFree(again);
+    ZYRFree(over);
+
+    void* fits = ZYRMalloc(2000);
+    EXPECT_NE(fits, nullptr) << "back under the limit";
+    ZYRFree(fits);
+    EXPECT_EQ(GetMemUsage(), used);
 }

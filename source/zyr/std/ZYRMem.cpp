@@ -167,6 +167,15 @@ bool usageCheckOn() {
     return usageCheckCounter.load(std::memory_order_relaxed) >= 1;
 }
 
+// Reusing freed bytes leaves the total as it is, which passes the limit test only while the
+// total is within the limit: above it (check switched off and on again, or the limit lowered
+// below usage) every request takes the full test.
+bool mayReusePendingFrees() {
+    return totalUsage.load(std::memory_order_relaxed) <=
+               memLimitBytes.load(std::memory_order_relaxed) ||
+           !usageCheckOn();
+}
+
 struct Tracker {
     std::recursive_mutex mutex; // guards every field below
     unsigned int allocCount = 0;
@@ -238,7 +247,8 @@ void* plainAlloc(unsigned int size) {
     if (!block)
         return nullptr;
     const uint64_t accounted = round8(size);
-    if (!takePendingFrees(pendingFrees, accounted) && !detail::plainLimitTest(accounted, 0, true)) {
+    const bool reused = mayReusePendingFrees() && takePendingFrees(pendingFrees, accounted);
+    if (!reused && !detail::plainLimitTest(accounted, 0, true)) {
         host.freeProc(block, host.clientData);
         detail::sendOutOfMemoryNotice();
         return nullptr;
