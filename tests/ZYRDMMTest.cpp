@@ -1,7 +1,9 @@
 // The dynamic memory manager: the recovery ladder, flush order, the log, client accounting.
 #include <gtest/gtest.h>
 
+#include <condition_variable>
 #include <fstream>
+#include <mutex>
 #include <sstream>
 #include <thread>
 #include <vector>
@@ -241,6 +243,41 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
     EXPECT_NE(closeLog().find("---- Memory allocation succeed after SyncRendererThread for Client "
                               ": <TEST> , [memory needed = 1000 bytes ]  \n"),
               std::string::npos);
+}
+
+TEST_F(ZYRDMMTest, WhatTheRendererThreadFreesCountsAsADrop) {
+    std::vector<void*> bands;
+    for (int i = 0; i < 10; ++i)
+        bands.push_back(ZYRMalloc(3000));
+    std::mutex mutex;
+    std::condition_variable changed;
+    enum { kIdle, kFree, kFreed, kQuit } step = kIdle;
+    // A renderer thread that lives on after freeing, as the engine's does.
+    std::thread renderer([&] {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return step == kFree; });
+        for (void* band : bands)
+            ZYRFree(band);
+        step = kFreed;
+        changed.notify_all();
+        changed.wait(lock, [&] { return step == kQuit; });
+    });
+    FakeQueue queue;
+    queue.onSync = [&] {
+        std::unique_lock lock(mutex);
+        step = kFree;
+        changed.notify_all();
+        changed.wait(lock, [&] { return step == kFreed; });
+    };
+    RegisterSurfaceQueueInstance(&queue);
+    EXPECT_TRUE(ArrangeMemoryBySyncRendererThread(20000, true))
+        << "30000 bytes freed on the renderer thread";
+    {
+        std::lock_guard lock(mutex);
+        step = kQuit;
+    }
+    changed.notify_all();
+    renderer.join();
 }
 
 TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {

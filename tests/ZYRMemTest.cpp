@@ -413,3 +413,35 @@ TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
     ZYRFree(fits);
     EXPECT_EQ(GetMemUsage(), used);
 }
+
+TEST_F(ZYRMemTest, UsageCountsAnotherThreadsPendingFrees) {
+    zyrtest::installFront(0);
+    void* block = ZYRMalloc(1000);
+    ASSERT_NE(block, nullptr);
+    const unsigned long long held = GetMemUsage();
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool freed = false;
+    bool done = false;
+    // The freeing thread stays alive while the usage is read: its end would hand its
+    // pending bytes back anyway.
+    std::thread renderer([&] {
+        ZYRFree(block);
+        std::unique_lock lock(mutex);
+        freed = true;
+        changed.notify_all();
+        changed.wait(lock, [&] { return done; });
+    });
+    {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return freed; });
+    }
+    EXPECT_EQ(GetMemUsage(), held - 1000);
+    {
+        std::lock_guard lock(mutex);
+        done = true;
+    }
+    changed.notify_all();
+    renderer.join();
+    EXPECT_EQ(GetMemUsage(), held - 1000);
+}

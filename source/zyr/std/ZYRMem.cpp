@@ -606,7 +606,9 @@ void plainUsageSub(uint64_t bytes) {
     totalUsage.fetch_sub(bytes, std::memory_order_relaxed);
 }
 uint64_t plainUsage() {
-    flushPendingFrees(pendingFrees); // the caller's own frees are always counted
+    // Every thread's pending frees go back first: a renderer thread that freed memory must
+    // show as a drop to the thread that asked it to catch up.
+    drainAllPendingFrees();
     return totalUsage.load(std::memory_order_relaxed);
 }
 
