@@ -445,3 +445,30 @@ TEST_F(ZYRMemTest, UsageCountsAnotherThreadsPendingFrees) {
     renderer.join();
     EXPECT_EQ(GetMemUsage(), held - 1000);
 }
+
+TEST_F(ZYRMemTest, GuardCheckNeverReadsPastADamagedBlock) {
+    for (int level : {1, 2}) {
+        zyrtest::installFront(level);
+        auto* block = static_cast<unsigned char*>(ZYRMalloc(32));
+        ASSERT_NE(block, nullptr);
+        uint32_t size;
+        std::memcpy(&size, block - 16, sizeof size);
+        ASSERT_EQ(size, 32u);
+        // A size far beyond the block: reading the tail there would fault.
+        const uint32_t wild = 0xFFFFFF00u;
+        std::memcpy(block - 16, &wild, sizeof wild);
+        if (level == 1)
+            block[-1] ^= 0xFF; // the head guard is the first thing found damaged
+        EXPECT_THROW(ZYRDbgCheckZYRMemAllocPtr(block), CZYRError) << "level " << level;
+        if (level == 1)
+            block[-1] ^= 0xFF;
+        std::memcpy(block - 16, &size, sizeof size);
+        EXPECT_NO_THROW(ZYRDbgCheckZYRMemAllocPtr(block)) << "level " << level;
+        ZYRFree(block);
+    }
+    zyrtest::installFront(2);
+    auto* resized = static_cast<unsigned char*>(ZYRMalloc(8));
+    resized = static_cast<unsigned char*>(ZYRRealloc(resized, 100));
+    EXPECT_NO_THROW(ZYRDbgCheckZYRMemAllocPtr(resized)) << "the map follows a resize";
+    ZYRFree(resized);
+}
