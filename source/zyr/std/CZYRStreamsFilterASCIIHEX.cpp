@@ -120,10 +120,8 @@ CZYRStreamFilterASCIIHEXDecode::~CZYRStreamFilterASCIIHEXDecode() = default;
 
 [[noreturn]] void CZYRStreamFilterASCIIHEXDecode::fail(int character, unsigned long long offset,
                                                        int line) {
-    failure_ = {"invalid character", character, offset, line};
-    // Lives until the next decoding error of this filter on the same thread.
-    thread_local char text[128];
-    failure_.raise(text, "ASCIIHexDecode", kSource);
+    failure_ = {"ASCIIHexDecode: invalid character", character, offset, line};
+    failure_.raise(kSource);
 }
 
 unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size,
