@@ -485,3 +485,21 @@ TEST(CZYRStreamsFilterTest, DecodingErrorTextsOutliveTheNextErrorAndTheThread) {
     }).join();
     EXPECT_EQ(std::string(fromThread.getMessage()), textThread);
 }
+
+TEST(CZYRStreamsFilterTest, ErrorReportingWriteEncodesWhateverTheStatusHolds) {
+    ZYRStd::C_Error earlier;
+    earlier.setError(ZYRPublic::kZYRErrorBadParam, "earlier", "elsewhere", 1);
+    Stream out85 = sink();
+    Stream outHex = sink();
+    {
+        CZYRStreamFilterASCII85 a85{CZYRSmartZYRRefPtr<IZYRStream>(out85)};
+        CZYRStreamFilterASCIIHEX hex{CZYRSmartZYRRefPtr<IZYRStream>(outHex)};
+        EXPECT_EQ(a85.write("A", 1, 1, earlier), 1u);
+        EXPECT_EQ(hex.write("Man", 1, 3, earlier), 3u);
+        a85.close();
+        hex.close();
+    }
+    EXPECT_EQ(contents(out85), "5l~>\r\n");
+    EXPECT_EQ(contents(outHex), "4d616e>\r\n");
+    EXPECT_STREQ(earlier.getMessage(), "earlier") << "a successful write changes no status";
+}

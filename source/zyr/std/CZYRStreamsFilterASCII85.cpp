@@ -263,6 +263,8 @@ unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, u
 
 unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, unsigned int count,
                                                  ZYRPublic::I_Error& err) {
+    if (err.errorOccurred())
+        return 0; // a decoder's status that already failed reads nothing
     return StreamsFilterCommon::recordingErrors(err, "CZYRStreamFilterASCII85Decode::read - failed",
                                                 kSource, __LINE__,
                                                 [&] { return read(buf, size, count); });

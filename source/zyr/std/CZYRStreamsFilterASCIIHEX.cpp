@@ -173,6 +173,8 @@ unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size,
 
 unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size, unsigned int count,
                                                   ZYRPublic::I_Error& err) {
+    if (err.errorOccurred())
+        return 0; // a decoder's status that already failed reads nothing
     return StreamsFilterCommon::recordingErrors(
         err, "CZYRStreamFilterASCIIHEXDecode::read - failed", kSource, __LINE__,
         [&] { return read(buf, size, count); });

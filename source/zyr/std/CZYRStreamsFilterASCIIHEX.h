@@ -27,8 +27,8 @@ public:
     // Encodes size * count bytes and returns that number. A failing target write drops
     // the target; every later write raises kZYRErrorFileOpFailed.
     unsigned int write(const void* buf, unsigned int size, unsigned int count);
-    // The same, recording any failure in `err` and returning 0; a status that already
-    // holds an error makes it a no-op.
+    // The same, recording any failure in `err` and returning 0; it encodes also when `err`
+    // already holds an error.
     unsigned int write(const void* buf, unsigned int size, unsigned int count,
                        ZYRPublic::I_Error& err);
     // Writes the end marker and the last line (also when no byte was written) and drops

@@ -18,13 +18,12 @@
 namespace ZYRStd::StreamsFilterCommon {
 
 // Runs `call` (a read or a write), recording a failure in `err` and returning 0 instead of
-// throwing; a status that already holds an error makes it a no-op. `failed`, `source` and
-// `line` describe a failure that is not an error of the library.
+// throwing. The call runs whatever `err` already holds: an encoder's data must not be
+// dropped because of some earlier, unrelated failure. `failed`, `source` and `line`
+// describe a failure that is not an error of the library.
 template <class Call>
 unsigned int recordingErrors(ZYRPublic::I_Error& err, const char* failed, const char* source,
                              int line, Call&& call) {
-    if (err.errorOccurred())
-        return 0;
     try {
         return call();
     } catch (const CZYRError& e) {
