@@ -697,8 +697,7 @@ void sendOutOfMemoryNotice() {
         return;
     sendingNotice = true;
     try {
-        CZYRErrorStk stack;
-        stack.reportUniqueError(
+        reportUniqueToProcessStack(
             ZYRMakeErrorInfo(static_cast<short>(0xFFFF), u"Insufficient Memory.\n"));
     } catch (...) {
         // The notice is advice; the caller already gets its null.
