@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <fstream>
 #include <iterator>
 #include <string>
@@ -15,6 +16,7 @@
 #include "zyr/std/CZYRBaseStream.h"
 #include "zyr/std/CZYRError.h"
 #include "zyr/std/CZYRFileSys.h"
+#include "zyr/std/ZYRPosixIO.h"
 
 namespace {
 
@@ -597,3 +599,64 @@ TEST_F(FileOperationsTest, MappedStreams) {
 }
 
 } // namespace
+
+namespace {
+
+// A scripted system call: each step is the result of one call (with errno for -1).
+struct Script {
+    std::vector<std::pair<ssize_t, int>> steps;
+    size_t calls = 0;
+    ssize_t next() {
+        if (calls >= steps.size())
+            return ADD_FAILURE() << "called again after the script ended", -1;
+        const auto [result, error] = steps[calls++];
+        errno = error;
+        return result;
+    }
+};
+Script* script = nullptr;
+ssize_t scriptedRead(int, void*, size_t) {
+    return script->next();
+}
+ssize_t scriptedWrite(int, const void*, size_t) {
+    return script->next();
+}
+
+} // namespace
+
+TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
+    using ZYRStd::posixio::readFully;
+    using ZYRStd::posixio::writeFully;
+    char buf[10] = {};
+    Script s;
+    script = &s;
+
+    s = {{{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}};
+    auto t = writeFully(3, buf, 10, scriptedWrite);
+    EXPECT_EQ(t.done, 10u);
+    EXPECT_EQ(t.error, 0);
+
+    s = {{{3, 0}, {0, 0}}};
+    t = writeFully(3, buf, 10, scriptedWrite);
+    EXPECT_EQ(t.done, 3u);
+    EXPECT_EQ(t.error, EIO) << "a write that moves nothing must not be retried for ever";
+
+    s = {{{2, 0}, {-1, ENOSPC}}};
+    t = writeFully(3, buf, 10, scriptedWrite);
+    EXPECT_EQ(t.done, 2u);
+    EXPECT_EQ(t.error, ENOSPC);
+
+    s = {{{-1, 0}}};
+    EXPECT_EQ(writeFully(3, buf, 10, scriptedWrite).error, EIO) << "a failure without errno";
+
+    s = {{{-1, EINTR}, {7, 0}, {0, 0}}};
+    t = readFully(3, buf, 10, scriptedRead);
+    EXPECT_EQ(t.done, 7u);
+    EXPECT_EQ(t.error, 0) << "the end of the file is no error";
+
+    s = {{{5, 0}, {-1, EBADF}}};
+    t = readFully(3, buf, 10, scriptedRead);
+    EXPECT_EQ(t.done, 5u);
+    EXPECT_EQ(t.error, EBADF);
+    script = nullptr;
+}
