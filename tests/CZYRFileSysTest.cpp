@@ -6,6 +6,8 @@
 #include <cerrno>
 #include <fstream>
 #include <iterator>
+#include <new>
+#include <set>
 #include <string>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -659,4 +661,56 @@ TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
     EXPECT_EQ(t.done, 5u);
     EXPECT_EQ(t.error, EBADF);
     script = nullptr;
+}
+
+namespace {
+
+// The host kit's procedures, noting which DI paths the host has handed out and not yet
+// been given back.
+struct DIPathLedger {
+    static inline ZYRPublic::_t_ZYRPDLFileSysRec real{};
+    static inline std::set<void*> outstanding;
+
+    static void* wPathToDIPath(const char16_t* path, int reserved) {
+        void* diPath = real.wPathToDIPath(path, reserved);
+        if (diPath)
+            outstanding.insert(diPath);
+        return diPath;
+    }
+    static void free(void* p) {
+        outstanding.erase(p);
+        real.free(p);
+    }
+};
+
+} // namespace
+
+TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
+    FileSysFixture fx(true);
+    const std::string path = fx.dir_.file("host.txt");
+    writeFile(path, "host");
+    DIPathLedger::real = fx.record_;
+    fx.record_.wPathToDIPath = DIPathLedger::wPathToDIPath;
+    fx.record_.free = DIPathLedger::free;
+
+    zyrtest::FailingHost host;
+    ZYRStd::tZYRMemMgr memory = host.record();
+    zyrtest::installFront(0, &memory);
+    fx.open(path, kZYRStreamRead);
+    const unsigned int callsPerOpen = host.calls;
+    ASSERT_GT(callsPerOpen, 1u);
+    ASSERT_TRUE(DIPathLedger::outstanding.empty());
+    for (unsigned int failing = 1; failing <= callsPerOpen; ++failing) {
+        host.calls = 0;
+        host.failAt = failing;
+        try {
+            fx.open(path, kZYRStreamRead);
+        } catch (const ZYRStd::CZYRError&) {
+        } catch (const std::bad_alloc&) {
+        }
+        host.failAt = 0;
+        EXPECT_TRUE(DIPathLedger::outstanding.empty()) << "allocation " << failing << " failed";
+        DIPathLedger::outstanding.clear();
+    }
+    zyrtest::installFront(0);
 }

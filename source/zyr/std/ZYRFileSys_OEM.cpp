@@ -76,6 +76,25 @@ CFile::CFile(void* diPath, unsigned int mode, ZYRPublic::_t_ZYRPDLFileSysRec* re
     }
 }
 
+std::unique_ptr<ZYRFileSys::IFile> CFile::create(void* diPath, unsigned int mode,
+                                                 ZYRPublic::_t_ZYRPDLFileSysRec* record) {
+    void* storage = nullptr;
+    try {
+        storage = CFile::operator new(sizeof(CFile));
+    } catch (...) {
+        // No object to take the path over: it goes back to the host here.
+        if (diPath && record && record->free)
+            record->free(diPath);
+        throw;
+    }
+    try {
+        return std::unique_ptr<ZYRFileSys::IFile>(::new (storage) CFile(diPath, mode, record));
+    } catch (...) {
+        CFile::operator delete(storage); // the constructor has freed the path
+        throw;
+    }
+}
+
 CFile::~CFile() {
     try {
         close();

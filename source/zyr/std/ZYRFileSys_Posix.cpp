@@ -558,7 +558,7 @@ IImpZYRFileSys_Posix::~IImpZYRFileSys_Posix() = default;
 CZYRSmartZYRRefPtr<IZYRFStream> IImpZYRFileSys_Posix::hostStream(void* diPath, unsigned int mode) {
     std::unique_ptr<IFile> file;
     try {
-        file.reset(new ZYROEMFileSys::CFile(diPath, mode, record_));
+        file = ZYROEMFileSys::CFile::create(diPath, mode, record_);
     } catch (const CZYRError&) {
         // A stream without a file: isOpen is false and every transfer fails.
     }
