@@ -1,8 +1,10 @@
 // The dynamic memory manager: the recovery ladder, flush order, the log, client accounting.
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <condition_variable>
 #include <fstream>
+#include <future>
 #include <mutex>
 #include <sstream>
 #include <thread>
@@ -447,4 +449,44 @@ TEST_F(ZYRDMMTest, StdAllocatorServesContainersAndReportsFailure) {
         EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStdAllocator");
         EXPECT_EQ(e.getSrcLineNumber(), 94);
     }
+}
+
+TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool flushing = false;
+    bool release = false;
+    FakeClient slow("slow", 1000);
+    // A flush that waits on the thread which is about to ask for the totals.
+    slow.answerFor = [&](unsigned int) {
+        std::unique_lock lock(mutex);
+        flushing = true;
+        changed.notify_all();
+        changed.wait(lock, [&] { return release; });
+        return false;
+    };
+    add(slow);
+    std::thread flusher([] {
+        SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("flusher", true));
+        ZYRFlushMemory(nullptr, 10, eFlushMemorySeverityNormal);
+        SetCZYRThreadSpecificPtr(nullptr);
+    });
+    {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return flushing; });
+    }
+    auto totals = std::async(std::launch::async, [] {
+        unsigned long long flushable = 0, limit = 0, used = 0;
+        GetClientsMemoryUsedAndMemoryLimit(flushable, limit, used);
+        return flushable;
+    });
+    const bool answered = totals.wait_for(std::chrono::seconds(5)) == std::future_status::ready;
+    {
+        std::lock_guard lock(mutex);
+        release = true;
+    }
+    changed.notify_all();
+    flusher.join();
+    EXPECT_TRUE(answered) << "the totals waited behind the flush";
+    EXPECT_EQ(totals.get(), 1000u);
 }
