@@ -423,6 +423,7 @@ TEST_F(ZYRDMMTest, PerNameStatisticsAreWrittenAtClose) {
     UpdateClientMemoryStat("zeta", 10, true);
     UpdateClientMaxMemoryStat("alpha", 7);
     UpdateClientMaxMemoryStat("alpha", 3);
+    UpdateClientMemoryStat("beta", 40, false); // only ever given back: no peak to report
     LogDMMInfo("info %d\n", 5);
     LogSubAlocInfo("sub");
     EXPECT_EQ(closeLog(), "info 5\nsub\n"
