@@ -1,6 +1,7 @@
 // The allocation front: plain and guarded variants, the limit, the tracker, the leak report.
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <condition_variable>
 #include <cstdint>
 #include <cstring>
@@ -471,4 +472,29 @@ TEST_F(ZYRMemTest, GuardCheckNeverReadsPastADamagedBlock) {
     resized = static_cast<unsigned char*>(ZYRRealloc(resized, 100));
     EXPECT_NO_THROW(ZYRDbgCheckZYRMemAllocPtr(resized)) << "the map follows a resize";
     ZYRFree(resized);
+}
+
+TEST_F(ZYRMemTest, DebugStateIsOneConsistentSnapshot) {
+    zyrtest::installFront(1);
+    const sZYRDbgMemState start = ZYRMemMgr_dbgMemState();
+    const long long startHeld = static_cast<long long>(start.allocCount) - start.freeCount;
+    constexpr long long kAccounted = 32; // 8 bytes, guards and header, rounded to 8
+    std::atomic<bool> stop{false};
+    std::thread churn([&] {
+        while (!stop)
+            ZYRFree(ZYRMalloc(8));
+    });
+    while (ZYRMemMgr_dbgMemState().allocCount < start.allocCount + 1000) {
+    }
+    int torn = 0;
+    // Read all along a million allocations of the other thread.
+    for (sZYRDbgMemState s = ZYRMemMgr_dbgMemState(); s.allocCount < start.allocCount + 1000000;
+         s = ZYRMemMgr_dbgMemState()) {
+        const long long held = static_cast<long long>(s.allocCount) - s.freeCount - startHeld;
+        if (static_cast<long long>(s.currentBytes) - start.currentBytes != held * kAccounted)
+            ++torn;
+    }
+    stop = true;
+    churn.join();
+    EXPECT_EQ(torn, 0) << "counters read while an allocation was half recorded";
 }

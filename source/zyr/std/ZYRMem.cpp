@@ -484,7 +484,10 @@ void ZYRDbgCheckZYRMemAllocPtr(void* p) {
 sZYRDbgMemState ZYRMemMgr_dbgMemState() {
     if (statLevel < 1)
         return {};
-    const Tracker& t = tracker();
+    // Under the tracker lock: other threads update the counters meanwhile, and the five
+    // must come from one moment.
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
     return {t.allocCount, t.reallocCount, t.freeCount, t.currentBytes, t.peakBytes};
 }
 
