@@ -112,9 +112,10 @@ public:
                                     "Out of memory in IImp_ZYRUniString constructor", kSource,
                                     __LINE__);
                 }
-            } else
+            } else {
                 text_ = usable(icu::UnicodeString(reinterpret_cast<const char*>(text),
                                                   static_cast<int32_t>(n * 2), "UTF-16LE"));
+            }
         });
     }
     // A copy with a new identity, for concatenation.
