@@ -665,8 +665,8 @@ TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
 
 namespace {
 
-// The host kit's procedures, noting which DI paths the host has handed out and not yet
-// been given back.
+// The host kit's procedures, noting which DI paths and path texts the host has handed out
+// and not yet been given back.
 struct DIPathLedger {
     static inline ZYRPublic::_t_ZYRPDLFileSysRec real{};
     static inline std::set<void*> outstanding;
@@ -676,6 +676,12 @@ struct DIPathLedger {
         if (diPath)
             outstanding.insert(diPath);
         return diPath;
+    }
+    static char16_t* diPathToWPath(void* diPath, int reserved) {
+        char16_t* text = real.diPathToWPath(diPath, reserved);
+        if (text)
+            outstanding.insert(text);
+        return text;
     }
     static void free(void* p) {
         outstanding.erase(p);
@@ -691,6 +697,7 @@ TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     writeFile(path, "host");
     DIPathLedger::real = fx.record_;
     fx.record_.wPathToDIPath = DIPathLedger::wPathToDIPath;
+    fx.record_.diPathToWPath = DIPathLedger::diPathToWPath;
     fx.record_.free = DIPathLedger::free;
 
     zyrtest::FailingHost host;

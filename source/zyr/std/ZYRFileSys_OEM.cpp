@@ -2,6 +2,7 @@
 #include "zyr/std/ZYRFileSys_OEM.h"
 
 #include <cstring>
+#include <memory>
 
 #include "zyr/std/CZYRError.h"
 
@@ -53,22 +54,23 @@ CFile::CFile(void* diPath, unsigned int mode, ZYRPublic::_t_ZYRPDLFileSysRec* re
         freeDIPath();
         missing("diPathFromPath proc not defined", __LINE__);
     }
+    // The host's path texts go back to it also when making the string fails.
+    const auto hostFree = [this](void* text) {
+        if (text && record_->free)
+            record_->free(text);
+    };
     try {
         if (record_->diPathToWPath) {
-            char16_t* text = record_->diPathToWPath(diPath_, 0);
-            if (text) {
-                path_ = ZYRStd::CZYRUniString(text);
-                if (record_->free)
-                    record_->free(text);
-            }
+            const std::unique_ptr<char16_t, decltype(hostFree)> text(
+                record_->diPathToWPath(diPath_, 0), hostFree);
+            if (text)
+                path_ = ZYRStd::CZYRUniString(text.get());
         } else {
-            char* text = record_->diPathToPath(diPath_, 0);
-            if (text) {
-                path_ = ZYRStd::CZYRUniString(text, static_cast<unsigned int>(std::strlen(text)),
-                                              "UTF-8");
-                if (record_->free)
-                    record_->free(text);
-            }
+            const std::unique_ptr<char, decltype(hostFree)> text(record_->diPathToPath(diPath_, 0),
+                                                                 hostFree);
+            if (text)
+                path_ = ZYRStd::CZYRUniString(
+                    text.get(), static_cast<unsigned int>(std::strlen(text.get())), "UTF-8");
         }
     } catch (...) {
         freeDIPath();
