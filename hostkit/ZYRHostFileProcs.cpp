@@ -8,6 +8,7 @@
 
 #include "ZYRHostKit.h"
 #include "zyr/std/ZYRFileSys_helper.h"
+#include "zyr/std/ZYRPosixIO.h"
 
 namespace ZYRHostKit {
 
@@ -45,41 +46,17 @@ int hostFlush(void* handle) {
 }
 
 size_t hostRead(void* buffer, size_t size, size_t count, void* handle, int* errorOut) {
-    const size_t wanted = size * count;
-    auto* p = static_cast<unsigned char*>(buffer);
-    size_t done = 0;
-    *errorOut = 0;
-    while (done < wanted) {
-        const ssize_t got = ::read(descriptorOf(handle), p + done, wanted - done);
-        if (got < 0) {
-            if (errno == EINTR)
-                continue;
-            *errorOut = errno ? errno : EIO;
-            break;
-        }
-        if (got == 0)
-            break;
-        done += static_cast<size_t>(got);
-    }
-    return done;
+    const ZYRStd::posixio::Transfer t =
+        ZYRStd::posixio::readFully(descriptorOf(handle), buffer, size * count);
+    *errorOut = t.error;
+    return t.done;
 }
 
 size_t hostWrite(const void* buffer, size_t size, size_t count, void* handle, int* errorOut) {
-    const size_t wanted = size * count;
-    const auto* p = static_cast<const unsigned char*>(buffer);
-    size_t done = 0;
-    *errorOut = 0;
-    while (done < wanted) {
-        const ssize_t put = ::write(descriptorOf(handle), p + done, wanted - done);
-        if (put < 0) {
-            if (errno == EINTR)
-                continue;
-            *errorOut = errno ? errno : EIO;
-            break;
-        }
-        done += static_cast<size_t>(put);
-    }
-    return done;
+    const ZYRStd::posixio::Transfer t =
+        ZYRStd::posixio::writeFully(descriptorOf(handle), buffer, size * count);
+    *errorOut = t.error;
+    return t.done;
 }
 
 int hostRemove(void* diPath) {

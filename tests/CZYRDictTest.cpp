@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "zyr/std/CZYRDict.h"
+#include "zyr/std/ZYRMem.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;
@@ -329,4 +330,67 @@ TEST(CZYRDictTest, FinalizedContainersAreReadFromSeveralThreads) {
         r.join();
     EXPECT_EQ(sums[0], 299u * 300 / 2);
     EXPECT_EQ(sums[1], sums[0]);
+}
+
+TEST(CZYRDictTest, CyclesAndDeepNestingAreRefusedByFinalizeAndClone) {
+    const unsigned long long before = GetMemUsage();
+    {
+        CZYRDict self;
+        self.set(CZYRUniString("me"), self);
+        CZYRArray ring;
+        CZYRDict inRing;
+        ring.set(0, inRing);
+        inRing.set(CZYRUniString("ring"), ring);
+        for (I_Dict* dict : {self.getImpl(), inRing.getImpl()}) {
+            C_Error cloneErr;
+            EXPECT_EQ(dict->clone(cloneErr), nullptr);
+            EXPECT_EQ(cloneErr.getError(), ZYRPublic::kZYRErrorInvalidData);
+            EXPECT_STREQ(cloneErr.getMessage(), "Cyclic container");
+            C_Error finalizeErr;
+            dict->finalize(finalizeErr);
+            EXPECT_EQ(finalizeErr.getError(), ZYRPublic::kZYRErrorInvalidData);
+            EXPECT_STREQ(finalizeErr.getMessage(), "Cyclic container");
+        }
+        C_Error arrayErr;
+        EXPECT_EQ(ring.getImpl()->clone(arrayErr), nullptr);
+        EXPECT_STREQ(arrayErr.getMessage(), "Cyclic container");
+        EXPECT_FALSE(self.isFinalized()) << "a failed walk freezes nothing";
+        // So the cycles can still be broken, and nothing leaks.
+        self.remove(CZYRUniString("me"));
+        inRing.remove(CZYRUniString("ring"));
+
+        // A container reached twice without a cycle is no cycle.
+        CZYRDict shared;
+        CZYRDict twice;
+        twice.set(CZYRUniString("a"), shared);
+        twice.set(CZYRUniString("b"), shared);
+        EXPECT_NO_THROW(twice.clone());
+        EXPECT_NO_THROW(twice.finalize());
+    }
+    EXPECT_EQ(GetMemUsage(), before);
+
+    // 256 levels below the top are walked, one more is refused.
+    auto chain = [](unsigned int levels) {
+        CZYRArray top;
+        CZYRArray at = top;
+        for (unsigned int i = 0; i < levels; ++i) {
+            CZYRArray next;
+            at.set(0, next);
+            at = next;
+        }
+        return top;
+    };
+    const CZYRArray deepest = chain(256);
+    EXPECT_NO_THROW(deepest.clone());
+    const CZYRArray tooDeep = chain(257);
+    C_Error cloneErr;
+    EXPECT_EQ(tooDeep.getImpl()->clone(cloneErr), nullptr);
+    EXPECT_EQ(cloneErr.getError(), ZYRPublic::kZYRErrorInvalidData);
+    EXPECT_STREQ(cloneErr.getMessage(), "Container nesting too deep");
+    C_Error finalizeErr;
+    tooDeep.getImpl()->finalize(finalizeErr);
+    EXPECT_STREQ(finalizeErr.getMessage(), "Container nesting too deep");
+    EXPECT_FALSE(tooDeep.isFinalized());
+    CZYRArray(deepest).finalize();
+    EXPECT_TRUE(deepest.isFinalized());
 }

@@ -1,6 +1,7 @@
 // The error stack: per-thread order, unique reports, filters, and the out-of-memory notice.
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <thread>
 
 #include "TestSupport.h"
@@ -121,5 +122,29 @@ TEST_F(CZYRErrorStkTest, RefusedAllocationLeavesOneNotice) {
     zyrtest::installFront(0, &record);
     EXPECT_EQ(ZYRMalloc(16), nullptr);
     EXPECT_EQ(fetch(), u"<none>") << "a failing host allocator is not reported";
+    zyrtest::installFront(0);
+}
+
+TEST_F(CZYRErrorStkTest, OutOfMemoryNoticeFromAnyThreadIsSafeAgainstTerminate) {
+    zyrtest::installFront(0);
+    ZYRSetMemLimit(400ull << 20);
+    // Usage at the limit, so that every small request is refused without a large block.
+    DisableMemUsageCheck();
+    void* filler = ZYRMalloc(static_cast<unsigned int>((400ull << 20) - GetMemUsage()));
+    EnableMemUsageCheck();
+    ASSERT_NE(filler, nullptr);
+    std::atomic<bool> refusing{true};
+    std::thread renderer([&] {
+        for (int i = 0; i < 20000; ++i)
+            EXPECT_EQ(ZYRMalloc(64), nullptr);
+        refusing = false;
+    });
+    while (refusing)
+        TerminateErrorStk();
+    renderer.join();
+    TerminateErrorStk();
+    EXPECT_EQ(ZYRMalloc(64), nullptr);
+    EXPECT_EQ(fetch(), u"Insufficient Memory.\n");
+    ZYRFree(filler);
     zyrtest::installFront(0);
 }

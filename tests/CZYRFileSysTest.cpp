@@ -3,8 +3,11 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <fstream>
 #include <iterator>
+#include <new>
+#include <set>
 #include <string>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -15,6 +18,7 @@
 #include "zyr/std/CZYRBaseStream.h"
 #include "zyr/std/CZYRError.h"
 #include "zyr/std/CZYRFileSys.h"
+#include "zyr/std/ZYRPosixIO.h"
 
 namespace {
 
@@ -597,3 +601,123 @@ TEST_F(FileOperationsTest, MappedStreams) {
 }
 
 } // namespace
+
+namespace {
+
+// A scripted system call: each step is the result of one call (with errno for -1).
+struct Script {
+    std::vector<std::pair<ssize_t, int>> steps;
+    size_t calls = 0;
+    ssize_t next() {
+        if (calls >= steps.size())
+            return ADD_FAILURE() << "called again after the script ended", -1;
+        const auto [result, error] = steps[calls++];
+        errno = error;
+        return result;
+    }
+};
+Script* script = nullptr;
+ssize_t scriptedRead(int, void*, size_t) {
+    return script->next();
+}
+ssize_t scriptedWrite(int, const void*, size_t) {
+    return script->next();
+}
+
+} // namespace
+
+TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
+    using ZYRStd::posixio::readFully;
+    using ZYRStd::posixio::writeFully;
+    char buf[10] = {};
+    Script s;
+    script = &s;
+
+    s = {{{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}};
+    auto t = writeFully(3, buf, 10, scriptedWrite);
+    EXPECT_EQ(t.done, 10u);
+    EXPECT_EQ(t.error, 0);
+
+    s = {{{3, 0}, {0, 0}}};
+    t = writeFully(3, buf, 10, scriptedWrite);
+    EXPECT_EQ(t.done, 3u);
+    EXPECT_EQ(t.error, EIO) << "a write that moves nothing must not be retried for ever";
+
+    s = {{{2, 0}, {-1, ENOSPC}}};
+    t = writeFully(3, buf, 10, scriptedWrite);
+    EXPECT_EQ(t.done, 2u);
+    EXPECT_EQ(t.error, ENOSPC);
+
+    s = {{{-1, 0}}};
+    EXPECT_EQ(writeFully(3, buf, 10, scriptedWrite).error, EIO) << "a failure without errno";
+
+    s = {{{-1, EINTR}, {7, 0}, {0, 0}}};
+    t = readFully(3, buf, 10, scriptedRead);
+    EXPECT_EQ(t.done, 7u);
+    EXPECT_EQ(t.error, 0) << "the end of the file is no error";
+
+    s = {{{5, 0}, {-1, EBADF}}};
+    t = readFully(3, buf, 10, scriptedRead);
+    EXPECT_EQ(t.done, 5u);
+    EXPECT_EQ(t.error, EBADF);
+    script = nullptr;
+}
+
+namespace {
+
+// The host kit's procedures, noting which DI paths and path texts the host has handed out
+// and not yet been given back.
+struct DIPathLedger {
+    static inline ZYRPublic::_t_ZYRPDLFileSysRec real{};
+    static inline std::set<void*> outstanding;
+
+    static void* wPathToDIPath(const char16_t* path, int reserved) {
+        void* diPath = real.wPathToDIPath(path, reserved);
+        if (diPath)
+            outstanding.insert(diPath);
+        return diPath;
+    }
+    static char16_t* diPathToWPath(void* diPath, int reserved) {
+        char16_t* text = real.diPathToWPath(diPath, reserved);
+        if (text)
+            outstanding.insert(text);
+        return text;
+    }
+    static void free(void* p) {
+        outstanding.erase(p);
+        real.free(p);
+    }
+};
+
+} // namespace
+
+TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
+    FileSysFixture fx(true);
+    const std::string path = fx.dir_.file("host.txt");
+    writeFile(path, "host");
+    DIPathLedger::real = fx.record_;
+    fx.record_.wPathToDIPath = DIPathLedger::wPathToDIPath;
+    fx.record_.diPathToWPath = DIPathLedger::diPathToWPath;
+    fx.record_.free = DIPathLedger::free;
+
+    zyrtest::FailingHost host;
+    ZYRStd::tZYRMemMgr memory = host.record();
+    zyrtest::installFront(0, &memory);
+    fx.open(path, kZYRStreamRead);
+    const unsigned int callsPerOpen = host.calls;
+    ASSERT_GT(callsPerOpen, 1u);
+    ASSERT_TRUE(DIPathLedger::outstanding.empty());
+    for (unsigned int failing = 1; failing <= callsPerOpen; ++failing) {
+        host.calls = 0;
+        host.failAt = failing;
+        try {
+            fx.open(path, kZYRStreamRead);
+        } catch (const ZYRStd::CZYRError&) {
+        } catch (const std::bad_alloc&) {
+        }
+        host.failAt = 0;
+        EXPECT_TRUE(DIPathLedger::outstanding.empty()) << "allocation " << failing << " failed";
+        DIPathLedger::outstanding.clear();
+    }
+    zyrtest::installFront(0);
+}

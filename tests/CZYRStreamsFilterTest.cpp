@@ -10,6 +10,7 @@
 #include <spawn.h>
 #include <string>
 #include <sys/wait.h>
+#include <thread>
 #include <vector>
 
 #include "TestSupport.h"
@@ -128,9 +129,28 @@ template <class Decoder> std::string decodeError(const std::string& text) {
         } catch (const CZYRError& again) {
             EXPECT_EQ(first, again.getMessage());
         }
-        return first;
+        char where[64];
+        if (decoder.getFailureCharacter() >= 0)
+            std::snprintf(where, sizeof where, " 0x%02X at offset %llu",
+                          decoder.getFailureCharacter(), decoder.getFailureOffset());
+        else
+            std::snprintf(where, sizeof where, " at offset %llu", decoder.getFailureOffset());
+        return first + where;
     }
     return "(no error)";
+}
+
+// The first decoding error of `text`, as the caller keeps it.
+template <class Decoder> CZYRError firstError(const std::string& text) {
+    Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
+    char buf[64];
+    try {
+        while (decoder.read(buf, 1, sizeof buf) > 0) {
+        }
+    } catch (const CZYRError& e) {
+        return e;
+    }
+    return CZYRError(ZYRPublic::kZYRErrorNoError, "(no error)", "", 0);
 }
 
 // ---- ASCII85 encoder ------------------------------------------------------------------------
@@ -439,3 +459,47 @@ TEST(CZYRStreamsFilterTest, AgreesWithPythonBase64) {
 }
 
 } // namespace
+
+TEST(CZYRStreamsFilterTest, DecodingErrorTextsOutliveTheNextErrorAndTheThread) {
+    using A85 = CZYRStreamFilterASCII85Decode;
+    using Hex = CZYRStreamFilterASCIIHEXDecode;
+    const CZYRError bad85 = firstError<A85>("9jqo^{");
+    const std::string text85 = bad85.getMessage();
+    const CZYRError badHex = firstError<Hex>("4d6g>");
+    const std::string textHex = badHex.getMessage();
+    EXPECT_EQ(text85.rfind("ASCII85Decode: invalid character", 0), 0u) << text85;
+    EXPECT_EQ(textHex.rfind("ASCIIHexDecode: invalid character", 0), 0u) << textHex;
+
+    // Later errors of the same kind on the same thread leave the earlier texts alone.
+    firstError<A85>("9jz");
+    firstError<Hex>(std::string(100, '4') + "~");
+    EXPECT_EQ(bad85.getMessage(), text85);
+    EXPECT_EQ(badHex.getMessage(), textHex);
+
+    // An error made on a thread that has ended keeps its text.
+    CZYRError fromThread(ZYRPublic::kZYRErrorNoError, nullptr, "", 0);
+    std::string textThread;
+    std::thread([&] {
+        fromThread = firstError<Hex>("zz");
+        textThread = fromThread.getMessage();
+    }).join();
+    EXPECT_EQ(std::string(fromThread.getMessage()), textThread);
+}
+
+TEST(CZYRStreamsFilterTest, ErrorReportingWriteEncodesWhateverTheStatusHolds) {
+    ZYRStd::C_Error earlier;
+    earlier.setError(ZYRPublic::kZYRErrorBadParam, "earlier", "elsewhere", 1);
+    Stream out85 = sink();
+    Stream outHex = sink();
+    {
+        CZYRStreamFilterASCII85 a85{CZYRSmartZYRRefPtr<IZYRStream>(out85)};
+        CZYRStreamFilterASCIIHEX hex{CZYRSmartZYRRefPtr<IZYRStream>(outHex)};
+        EXPECT_EQ(a85.write("A", 1, 1, earlier), 1u);
+        EXPECT_EQ(hex.write("Man", 1, 3, earlier), 3u);
+        a85.close();
+        hex.close();
+    }
+    EXPECT_EQ(contents(out85), "5l~>\r\n");
+    EXPECT_EQ(contents(outHex), "4d616e>\r\n");
+    EXPECT_STREQ(earlier.getMessage(), "earlier") << "a successful write changes no status";
+}

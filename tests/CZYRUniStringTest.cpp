@@ -1,10 +1,13 @@
 // Unicode strings: construction, conversion, ordering, interning and path forms.
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <cstring>
 #include <set>
 #include <thread>
 #include <vector>
+
+#include <unicode/uclean.h>
 
 #include "zyr/std/CZYRCommonUniStrings.h"
 #include "zyr/std/CZYRString.h"
@@ -228,4 +231,77 @@ TEST(CZYRUniStringTest, PathForms) {
         EXPECT_EQ(std::u16string(reinterpret_cast<char16_t*>(decoded)), c.path);
         ZYRFree(decoded);
     }
+}
+
+TEST(CZYRUniStringTest, UnknownConverterGivesAnEmptyComparableText) {
+    C_Error err;
+    const CZYRUniString odd(createUniString("abc", "no-such-converter", err), false);
+    ASSERT_TRUE(odd.isValid());
+    EXPECT_TRUE(odd.isEmpty());
+    unsigned int bytes = 99;
+    EXPECT_NE(odd.getUTF16LEBuffer(&bytes), nullptr) << "every text has code units to read";
+    EXPECT_EQ(bytes, 0u);
+    const CZYRUniString empty = fresh("");
+    const CZYRUniString text = fresh("a");
+    EXPECT_TRUE(odd.getImpl()->equals(empty.getImpl()));
+    EXPECT_TRUE(odd.getImpl()->lessThan(text.getImpl()));
+    EXPECT_FALSE(text.getImpl()->lessThan(odd.getImpl()));
+}
+
+namespace {
+
+// ICU's heap, made to fail on demand.
+bool icuHeapFails = false;
+void* icuAlloc(const void*, size_t n) {
+    return icuHeapFails ? nullptr : std::malloc(n);
+}
+void* icuRealloc(const void*, void* p, size_t n) {
+    return icuHeapFails ? nullptr : std::realloc(p, n);
+}
+void icuFree(const void*, void* p) {
+    std::free(p);
+}
+
+} // namespace
+
+TEST(CZYRUniStringTest, IcuAllocationFailureIsAnErrorNotACrash) {
+    UErrorCode status = U_ZERO_ERROR;
+    u_setMemoryFunctions(nullptr, icuAlloc, icuRealloc, icuFree, &status);
+    ASSERT_TRUE(U_SUCCESS(status));
+    // Longer than the text ICU keeps inside the object, so the buffer comes from its heap.
+    const std::string longAscii(200, 'x');
+    const std::u16string longWide(200, u'y');
+    const CZYRUniString base = fresh("base");
+    icuHeapFails = true;
+    C_Error asciiErr;
+    I_UniString* ascii = createUniString(longAscii.c_str(), "ASCII", asciiErr);
+    C_Error wideErr;
+    I_UniString* wide = createUniString(longWide.c_str(), wideErr);
+    C_Error concatErr;
+    I_UniString* joined = base.getImpl()->concat(ascii, concatErr);
+    icuHeapFails = false;
+
+    EXPECT_EQ(asciiErr.getError(), ZYRPublic::kZYRErrorOutOfMemory);
+    EXPECT_EQ(wideErr.getError(), ZYRPublic::kZYRErrorOutOfMemory);
+    unsigned int bytes = 99;
+    ASSERT_NE(ascii, nullptr);
+    EXPECT_NE(ascii->getUTF16LEBuffer(&bytes), nullptr);
+    EXPECT_EQ(bytes, 0u);
+    EXPECT_FALSE(ascii->equals(base.getImpl()));
+    EXPECT_EQ(concatErr.getError(), ZYRPublic::kZYRErrorNoError)
+        << "an empty text appended needs no memory";
+    if (joined)
+        joined->release();
+    ascii->release();
+    if (wide)
+        wide->release();
+
+    C_Error bigErr;
+    const CZYRUniString big(createUniString(longAscii.c_str(), "UTF-8", bigErr), false);
+    icuHeapFails = true;
+    C_Error growErr;
+    I_UniString* grown = big.getImpl()->concat(big.getImpl(), growErr);
+    icuHeapFails = false;
+    EXPECT_EQ(grown, nullptr);
+    EXPECT_EQ(growErr.getError(), ZYRPublic::kZYRErrorOutOfMemory);
 }

@@ -1,7 +1,11 @@
 // The dynamic memory manager: the recovery ladder, flush order, the log, client accounting.
 #include <gtest/gtest.h>
 
+#include <chrono>
+#include <condition_variable>
 #include <fstream>
+#include <future>
+#include <mutex>
 #include <sstream>
 #include <thread>
 #include <vector>
@@ -243,6 +247,41 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
               std::string::npos);
 }
 
+TEST_F(ZYRDMMTest, WhatTheRendererThreadFreesCountsAsADrop) {
+    std::vector<void*> bands;
+    for (int i = 0; i < 10; ++i)
+        bands.push_back(ZYRMalloc(3000));
+    std::mutex mutex;
+    std::condition_variable changed;
+    enum { kIdle, kFree, kFreed, kQuit } step = kIdle;
+    // A renderer thread that lives on after freeing, as the engine's does.
+    std::thread renderer([&] {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return step == kFree; });
+        for (void* band : bands)
+            ZYRFree(band);
+        step = kFreed;
+        changed.notify_all();
+        changed.wait(lock, [&] { return step == kQuit; });
+    });
+    FakeQueue queue;
+    queue.onSync = [&] {
+        std::unique_lock lock(mutex);
+        step = kFree;
+        changed.notify_all();
+        changed.wait(lock, [&] { return step == kFreed; });
+    };
+    RegisterSurfaceQueueInstance(&queue);
+    EXPECT_TRUE(ArrangeMemoryBySyncRendererThread(20000, true))
+        << "30000 bytes freed on the renderer thread";
+    {
+        std::lock_guard lock(mutex);
+        step = kQuit;
+    }
+    changed.notify_all();
+    renderer.join();
+}
+
 TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
     FakeQueue queue;
     RegisterSurfaceQueueInstance(&queue);
@@ -384,6 +423,7 @@ TEST_F(ZYRDMMTest, PerNameStatisticsAreWrittenAtClose) {
     UpdateClientMemoryStat("zeta", 10, true);
     UpdateClientMaxMemoryStat("alpha", 7);
     UpdateClientMaxMemoryStat("alpha", 3);
+    UpdateClientMemoryStat("beta", 40, false); // only ever given back: no peak to report
     LogDMMInfo("info %d\n", 5);
     LogSubAlocInfo("sub");
     EXPECT_EQ(closeLog(), "info 5\nsub\n"
@@ -410,4 +450,44 @@ TEST_F(ZYRDMMTest, StdAllocatorServesContainersAndReportsFailure) {
         EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStdAllocator");
         EXPECT_EQ(e.getSrcLineNumber(), 94);
     }
+}
+
+TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool flushing = false;
+    bool release = false;
+    FakeClient slow("slow", 1000);
+    // A flush that waits on the thread which is about to ask for the totals.
+    slow.answerFor = [&](unsigned int) {
+        std::unique_lock lock(mutex);
+        flushing = true;
+        changed.notify_all();
+        changed.wait(lock, [&] { return release; });
+        return false;
+    };
+    add(slow);
+    std::thread flusher([] {
+        SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("flusher", true));
+        ZYRFlushMemory(nullptr, 10, eFlushMemorySeverityNormal);
+        SetCZYRThreadSpecificPtr(nullptr);
+    });
+    {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return flushing; });
+    }
+    auto totals = std::async(std::launch::async, [] {
+        unsigned long long flushable = 0, limit = 0, used = 0;
+        GetClientsMemoryUsedAndMemoryLimit(flushable, limit, used);
+        return flushable;
+    });
+    const bool answered = totals.wait_for(std::chrono::seconds(5)) == std::future_status::ready;
+    {
+        std::lock_guard lock(mutex);
+        release = true;
+    }
+    changed.notify_all();
+    flusher.join();
+    EXPECT_TRUE(answered) << "the totals waited behind the flush";
+    EXPECT_EQ(totals.get(), 1000u);
 }

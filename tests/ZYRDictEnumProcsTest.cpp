@@ -1,6 +1,7 @@
 // Dictionary printing, copying through enumeration, and the interface registry.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <sstream>
 
 #include "zyr/std/CZYRDict.h"
@@ -161,4 +162,49 @@ TEST(ZYRDictEnumProcsTest, InterfaceRegistryCopiesShareClonesDoNot) {
         EXPECT_EQ(value.getInterfaceID(), 3);
     }
     EXPECT_EQ(destroyed, 2);
+}
+
+TEST(ZYRDictEnumProcsTest, CyclesAreMarkedAndDepthIsBounded) {
+    CZYRDict self;
+    self.set(CZYRUniString("me"), self);
+    EXPECT_EQ(print(self, 1000000), "me  [ZYRDict]: \n"
+                                    "\tme  [ZYRDict]: <cycle>\n");
+    self.remove(CZYRUniString("me"));
+
+    CZYRArray ring;
+    ring.set(0, 5u);
+    ring.set(1, ring);
+    CZYRDict holder;
+    holder.set(CZYRUniString("ring"), ring);
+    EXPECT_EQ(print(holder, 2), "ring  [ZYRArray]: \n"
+                                "\t[0]  [ZYRUINT]: 5\n"
+                                "\t[1] <cycle>\n");
+    ring.remove(1);
+
+    // The depth runs out inside nested arrays and stays out: the dictionary at the bottom
+    // is not printed.
+    CZYRDict bottom;
+    bottom.set(CZYRUniString("k"), 1u);
+    CZYRArray inner;
+    inner.set(0, bottom);
+    CZYRArray outer;
+    outer.set(0, inner);
+    CZYRDict top;
+    top.set(CZYRUniString("a"), outer);
+    EXPECT_EQ(print(top, 2), "a  [ZYRArray]: \n"
+                             "\t[0] \t\t[0] [ZYRDict]\n");
+
+    // Arrays nested 300 deep: printed down to 256 levels, then "...".
+    CZYRArray chain;
+    CZYRArray at = chain;
+    for (int i = 0; i < 300; ++i) {
+        CZYRArray next;
+        at.set(0, next);
+        at = next;
+    }
+    CZYRDict deep;
+    deep.set(CZYRUniString("deep"), chain);
+    const std::string text = print(deep, 2);
+    EXPECT_EQ(std::count(text.begin(), text.end(), '['), 1 + 256) << "the label and 256 levels";
+    EXPECT_EQ(text.substr(text.size() - 4), "...\n");
 }

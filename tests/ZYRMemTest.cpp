@@ -1,8 +1,11 @@
 // The allocation front: plain and guarded variants, the limit, the tracker, the leak report.
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <condition_variable>
 #include <cstdint>
 #include <cstring>
+#include <mutex>
 #include <string>
 #include <thread>
 #include <vector>
@@ -375,4 +378,123 @@ TEST_F(ZYRMemTest, MemOperationsCompareAsUnsignedBytes) {
     char buffer[8] = "abcdefg";
     Memmove(buffer + 1, buffer, 6);
     EXPECT_STREQ(buffer, "aabcdef");
+}
+
+namespace {
+
+std::u16string fetchNotices() {
+    CZYRErrorStk stack;
+    std::u16string text;
+    return stack.getErrorMessage(text) ? text : u"<none>";
+}
+
+} // namespace
+
+TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
+    zyrtest::installFront(0);
+    ZYRSetMemLimit(400 * kMiB);
+    const unsigned long long used = GetMemUsage();
+    DisableMemUsageCheck();
+    void* over = ZYRMalloc(static_cast<unsigned int>(400 * kMiB - used + 4096));
+    void* recent = ZYRMalloc(2000);
+    EnableMemUsageCheck();
+    ASSERT_NE(over, nullptr);
+    ASSERT_NE(recent, nullptr);
+    fetchNotices(); // start from an empty stack
+
+    ZYRFree(recent);
+    void* again = ZYRMalloc(2000);
+    EXPECT_EQ(again, nullptr) << "usage is still above the limit";
+    EXPECT_EQ(fetchNotices(), u"Insufficient Memory.\n");
+    ZYRFree(again);
+    ZYRFree(over);
+
+    void* fits = ZYRMalloc(2000);
+    EXPECT_NE(fits, nullptr) << "back under the limit";
+    ZYRFree(fits);
+    EXPECT_EQ(GetMemUsage(), used);
+}
+
+TEST_F(ZYRMemTest, UsageCountsAnotherThreadsPendingFrees) {
+    zyrtest::installFront(0);
+    void* block = ZYRMalloc(1000);
+    ASSERT_NE(block, nullptr);
+    const unsigned long long held = GetMemUsage();
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool freed = false;
+    bool done = false;
+    // The freeing thread stays alive while the usage is read: its end would hand its
+    // pending bytes back anyway.
+    std::thread renderer([&] {
+        ZYRFree(block);
+        std::unique_lock lock(mutex);
+        freed = true;
+        changed.notify_all();
+        changed.wait(lock, [&] { return done; });
+    });
+    {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return freed; });
+    }
+    EXPECT_EQ(GetMemUsage(), held - 1000);
+    {
+        std::lock_guard lock(mutex);
+        done = true;
+    }
+    changed.notify_all();
+    renderer.join();
+    EXPECT_EQ(GetMemUsage(), held - 1000);
+}
+
+TEST_F(ZYRMemTest, GuardCheckNeverReadsPastADamagedBlock) {
+    for (int level : {1, 2}) {
+        zyrtest::installFront(level);
+        auto* block = static_cast<unsigned char*>(ZYRMalloc(32));
+        ASSERT_NE(block, nullptr);
+        uint32_t size;
+        std::memcpy(&size, block - 16, sizeof size);
+        ASSERT_EQ(size, 32u);
+        // A size far beyond the block: reading the tail there would fault.
+        const uint32_t wild = 0xFFFFFF00u;
+        std::memcpy(block - 16, &wild, sizeof wild);
+        if (level == 1)
+            block[-1] ^= 0xFF; // the head guard is the first thing found damaged
+        EXPECT_THROW(ZYRDbgCheckZYRMemAllocPtr(block), CZYRError) << "level " << level;
+        if (level == 1)
+            block[-1] ^= 0xFF;
+        std::memcpy(block - 16, &size, sizeof size);
+        EXPECT_NO_THROW(ZYRDbgCheckZYRMemAllocPtr(block)) << "level " << level;
+        ZYRFree(block);
+    }
+    zyrtest::installFront(2);
+    auto* resized = static_cast<unsigned char*>(ZYRMalloc(8));
+    resized = static_cast<unsigned char*>(ZYRRealloc(resized, 100));
+    EXPECT_NO_THROW(ZYRDbgCheckZYRMemAllocPtr(resized)) << "the map follows a resize";
+    ZYRFree(resized);
+}
+
+TEST_F(ZYRMemTest, DebugStateIsOneConsistentSnapshot) {
+    zyrtest::installFront(1);
+    const sZYRDbgMemState start = ZYRMemMgr_dbgMemState();
+    const long long startHeld = static_cast<long long>(start.allocCount) - start.freeCount;
+    constexpr long long kAccounted = 32; // 8 bytes, guards and header, rounded to 8
+    std::atomic<bool> stop{false};
+    std::thread churn([&] {
+        while (!stop)
+            ZYRFree(ZYRMalloc(8));
+    });
+    while (ZYRMemMgr_dbgMemState().allocCount < start.allocCount + 1000) {
+    }
+    int torn = 0;
+    // Read all along a million allocations of the other thread.
+    for (sZYRDbgMemState s = ZYRMemMgr_dbgMemState(); s.allocCount < start.allocCount + 1000000;
+         s = ZYRMemMgr_dbgMemState()) {
+        const long long held = static_cast<long long>(s.allocCount) - s.freeCount - startHeld;
+        if (static_cast<long long>(s.currentBytes) - start.currentBytes != held * kAccounted)
+            ++torn;
+    }
+    stop = true;
+    churn.join();
+    EXPECT_EQ(torn, 0) << "counters read while an allocation was half recorded";
 }

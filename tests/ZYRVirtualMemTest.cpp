@@ -2,6 +2,8 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <filesystem>
+#include <string>
 
 #include "TestSupport.h"
 #include "zyr/std/ZYRMem.h"
@@ -89,4 +91,45 @@ TEST_F(ZYRVirtualMemTest, StatusKeepsTheReserveAndPageFileCushion) {
     VirtualMemStatus(&info);
     EXPECT_EQ(info.availablePhysical, info.totalPhysical);
     ZYRSetTestAvailablePhysicalMemory(true);
+}
+
+TEST_F(ZYRVirtualMemTest, CgroupCapIsTheProcessesOwnGroup) {
+    zyrtest::TempDir dir;
+    const std::string root = dir.file("fs");
+    const std::string self = dir.file("cgroup");
+    auto put = [&](const std::string& relative, const std::string& text) {
+        std::filesystem::create_directories(std::filesystem::path(root + relative).parent_path());
+        zyrtest::writeFile(root + relative, text);
+    };
+    using detail::cgroupMemoryLimit;
+
+    // Version 2: the smallest memory.max on the way up from the process's group.
+    put("/memory.max", "max\n");
+    put("/system.slice/memory.max", "3000000\n");
+    put("/system.slice/engine.service/memory.max", "max\n");
+    zyrtest::writeFile(self, "0::/system.slice/engine.service\n");
+    EXPECT_EQ(cgroupMemoryLimit(self, root), 3000000u) << "a parent's cap binds";
+    put("/system.slice/engine.service/memory.max", "2000000\n");
+    EXPECT_EQ(cgroupMemoryLimit(self, root), 2000000u);
+    zyrtest::writeFile(self, "0::/\n");
+    EXPECT_EQ(cgroupMemoryLimit(self, root), UINT64_MAX) << "the root has no cap";
+    zyrtest::writeFile(self, "0::/gone\n");
+    EXPECT_EQ(cgroupMemoryLimit(self, root), UINT64_MAX) << "a group that is not there";
+
+    // Version 1 (also beside an empty version 2 line in a hybrid layout).
+    put("/memory/memory.limit_in_bytes", "9223372036854771712\n");
+    put("/memory/jobs/memory.limit_in_bytes", "9223372036854771712\n");
+    put("/memory/jobs/print/memory.limit_in_bytes", "5000000\n");
+    zyrtest::writeFile(self, "12:cpu,cpuacct:/jobs\n4:memory:/jobs/print\n0::/jobs\n");
+    EXPECT_EQ(cgroupMemoryLimit(self, root), 5000000u);
+    zyrtest::writeFile(self, "3:cpuset,memory:/jobs\n");
+    EXPECT_EQ(cgroupMemoryLimit(self, root), 9223372036854771712u);
+
+    // Without /proc/self/cgroup: the root's own file, as before.
+    put("/memory.max", "7000000\n");
+    EXPECT_EQ(cgroupMemoryLimit(dir.file("missing"), root), 7000000u);
+
+    tZYRVirtualMemoryInfo info{};
+    VirtualMemStatus(&info);
+    EXPECT_LE(info.totalVirtual, cgroupMemoryLimit("/proc/self/cgroup", "/sys/fs/cgroup"));
 }

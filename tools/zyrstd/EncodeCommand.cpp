@@ -1,5 +1,6 @@
 // zyrstd encode and decode: ASCII85 and ASCIIHex text through the library's streams and
 // filters.
+#include <cstdio>
 #include <string>
 #include <vector>
 
@@ -29,13 +30,27 @@ template <class Filter> void encodeAll(IZYRStream& in, Filter& filter) {
     filter.close();
 }
 
-template <class Decoder> void decodeAll(Decoder& decoder, IZYRStream& out) {
+// Bad encoded data is the input's fault: the report names it and where the fault is.
+template <class Decoder>
+void decodeAll(Decoder& decoder, IZYRStream& out, const std::string& inName) {
     std::vector<unsigned char> chunk(kChunk);
-    for (;;) {
-        const unsigned int got = decoder.read(chunk.data(), 1, kChunk);
-        if (got == 0)
-            break;
-        out.write(chunk.data(), 1, got);
+    try {
+        for (;;) {
+            const unsigned int got = decoder.read(chunk.data(), 1, kChunk);
+            if (got == 0)
+                break;
+            out.write(chunk.data(), 1, got);
+        }
+    } catch (const CZYRError& e) {
+        if (e.getError() != ZYRPublic::kZYRErrorInvalidData)
+            throw;
+        char where[64];
+        if (decoder.getFailureCharacter() >= 0)
+            std::snprintf(where, sizeof where, " 0x%02X at offset %llu",
+                          decoder.getFailureCharacter(), decoder.getFailureOffset());
+        else
+            std::snprintf(where, sizeof where, " at offset %llu", decoder.getFailureOffset());
+        failWith(inName + ": " + describe(e) + where);
     }
 }
 
@@ -59,10 +74,10 @@ int run(int argc, char** argv, bool encoding) {
                 encodeAll(*in, filter);
             } else if (args.kind == "ascii85") {
                 ZYRStd::CZYRStreamFilterASCII85Decode decoder(in);
-                decodeAll(decoder, out.stream());
+                decodeAll(decoder, out.stream(), inName);
             } else {
                 ZYRStd::CZYRStreamFilterASCIIHEXDecode decoder(in);
-                decodeAll(decoder, out.stream());
+                decodeAll(decoder, out.stream(), inName);
             }
         } catch (const CZYRError& e) {
             // Bad encoded data is the input's fault; name it.

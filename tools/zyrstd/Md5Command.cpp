@@ -11,6 +11,7 @@
 
 #include "Commands.h"
 #include "ZYRStd.h"
+#include "zyr/std/ZYRPosixIO.h"
 
 namespace zyrtool {
 
@@ -45,15 +46,14 @@ int digestFile(std::string_view name, std::vector<unsigned char>& chunk,
     if (!hash)
         return ENOMEM;
     for (;;) {
-        const ssize_t got = ::read(file.fd(), chunk.data(), chunk.size());
-        if (got < 0) {
-            if (errno == EINTR)
-                continue;
-            return errno;
-        }
-        if (got == 0)
-            break;
-        hash->update(chunk.data(), static_cast<unsigned int>(got));
+        const ZYRStd::posixio::Transfer t =
+            ZYRStd::posixio::readFully(file.fd(), chunk.data(), chunk.size());
+        if (t.error != 0)
+            return t.error;
+        if (t.done > 0)
+            hash->update(chunk.data(), static_cast<unsigned int>(t.done));
+        if (t.done < chunk.size())
+            break; // the end of the file
     }
     digest = hash->getDigest();
     return 0;

@@ -14,6 +14,7 @@
 #include "zyr/std/CZYRClientBase.h"
 #include "zyr/std/CZYRError.h"
 #include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/ZYRPosixIO.h"
 
 namespace zyrtool {
 
@@ -35,42 +36,24 @@ public:
         return reporting(err, [&] { return read(buf, size, count); });
     }
     unsigned int read(void* buf, unsigned int size, unsigned int count) override {
-        auto* p = static_cast<unsigned char*>(buf);
-        const unsigned int wanted = size * count;
-        unsigned int done = 0;
-        while (done < wanted) {
-            const ssize_t got = ::read(fd_, p + done, wanted - done);
-            if (got < 0 && errno == EINTR)
-                continue;
-            if (got < 0)
-                throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, "error reading standard input",
-                                "tools/zyrstd/ToolStreams", __LINE__);
-            if (got == 0)
-                break;
-            done += static_cast<unsigned int>(got);
-        }
-        position_ += done;
-        return done;
+        const ZYRStd::posixio::Transfer t = ZYRStd::posixio::readFully(fd_, buf, size * count);
+        if (t.error != 0)
+            throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, "error reading standard input",
+                            "tools/zyrstd/ToolStreams", __LINE__);
+        position_ += t.done;
+        return static_cast<unsigned int>(t.done);
     }
     unsigned int write(const void* buf, unsigned int size, unsigned int count,
                        ZYRPublic::eZYRErrorType& err) override {
         return reporting(err, [&] { return write(buf, size, count); });
     }
     unsigned int write(const void* buf, unsigned int size, unsigned int count) override {
-        const auto* p = static_cast<const unsigned char*>(buf);
-        const unsigned int wanted = size * count;
-        unsigned int done = 0;
-        while (done < wanted) {
-            const ssize_t put = ::write(fd_, p + done, wanted - done);
-            if (put < 0 && errno == EINTR)
-                continue;
-            if (put <= 0)
-                throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, "error writing standard output",
-                                "tools/zyrstd/ToolStreams", __LINE__);
-            done += static_cast<unsigned int>(put);
-        }
-        position_ += done;
-        return done;
+        const ZYRStd::posixio::Transfer t = ZYRStd::posixio::writeFully(fd_, buf, size * count);
+        if (t.error != 0)
+            throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, "error writing standard output",
+                            "tools/zyrstd/ToolStreams", __LINE__);
+        position_ += t.done;
+        return static_cast<unsigned int>(t.done);
     }
     unsigned long long setPos(const unsigned long long&) override { unsupported(); }
     unsigned long long getPos() override { return position_; }

@@ -210,6 +210,34 @@ protected:
     bool finalized_ = false;
 };
 
+// The containers whose finalize or clone is running on this thread, outermost first. A
+// container met again inside its own walk is a cycle, which would recurse for ever; and the
+// walk goes at most kMaxNesting levels deep, so deeply nested input cannot exhaust the stack.
+constexpr size_t kMaxNesting = 256;
+
+struct WalkPath {
+    std::array<const void*, kMaxNesting + 1> containers{};
+    size_t count = 0;
+};
+thread_local constinit WalkPath walkPath{};
+
+// One container's place on the path for the time of its walk.
+class WalkStep {
+public:
+    explicit WalkStep(const void* container) {
+        WalkPath& path = walkPath;
+        for (size_t i = 0; i < path.count; ++i)
+            if (path.containers[i] == container)
+                raise(ZYRPublic::kZYRErrorInvalidData, "Cyclic container", __LINE__);
+        if (path.count > kMaxNesting)
+            raise(ZYRPublic::kZYRErrorInvalidData, "Container nesting too deep", __LINE__);
+        path.containers[path.count++] = container;
+    }
+    ~WalkStep() { --walkPath.count; }
+    WalkStep(const WalkStep&) = delete;
+    WalkStep& operator=(const WalkStep&) = delete;
+};
+
 // Finalizes nested containers; stops at the first recorded error.
 void finalizeNested(const CZYRValue& value, I_Error& err) {
     if (value.tag() == kZYRValTypeDict && value.as<I_Dict*>())
@@ -340,11 +368,15 @@ public:
         ZYRErrorBoundaryVoid(err, "Error in IImp_ZYRDict::finalize", kSource, __LINE__, [&] {
             if (finalized_)
                 return;
+            const WalkStep step(static_cast<I_Dict*>(this));
             forEach([&](const Node& node) {
                 finalizeNested(node.value, err);
                 return !err.errorOccurred();
             });
-            finalized_ = true;
+            // A walk that failed (a cycle, too deep) leaves the container open, so that its
+            // owner can still break the cycle and nothing is frozen half done.
+            if (!err.errorOccurred())
+                finalized_ = true;
         });
     }
 
@@ -358,6 +390,7 @@ public:
     I_Dict* clone(I_Error& err) override {
         return ZYRErrorBoundary<I_Dict*>(
             err, nullptr, "Error in IImp_ZYRDict::clone", kSource, __LINE__, [&]() -> I_Dict* {
+                const WalkStep step(static_cast<I_Dict*>(this));
                 C_SmartPtr<IImp_ZYRDict> copy(new IImp_ZYRDict, false);
                 forEach([&](const Node& node) {
                     cloneValue(node.value, err,
@@ -511,12 +544,14 @@ public:
         ZYRErrorBoundaryVoid(err, "Error in IImp_ZYRArray::finalize", kSource, __LINE__, [&] {
             if (finalized_)
                 return;
+            const WalkStep step(static_cast<I_Array*>(this));
             for (const CZYRValue& value : elements_) {
                 finalizeNested(value, err);
                 if (err.errorOccurred())
                     break;
             }
-            finalized_ = true;
+            if (!err.errorOccurred()) // as for dictionaries
+                finalized_ = true;
         });
     }
 
@@ -525,6 +560,7 @@ public:
     I_Array* clone(I_Error& err) override {
         return ZYRErrorBoundary<I_Array*>(
             err, nullptr, "Error in IImp_ZYRArray::clone", kSource, __LINE__, [&]() -> I_Array* {
+                const WalkStep step(static_cast<I_Array*>(this));
                 C_SmartPtr<IImp_ZYRArray> copy(new IImp_ZYRArray, false);
                 for (size_t i = 0; i < elements_.size() && !err.errorOccurred(); ++i)
                     cloneValue(elements_[i], err, [&](const CZYRValue& v) {

@@ -150,6 +150,19 @@ void TerminateErrorStk() {
         std::exchange(processStack, nullptr)->~IImp_ZYRErrorStk();
 }
 
+namespace detail {
+
+void reportUniqueToProcessStack(const sZYRErrorInfo& info) {
+    // Under the lock that TerminateErrorStk takes: the out-of-memory notice comes from any
+    // thread at any time, also while the host is shutting the stack down.
+    std::lock_guard lock(processStackMutex);
+    if (!processStack)
+        processStack = ::new (processStackStorage) IImp_ZYRErrorStk;
+    processStack->reportUniqueError(info);
+}
+
+} // namespace detail
+
 CZYRErrorStk::CZYRErrorStk() : impl_(nullptr) {
     C_Error err;
     impl_ = createErrorStk(err);

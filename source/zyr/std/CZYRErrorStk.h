@@ -38,4 +38,10 @@ private:
 // A record ready to report: the code and at most 1024 units of `message`.
 ZYRSTD_API sZYRErrorInfo ZYRMakeErrorInfo(short errorCode, const char16_t* message);
 
+namespace detail {
+// Reports `info` once on the process-wide stack (created when needed), holding the stack's
+// lock throughout so that TerminateErrorStk cannot destroy it meanwhile. Not exported.
+void reportUniqueToProcessStack(const sZYRErrorInfo& info);
+} // namespace detail
+
 } // namespace ZYRStd

@@ -139,9 +139,7 @@ CZYRStreamFilterASCII85Decode::~CZYRStreamFilterASCII85Decode() = default;
 [[noreturn]] void CZYRStreamFilterASCII85Decode::fail(const char* what, int character,
                                                       unsigned long long offset, int line) {
     failure_ = {what, character, offset, line};
-    // Lives until the next decoding error of this filter on the same thread.
-    thread_local char text[160];
-    failure_.raise(text, "ASCII85Decode", kSource);
+    failure_.raise(kSource);
 }
 
 void CZYRStreamFilterASCII85Decode::emit(uint32_t value, unsigned int bytes) {
@@ -162,7 +160,7 @@ void CZYRStreamFilterASCII85Decode::digit(unsigned int value, unsigned long long
     value_ = value_ * 85 + value;
     if (++digits_ == 5) {
         if (value_ > 0xFFFFFFFFull)
-            fail("group out of range", -1, groupOffset_, __LINE__);
+            fail("ASCII85Decode: group out of range", -1, groupOffset_, __LINE__);
         emit(static_cast<uint32_t>(value_), 4);
         value_ = 0;
         digits_ = 0;
@@ -176,14 +174,14 @@ void CZYRStreamFilterASCII85Decode::finish(unsigned long long offset) {
         digit('<' - '!', offset - 1);
     }
     if (digits_ == 1)
-        fail("final group of one character", -1, groupOffset_, __LINE__);
+        fail("ASCII85Decode: final group of one character", -1, groupOffset_, __LINE__);
     if (digits_ > 1) {
         // Missing digits count as the highest digit, 'u'; k digits give k - 1 bytes.
         const unsigned int bytes = digits_ - 1;
         for (unsigned int i = digits_; i < 5; ++i)
             value_ = value_ * 85 + 84;
         if (value_ > 0xFFFFFFFFull)
-            fail("group out of range", -1, groupOffset_, __LINE__);
+            fail("ASCII85Decode: group out of range", -1, groupOffset_, __LINE__);
         emit(static_cast<uint32_t>(value_), bytes);
         value_ = 0;
         digits_ = 0;
@@ -196,7 +194,7 @@ void CZYRStreamFilterASCII85Decode::consume(unsigned char c, unsigned long long 
         if (isWhite(c))
             return;
         if (c != '>')
-            fail("'~' not followed by '>'", -1, tildeOffset_, __LINE__);
+            fail("ASCII85Decode: '~' not followed by '>'", -1, tildeOffset_, __LINE__);
         finish(offset);
         return;
     }
@@ -220,13 +218,13 @@ void CZYRStreamFilterASCII85Decode::consume(unsigned char c, unsigned long long 
         digit(c - '!', offset);
     } else if (c == 'z') {
         if (digits_ != 0)
-            fail("'z' inside a group", -1, offset, __LINE__);
+            fail("ASCII85Decode: 'z' inside a group", -1, offset, __LINE__);
         emit(0, 4);
     } else if (c == '~') {
         sawTilde_ = true;
         tildeOffset_ = offset;
     } else if (!isWhite(c)) {
-        fail("invalid character", c, offset, __LINE__);
+        fail("ASCII85Decode: invalid character", c, offset, __LINE__);
     }
 }
 
@@ -246,7 +244,7 @@ unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, u
     while (destRoom_ > 0 && !done_) {
         if (input_.pos == input_.length && !input_.fill()) {
             if (sawTilde_)
-                fail("'~' not followed by '>'", -1, tildeOffset_, __LINE__);
+                fail("ASCII85Decode: '~' not followed by '>'", -1, tildeOffset_, __LINE__);
             finish(input_.offset);
             break;
         }
@@ -265,6 +263,8 @@ unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, u
 
 unsigned int CZYRStreamFilterASCII85Decode::read(void* buf, unsigned int size, unsigned int count,
                                                  ZYRPublic::I_Error& err) {
+    if (err.errorOccurred())
+        return 0; // a decoder's status that already failed reads nothing
     return StreamsFilterCommon::recordingErrors(err, "CZYRStreamFilterASCII85Decode::read - failed",
                                                 kSource, __LINE__,
                                                 [&] { return read(buf, size, count); });

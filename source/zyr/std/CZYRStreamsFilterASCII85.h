@@ -29,8 +29,8 @@ public:
     // Encodes size * count bytes and returns that number. A failing target write drops
     // the target; every later write raises kZYRErrorFileOpFailed.
     unsigned int write(const void* buf, unsigned int size, unsigned int count);
-    // The same, recording any failure in `err` and returning 0; a status that already
-    // holds an error makes it a no-op.
+    // The same, recording any failure in `err` and returning 0; it encodes also when `err`
+    // already holds an error.
     unsigned int write(const void* buf, unsigned int size, unsigned int count,
                        ZYRPublic::I_Error& err);
     // Encodes the last partial group, writes the end marker and the last line, and drops
@@ -56,8 +56,8 @@ private:
 // space is ignored, "z" stands for four zero bytes between groups, a final partial group
 // of 2 to 4 characters gives 1 to 3 bytes, "~>" ends the data (so does the end of the
 // source) and a leading "<~" (Adobe's framing) is skipped. Anything else raises
-// kZYRErrorInvalidData naming the filter and the offset in the encoded data; the message
-// stays valid until the next decoding error on the same thread.
+// kZYRErrorInvalidData with a literal text naming the filter and the fault; the offset in the
+// encoded data and the offending byte are kept by the filter.
 class ZYRSTD_API CZYRStreamFilterASCII85Decode : public CZYRClientBase {
 public:
     explicit CZYRStreamFilterASCII85Decode(
@@ -76,6 +76,10 @@ public:
 
     const char* getFilterName() const { return "ASCII85Decode"; }
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return input_.source; }
+    // After a decoding error: its offset in the encoded data, and the offending byte (-1
+    // when the fault is not one byte's).
+    unsigned long long getFailureOffset() const { return failure_.offset; }
+    int getFailureCharacter() const { return failure_.character; }
 
 private:
     void consume(unsigned char c, unsigned long long offset);

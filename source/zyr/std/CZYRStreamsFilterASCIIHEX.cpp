@@ -149,10 +149,8 @@ CZYRStreamFilterASCIIHEXDecode::~CZYRStreamFilterASCIIHEXDecode() = default;
 
 [[noreturn]] void CZYRStreamFilterASCIIHEXDecode::fail(int character, unsigned long long offset,
                                                        int line) {
-    failure_ = {"invalid character", character, offset, line};
-    // Lives until the next decoding error of this filter on the same thread.
-    thread_local char text[128];
-    failure_.raise(text, "ASCIIHexDecode", kSource);
+    failure_ = {"ASCIIHexDecode: invalid character", character, offset, line};
+    failure_.raise(kSource);
 }
 
 unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size,
@@ -204,6 +202,8 @@ unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size,
 
 unsigned int CZYRStreamFilterASCIIHEXDecode::read(void* buf, unsigned int size, unsigned int count,
                                                   ZYRPublic::I_Error& err) {
+    if (err.errorOccurred())
+        return 0; // a decoder's status that already failed reads nothing
     return StreamsFilterCommon::recordingErrors(
         err, "CZYRStreamFilterASCIIHEXDecode::read - failed", kSource, __LINE__,
         [&] { return read(buf, size, count); });

@@ -27,8 +27,8 @@ public:
     // Encodes size * count bytes and returns that number. A failing target write drops
     // the target; every later write raises kZYRErrorFileOpFailed.
     unsigned int write(const void* buf, unsigned int size, unsigned int count);
-    // The same, recording any failure in `err` and returning 0; a status that already
-    // holds an error makes it a no-op.
+    // The same, recording any failure in `err` and returning 0; it encodes also when `err`
+    // already holds an error.
     unsigned int write(const void* buf, unsigned int size, unsigned int count,
                        ZYRPublic::I_Error& err);
     // Writes the end marker and the last line (also when no byte was written) and drops
@@ -50,8 +50,8 @@ private:
 // Reads ASCIIHex text (ISO 32000-1, 7.4.3) from a stream and gives back the bytes. White
 // space is ignored, digits of either case pair up into bytes, ">" ends the data (so does
 // the end of the source) and an odd last digit counts as followed by 0. Anything else
-// raises kZYRErrorInvalidData naming the filter and the offset in the encoded data; the
-// message stays valid until the next decoding error on the same thread.
+// raises kZYRErrorInvalidData with a literal text naming the filter and the fault; the
+// offset in the encoded data and the offending byte are kept by the filter.
 class ZYRSTD_API CZYRStreamFilterASCIIHEXDecode : public CZYRClientBase {
 public:
     explicit CZYRStreamFilterASCIIHEXDecode(
@@ -69,6 +69,10 @@ public:
 
     const char* getFilterName() const { return "ASCIIHexDecode"; }
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return input_.source; }
+    // After a decoding error: its offset in the encoded data, and the offending byte (-1
+    // when the fault is not one byte's).
+    unsigned long long getFailureOffset() const { return failure_.offset; }
+    int getFailureCharacter() const { return failure_.character; }
 
 private:
     [[noreturn]] void fail(int character, unsigned long long offset, int line);

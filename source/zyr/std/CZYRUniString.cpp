@@ -53,18 +53,30 @@ bool wellFormedUtf16(const char16_t* text, size_t length) {
     return true;
 }
 
+// ICU marks a string it could not build (an unknown converter name, its own allocation
+// failing) as bogus, with no buffer at all; such a text is the empty text, so that every
+// string has code units to compare.
+icu::UnicodeString usable(icu::UnicodeString text) {
+    if (text.isBogus())
+        return {};
+    return text;
+}
+
 // ASCII bytes map one to one onto code units; ICU's converter gives the same text, so the
 // common case skips opening a converter.
 icu::UnicodeString decode(const char* text, size_t length, const char* encoding) {
     if (isAsciiName(encoding) && allAscii(text, length)) {
         icu::UnicodeString out;
         char16_t* units = out.getBuffer(static_cast<int32_t>(length));
+        if (!units) // ICU's own allocation failed
+            throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory,
+                            "Out of memory in IImp_ZYRUniString constructor", kSource, __LINE__);
         for (size_t i = 0; i < length; ++i)
             units[i] = static_cast<unsigned char>(text[i]);
         out.releaseBuffer(static_cast<int32_t>(length));
         return out;
     }
-    return icu::UnicodeString(text, static_cast<int32_t>(length), encoding);
+    return usable(icu::UnicodeString(text, static_cast<int32_t>(length), encoding));
 }
 
 size_t unitLength(const char16_t* text) {
@@ -92,11 +104,18 @@ public:
         ZYRErrorBoundaryVoid(err, "Error in IImp_ZYRUniString constructor", kSource, __LINE__, [&] {
             id_ = createUniqueID();
             const size_t n = unitLength(text);
-            if (wellFormedUtf16(text, n))
+            if (wellFormedUtf16(text, n)) {
                 text_.setTo(text, static_cast<int32_t>(n));
-            else
-                text_ = icu::UnicodeString(reinterpret_cast<const char*>(text),
-                                           static_cast<int32_t>(n * 2), "UTF-16LE");
+                if (text_.isBogus()) {
+                    text_ = icu::UnicodeString();
+                    throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory,
+                                    "Out of memory in IImp_ZYRUniString constructor", kSource,
+                                    __LINE__);
+                }
+            } else {
+                text_ = usable(icu::UnicodeString(reinterpret_cast<const char*>(text),
+                                                  static_cast<int32_t>(n * 2), "UTF-16LE"));
+            }
         });
     }
     // A copy with a new identity, for concatenation.
@@ -141,7 +160,8 @@ public:
         unsigned int otherBytes = 0;
         const char* otherData = other->getUTF16LEBuffer(&otherBytes);
         const unsigned int bytes = byteLength();
-        const int order = std::memcmp(data(), otherData, std::min(bytes, otherBytes));
+        const unsigned int common = std::min(bytes, otherBytes);
+        const int order = common == 0 ? 0 : std::memcmp(data(), otherData, common);
         return order != 0 ? order < 0 : bytes < otherBytes;
     }
 
@@ -152,7 +172,8 @@ public:
             return true;
         unsigned int otherBytes = 0;
         const char* otherData = other->getUTF16LEBuffer(&otherBytes);
-        return otherBytes == byteLength() && std::memcmp(data(), otherData, otherBytes) == 0;
+        return otherBytes == byteLength() &&
+               (otherBytes == 0 || std::memcmp(data(), otherData, otherBytes) == 0);
     }
 
     uint32_t hashCode() const override { return static_cast<uint32_t>(text_.hashCode()); }
@@ -168,14 +189,18 @@ public:
         return ZYRErrorBoundary<I_UniString*>(
             err, nullptr, "Error in IImp_ZYRUniString::concat", kSource, __LINE__,
             [&]() -> I_UniString* {
-                auto* joined = new IImp_ZYRUniString(text_);
+                CZYRSmartZYRRefPtr<IImp_ZYRUniString> joined(new IImp_ZYRUniString(text_));
                 if (other) {
                     unsigned int bytes = 0;
                     const char* units = other->getUTF16LEBuffer(&bytes);
                     joined->text_.append(reinterpret_cast<const char16_t*>(units), 0,
                                          static_cast<int32_t>(bytes / 2));
                 }
-                return joined;
+                if (joined->text_.isBogus()) // ICU could not grow the text
+                    throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory,
+                                    "Out of memory in IImp_ZYRUniString::concat", kSource,
+                                    __LINE__);
+                return joined.detach();
             });
     }
 

@@ -442,6 +442,7 @@ void RegisterFlushableMemoryClient(I_FlushableMemoryClient* client, bool threadS
         return;
     detail::FlushRegistry& registry = detail::flushRegistry();
     std::lock_guard lock(registry.mutex);
+    std::lock_guard listLock(registry.listMutex);
     registry.main.push_back(client);
     if (threadSafe)
         registry.threadSafe.push_back(client);
@@ -452,6 +453,7 @@ void UnregisterFlushableMemoryClient(I_FlushableMemoryClient* client) {
         return;
     detail::FlushRegistry& registry = detail::flushRegistry();
     std::lock_guard lock(registry.mutex);
+    std::lock_guard listLock(registry.listMutex);
     for (auto* list : {&registry.main, &registry.threadSafe}) {
         const auto found = std::find(list->begin(), list->end(), client);
         if (found != list->end())
@@ -463,9 +465,10 @@ void GetClientsMemoryUsedAndMemoryLimit(unsigned long long& flushable, unsigned 
                                         unsigned long long& used) {
     flushable = 0;
     {
-        // Walked under the registry lock: another thread may be registering meanwhile.
+        // Under the list lock only: another thread may be registering meanwhile, and a flush
+        // in progress holds the registry lock for as long as its clients take.
         detail::FlushRegistry& registry = detail::flushRegistry();
-        std::lock_guard lock(registry.mutex);
+        std::lock_guard lock(registry.listMutex);
         for (I_FlushableMemoryClient* client : registry.main)
             flushable += client->getFlushableMemorySize();
     }

@@ -20,6 +20,7 @@ constexpr size_t kPathBufferSize = 260;
 struct ClientStat {
     uint32_t current = 0;
     uint32_t peak = 0;
+    bool hasPeak = false; // a name that was only ever decremented has no peak to report
 };
 
 struct DMMLog {
@@ -59,6 +60,8 @@ void dmmLogClose() {
     {
         std::lock_guard statLock(log.statMutex);
         for (const auto& [name, stat] : log.stats) {
+            if (!stat.hasPeak)
+                continue;
             char line[1024];
             std::snprintf(line, sizeof line, "Client = %s Peak Memory Usage = %u \n", name.c_str(),
                           stat.peak);
@@ -102,9 +105,10 @@ void dmmStatUpdate(const char* name, uint32_t bytes, bool add) {
     const auto found = log.stats.find(key);
     if (found == log.stats.end()) {
         ClientStat& stat = log.stats[key];
-        if (add)
+        if (add) {
             stat.current = stat.peak = bytes;
-        else
+            stat.hasPeak = true;
+        } else
             stat.current -= bytes; // unsigned: an unknown name starts from 0
         return;
     }
@@ -112,6 +116,7 @@ void dmmStatUpdate(const char* name, uint32_t bytes, bool add) {
     if (add) {
         stat.current += bytes;
         stat.peak = std::max(stat.peak, stat.current);
+        stat.hasPeak = true;
     } else {
         stat.current -= bytes;
     }
@@ -124,6 +129,7 @@ void dmmStatUpdateMax(const char* name, uint32_t bytes) {
     std::lock_guard lock(log.statMutex);
     ClientStat& stat = log.stats[name ? name : ""];
     stat.peak = std::max(stat.peak, bytes);
+    stat.hasPeak = true;
 }
 
 uint32_t dmmStatPeak(const char* name) {

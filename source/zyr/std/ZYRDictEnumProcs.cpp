@@ -25,6 +25,31 @@ template <class Write> bool ZYRDictEnumProcs::entry(I_UniString*, Write write) {
     }
 }
 
+ZYRDictEnumProcs ZYRDictEnumProcs::nested(const void* container) const {
+    ZYRDictEnumProcs inner(out_, depth_ == 0 ? 0 : depth_ - 1, indent_ + 1);
+    inner.parent_ = this;
+    inner.container_ = container;
+    inner.level_ = level_ + 1;
+    return inner;
+}
+
+// A container that holds itself, directly or further down, would be walked for ever: it is
+// printed once and its reappearance marked. The walk goes at most kMaxNesting levels deep,
+// so deeply nested input cannot exhaust the stack.
+bool ZYRDictEnumProcs::refuseToDescend(const void* container) {
+    for (const ZYRDictEnumProcs* walk = this; walk; walk = walk->parent_) {
+        if (walk->container_ == container) {
+            out_ << "<cycle>" << std::endl;
+            return true;
+        }
+    }
+    if (level_ + 1 > kMaxNesting) {
+        out_ << "..." << std::endl;
+        return true;
+    }
+    return false;
+}
+
 void ZYRDictEnumProcs::printIndent() {
     for (unsigned int i = 0; i < indent_; ++i)
         out_ << '\t';
@@ -111,8 +136,10 @@ void ZYRDictEnumProcs::printArrayContents(ZYRDictEnumProcs* procs, I_Array* arra
             if (array->get(i, &value, local)) {
                 const CZYRDict dict(value, false);
                 head();
+                if (value && procs->refuseToDescend(value))
+                    break;
                 out_ << "[ZYRDict]" << std::endl;
-                ZYRDictEnumProcs inner = procs->nested();
+                ZYRDictEnumProcs inner = procs->nested(value);
                 if (value)
                     value->enumerate(&inner, local);
             }
@@ -123,7 +150,9 @@ void ZYRDictEnumProcs::printArrayContents(ZYRDictEnumProcs* procs, I_Array* arra
             if (array->get(i, &value, local)) {
                 const CZYRArray nestedArray(value, false);
                 head();
-                ZYRDictEnumProcs inner = procs->nested();
+                if (value && procs->refuseToDescend(value))
+                    break;
+                ZYRDictEnumProcs inner = procs->nested(value);
                 printArrayContents(&inner, value, local);
             }
             break;
@@ -152,8 +181,11 @@ bool ZYRDictEnumProcs::enumProc(I_UniString* key, ZYRPublic::I_DataBuffer* value
 bool ZYRDictEnumProcs::enumProc(I_UniString* key, I_Array* value, I_Error& err) {
     return entry(key, [&] {
         printKey(key, err);
-        out_ << " [ZYRArray]: " << std::endl;
-        ZYRDictEnumProcs inner = nested();
+        out_ << " [ZYRArray]: ";
+        if (value && refuseToDescend(value))
+            return;
+        out_ << std::endl;
+        ZYRDictEnumProcs inner = nested(value);
         printArrayContents(&inner, value, err);
     });
 }
@@ -161,8 +193,11 @@ bool ZYRDictEnumProcs::enumProc(I_UniString* key, I_Array* value, I_Error& err) 
 bool ZYRDictEnumProcs::enumProc(I_UniString* key, I_Dict* value, I_Error& err) {
     return entry(key, [&] {
         printKey(key, err);
-        out_ << " [ZYRDict]: " << std::endl;
-        ZYRDictEnumProcs inner = nested();
+        out_ << " [ZYRDict]: ";
+        if (value && refuseToDescend(value))
+            return;
+        out_ << std::endl;
+        ZYRDictEnumProcs inner = nested(value);
         if (value)
             value->enumerate(&inner, err);
     });

@@ -27,9 +27,16 @@ public:
     bool enumProc(I_UniString* key, unsigned int value, I_Error& err) override;
     bool enumProc(I_UniString* key, int32_t value, I_Error& err) override;
 
+    // Containers nested deeper than this below the printed one are shown as "...".
+    static constexpr unsigned int kMaxNesting = 256;
+
 private:
     template <class Write> bool entry(I_UniString* key, Write write);
-    ZYRDictEnumProcs nested() const { return ZYRDictEnumProcs(out_, depth_ - 1, indent_ + 1); }
+    // The callbacks for `container`, one level further in (the depth never wraps below 0).
+    ZYRDictEnumProcs nested(const void* container) const;
+    // Writes "<cycle>" or "..." in place of `container` when it must not be walked; true
+    // when it was written.
+    bool refuseToDescend(const void* container);
     void printKey(I_UniString* text, I_Error& err);
     void printIndent();
     void printArrayContents(ZYRDictEnumProcs* procs, I_Array* array, I_Error& err);
@@ -38,6 +45,11 @@ private:
     unsigned int depth_;
     unsigned int indent_;
     std::ostringstream& out_;
+    // The walk so far: the callbacks one level out and the container these ones walk (both
+    // null for the outermost), and how many containers deep this is.
+    const ZYRDictEnumProcs* parent_ = nullptr;
+    const void* container_ = nullptr;
+    unsigned int level_ = 0;
 };
 
 // Copies every entry it is shown into the target dictionary (objects shared).

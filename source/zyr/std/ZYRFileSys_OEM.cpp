@@ -2,6 +2,7 @@
 #include "zyr/std/ZYRFileSys_OEM.h"
 
 #include <cstring>
+#include <memory>
 
 #include "zyr/std/CZYRError.h"
 
@@ -53,25 +54,45 @@ CFile::CFile(void* diPath, unsigned int mode, ZYRPublic::_t_ZYRPDLFileSysRec* re
         freeDIPath();
         missing("diPathFromPath proc not defined", __LINE__);
     }
+    // The host's path texts go back to it also when making the string fails.
+    const auto hostFree = [this](void* text) {
+        if (text && record_->free)
+            record_->free(text);
+    };
     try {
         if (record_->diPathToWPath) {
-            char16_t* text = record_->diPathToWPath(diPath_, 0);
-            if (text) {
-                path_ = ZYRStd::CZYRUniString(text);
-                if (record_->free)
-                    record_->free(text);
-            }
+            const std::unique_ptr<char16_t, decltype(hostFree)> text(
+                record_->diPathToWPath(diPath_, 0), hostFree);
+            if (text)
+                path_ = ZYRStd::CZYRUniString(text.get());
         } else {
-            char* text = record_->diPathToPath(diPath_, 0);
-            if (text) {
-                path_ = ZYRStd::CZYRUniString(text, static_cast<unsigned int>(std::strlen(text)),
-                                              "UTF-8");
-                if (record_->free)
-                    record_->free(text);
-            }
+            const std::unique_ptr<char, decltype(hostFree)> text(record_->diPathToPath(diPath_, 0),
+                                                                 hostFree);
+            if (text)
+                path_ = ZYRStd::CZYRUniString(
+                    text.get(), static_cast<unsigned int>(std::strlen(text.get())), "UTF-8");
         }
     } catch (...) {
         freeDIPath();
+        throw;
+    }
+}
+
+std::unique_ptr<ZYRFileSys::IFile> CFile::create(void* diPath, unsigned int mode,
+                                                 ZYRPublic::_t_ZYRPDLFileSysRec* record) {
+    void* storage = nullptr;
+    try {
+        storage = CFile::operator new(sizeof(CFile));
+    } catch (...) {
+        // No object to take the path over: it goes back to the host here.
+        if (diPath && record && record->free)
+            record->free(diPath);
+        throw;
+    }
+    try {
+        return std::unique_ptr<ZYRFileSys::IFile>(::new (storage) CFile(diPath, mode, record));
+    } catch (...) {
+        CFile::operator delete(storage); // the constructor has freed the path
         throw;
     }
 }

@@ -1,6 +1,8 @@
 // A file through the host's procedure record, for files the host names by its own paths.
 #pragma once
 
+#include <memory>
+
 #include "IZYRFileSys.h"
 #include "ZYRPDLFileSysRec.h"
 #include "zyr/std/CZYRClientBase.h"
@@ -15,6 +17,10 @@ public:
     // Takes over `diPath` and frees it with the record's free procedure, also when the
     // construction fails.
     CFile(void* diPath, unsigned int mode, ZYRPublic::_t_ZYRPDLFileSysRec* record);
+    // The same on the library's heap, taking over `diPath` also when the file object itself
+    // cannot be allocated.
+    static std::unique_ptr<ZYRFileSys::IFile> create(void* diPath, unsigned int mode,
+                                                     ZYRPublic::_t_ZYRPDLFileSysRec* record);
     CFile(const CFile&) = delete;
     CFile& operator=(const CFile&) = delete;
     ~CFile() override; // closes (errors dropped) and frees the DI path

@@ -16,6 +16,7 @@
 #include "zyr/std/CZYRMemBuffer.h"
 #include "zyr/std/ZYRFileSys_OEM.h"
 #include "zyr/std/ZYRFileSys_helper.h"
+#include "zyr/std/ZYRPosixIO.h"
 
 namespace ZYRPosixFileSys {
 
@@ -87,21 +88,10 @@ int openRetrying(const char* path, int flags, mode_t mode = 0) {
 }
 
 bool writeAll(int fd, const unsigned char* p, size_t n) {
-    while (n > 0) {
-        const ssize_t put = ::write(fd, p, n);
-        if (put < 0) {
-            if (errno == EINTR)
-                continue;
-            return false;
-        }
-        if (put == 0) {
-            errno = EIO;
-            return false;
-        }
-        p += put;
-        n -= static_cast<size_t>(put);
-    }
-    return true;
+    const ZYRStd::posixio::Transfer t = ZYRStd::posixio::writeFully(fd, p, n);
+    if (t.error != 0)
+        errno = t.error;
+    return t.error == 0;
 }
 
 CZYRString nativePathOf(IZYRFileName* name) {
@@ -240,21 +230,13 @@ unsigned long long CFile::setEOF() {
 }
 
 unsigned int CFile::read(void* buf, unsigned int bytes) {
-    auto* p = static_cast<unsigned char*>(buf);
-    unsigned int done = 0;
     // A short read is the end of the file, so keep going until it says so.
-    while (done < bytes) {
-        const ssize_t got = ::read(fd_, p + done, bytes - done);
-        if (got < 0) {
-            if (errno == EINTR)
-                continue;
-            raise("error reading from file", __LINE__);
-        }
-        if (got == 0)
-            break;
-        done += static_cast<unsigned int>(got);
+    const ZYRStd::posixio::Transfer t = ZYRStd::posixio::readFully(fd_, buf, bytes);
+    if (t.error != 0) {
+        errno = t.error;
+        raise("error reading from file", __LINE__);
     }
-    return done;
+    return static_cast<unsigned int>(t.done);
 }
 
 unsigned int CFile::write(const void* buf, unsigned int bytes) {
@@ -576,7 +558,7 @@ IImpZYRFileSys_Posix::~IImpZYRFileSys_Posix() = default;
 CZYRSmartZYRRefPtr<IZYRFStream> IImpZYRFileSys_Posix::hostStream(void* diPath, unsigned int mode) {
     std::unique_ptr<IFile> file;
     try {
-        file.reset(new ZYROEMFileSys::CFile(diPath, mode, record_));
+        file = ZYROEMFileSys::CFile::create(diPath, mode, record_);
     } catch (const CZYRError&) {
         // A stream without a file: isOpen is false and every transfer fails.
     }

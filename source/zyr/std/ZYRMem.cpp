@@ -167,6 +167,22 @@ bool usageCheckOn() {
     return usageCheckCounter.load(std::memory_order_relaxed) >= 1;
 }
 
+// Reusing freed bytes leaves the total as it is, which passes the limit test only while the
+// total is within the limit: above it (check switched off and on again, or the limit lowered
+// below usage) every request takes the full test.
+bool mayReusePendingFrees() {
+    return totalUsage.load(std::memory_order_relaxed) <=
+               memLimitBytes.load(std::memory_order_relaxed) ||
+           !usageCheckOn();
+}
+
+// An entry of the allocation map: the serial for the leak report, and the requested size so
+// that the guard check can trust the header's size before reading the tail guard.
+struct AllocationEntry {
+    unsigned int serial;
+    uint32_t size; // 0 for virtual blocks, which carry no guards
+};
+
 struct Tracker {
     std::recursive_mutex mutex; // guards every field below
     unsigned int allocCount = 0;
@@ -174,8 +190,8 @@ struct Tracker {
     unsigned int freeCount = 0;
     unsigned int currentBytes = 0;
     unsigned int peakBytes = 0;
-    std::map<void*, unsigned int> allocations;   // block -> allocation serial
-    std::map<void*, unsigned int> virtualBlocks; // base -> stack identifier
+    std::map<void*, AllocationEntry> allocations; // block -> serial and requested size
+    std::map<void*, unsigned int> virtualBlocks;  // base -> stack identifier
     CZYRSmartPtr<IStackWalker> walker{IImpStackWalkerStub::create()};
     unsigned int breakAtSerial = ~0u;
 
@@ -202,14 +218,14 @@ bool debuggerAttached() {
 }
 
 // Caller holds the tracker mutex.
-void recordAllocLocked(Tracker& t, void* block, uint64_t bytes) {
+void recordAllocLocked(Tracker& t, void* block, uint64_t bytes, uint32_t requested) {
     t.currentBytes += static_cast<unsigned int>(bytes);
     t.allocCount += 1;
     t.peakBytes = std::max(t.peakBytes, t.currentBytes);
     if (t.allocCount == t.breakAtSerial && debuggerAttached())
         std::raise(SIGTRAP);
     if (statLevel >= 2 && block)
-        t.allocations[block] = t.allocCount;
+        t.allocations[block] = {t.allocCount, requested};
 }
 
 bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) {
@@ -238,7 +254,8 @@ void* plainAlloc(unsigned int size) {
     if (!block)
         return nullptr;
     const uint64_t accounted = round8(size);
-    if (!takePendingFrees(pendingFrees, accounted) && !detail::plainLimitTest(accounted, 0, true)) {
+    const bool reused = mayReusePendingFrees() && takePendingFrees(pendingFrees, accounted);
+    if (!reused && !detail::plainLimitTest(accounted, 0, true)) {
         host.freeProc(block, host.clientData);
         detail::sendOutOfMemoryNotice();
         return nullptr;
@@ -306,7 +323,7 @@ void* guardedAlloc(unsigned int size) {
     {
         std::lock_guard lock(t.mutex);
         if (trackerLimitTestLocked(t, accounted, 0)) {
-            recordAllocLocked(t, block, accounted);
+            recordAllocLocked(t, block, accounted, n);
             writeGuards(block, n);
             reinterpret_cast<GuardHeader*>(block)->stackId = t.walker->capture(10, 2, 32, n);
             return block + kGuardHeader;
@@ -361,6 +378,7 @@ void* guardedRealloc(void* p, unsigned int size) {
         if (statLevel >= 2) {
             if (auto node = t.allocations.extract(header)) {
                 node.key() = grown;
+                node.mapped().size = size;
                 t.allocations.insert(std::move(node));
             }
         }
@@ -440,18 +458,36 @@ void ZYRDbgCheckZYRMemAllocPtr(void* p) {
     // Plain blocks carry no guards: there is nothing to check, and nothing safe to read.
     if (!p || statLevel == 0)
         return;
+    const auto invalid = [] {
+        return CZYRError(ZYRPublic::kZYRErrorFatal, "ZYRCheckZYRMemAllocPtr:: ptr is invalid",
+                         kSource, 2012);
+    };
+    // The tail guard sits at the header's size: that size is read only once the head guard
+    // holds and, where the allocation map exists, once the map confirms it, so that a damaged
+    // block cannot send the check itself out of bounds.
     const GuardHeader* header = guardHeader(p);
+    if (header->headGuard != kGuardWord)
+        throw invalid();
+    if (statLevel >= 2) {
+        Tracker& t = tracker();
+        std::lock_guard lock(t.mutex);
+        const auto found = t.allocations.find(const_cast<GuardHeader*>(header));
+        if (found == t.allocations.end() || found->second.size != header->size)
+            throw invalid();
+    }
     uint32_t tail;
     std::memcpy(&tail, static_cast<unsigned char*>(p) + header->size, sizeof tail);
-    if (header->headGuard != kGuardWord || tail != kGuardWord)
-        throw CZYRError(ZYRPublic::kZYRErrorFatal, "ZYRCheckZYRMemAllocPtr:: ptr is invalid",
-                        kSource, 2012);
+    if (tail != kGuardWord)
+        throw invalid();
 }
 
 sZYRDbgMemState ZYRMemMgr_dbgMemState() {
     if (statLevel < 1)
         return {};
-    const Tracker& t = tracker();
+    // Under the tracker lock: other threads update the counters meanwhile, and the five
+    // must come from one moment.
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
     return {t.allocCount, t.reallocCount, t.freeCount, t.currentBytes, t.peakBytes};
 }
 
@@ -596,7 +632,9 @@ void plainUsageSub(uint64_t bytes) {
     totalUsage.fetch_sub(bytes, std::memory_order_relaxed);
 }
 uint64_t plainUsage() {
-    flushPendingFrees(pendingFrees); // the caller's own frees are always counted
+    // Every thread's pending frees go back first: a renderer thread that freed memory must
+    // show as a drop to the thread that asked it to catch up.
+    drainAllPendingFrees();
     return totalUsage.load(std::memory_order_relaxed);
 }
 
@@ -609,7 +647,7 @@ bool trackerLimitTest(uint64_t add, uint64_t sub) {
 void trackerRecordAlloc(void* block, uint64_t bytes) {
     Tracker& t = tracker();
     std::lock_guard lock(t.mutex);
-    recordAllocLocked(t, block, bytes);
+    recordAllocLocked(t, block, bytes, 0);
 }
 
 void trackerRecordFree(void* block, uint64_t bytes) {
@@ -662,8 +700,7 @@ void sendOutOfMemoryNotice() {
         return;
     sendingNotice = true;
     try {
-        CZYRErrorStk stack;
-        stack.reportUniqueError(
+        reportUniqueToProcessStack(
             ZYRMakeErrorInfo(static_cast<short>(0xFFFF), u"Insufficient Memory.\n"));
     } catch (...) {
         // The notice is advice; the caller already gets its null.
@@ -693,8 +730,8 @@ void dumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data) {
     std::lock_guard lock(t.mutex);
     if (statLevel >= 2) {
         std::map<unsigned int, void*> bySerial;
-        for (const auto& [block, serial] : t.allocations)
-            bySerial.emplace(serial, block);
+        for (const auto& [block, entry] : t.allocations)
+            bySerial.emplace(entry.serial, block);
         uint32_t largestSize = 0;
         uint32_t largestSerial = 0;
         for (const auto& [serial, block] : bySerial) {

@@ -100,14 +100,17 @@ unsigned int ZYRGetWorkerID() {
 }
 
 void ZYRStdInit_InitializeFlushableMemoryClientRegistry() {
-    auto& clients = detail::flushRegistry().main;
-    if (clients.capacity() < 8)
-        clients.reserve(8);
+    auto& registry = detail::flushRegistry();
+    std::lock_guard lock(registry.mutex);
+    std::lock_guard listLock(registry.listMutex);
+    if (registry.main.capacity() < 8)
+        registry.main.reserve(8);
 }
 
 void ZYRStdInit_TerminateFlushableMemoryClientRegistry() {
     auto& registry = detail::flushRegistry();
     std::lock_guard lock(registry.mutex);
+    std::lock_guard listLock(registry.listMutex);
     registry.main.clear();
 }
 

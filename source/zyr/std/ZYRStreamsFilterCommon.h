@@ -18,13 +18,12 @@
 namespace ZYRStd::StreamsFilterCommon {
 
 // Runs `call` (a read or a write), recording a failure in `err` and returning 0 instead of
-// throwing; a status that already holds an error makes it a no-op. `failed`, `source` and
-// `line` describe a failure that is not an error of the library.
+// throwing. The call runs whatever `err` already holds: an encoder's data must not be
+// dropped because of some earlier, unrelated failure. `failed`, `source` and `line`
+// describe a failure that is not an error of the library.
 template <class Call>
 unsigned int recordingErrors(ZYRPublic::I_Error& err, const char* failed, const char* source,
                              int line, Call&& call) {
-    if (err.errorOccurred())
-        return 0;
     try {
         return call();
     } catch (const CZYRError& e) {
@@ -150,21 +149,16 @@ struct DecodeInput {
 
 // A decoding failure, kept so that every later read raises it again.
 struct DecodeFailure {
-    const char* what = nullptr; // null: none
+    const char* what = nullptr; // "<filter>: <what>", a literal; null: none
     int character = -1;         // the offending byte, or -1
     unsigned long long offset = 0;
     int line = 0;
 
-    // Raises kZYRErrorInvalidData with "<filter>: <what>[ 0x<character>] at offset <offset>",
-    // formatted into `text`. Error texts are not owned by the errors that carry them, so
-    // `text` is the filter's thread-local buffer and lives until its next decoding error.
-    template <size_t N>
-    [[noreturn]] void raise(char (&text)[N], const char* filter, const char* source) const {
-        if (character >= 0)
-            std::snprintf(text, N, "%s: %s 0x%02X at offset %llu", filter, what, character, offset);
-        else
-            std::snprintf(text, N, "%s: %s at offset %llu", filter, what, offset);
-        throw CZYRError(ZYRPublic::kZYRErrorInvalidData, text, source, line);
+    // Raises kZYRErrorInvalidData with `what`. Errors do not own their texts and outlive
+    // the filter and its thread, so the text is a literal; the offending byte and the
+    // offset stay with the filter for its caller to ask.
+    [[noreturn]] void raise(const char* source) const {
+        throw CZYRError(ZYRPublic::kZYRErrorInvalidData, what, source, line);
     }
 };
 

@@ -66,10 +66,12 @@ uint64_t procField(const char* path, const std::string& key, uint64_t fallback) 
     return fallback;
 }
 
-uint64_t cgroupLimit() {
-    std::ifstream in("/sys/fs/cgroup/memory.max");
+// A limit file's value: a byte count, or "max" (no limit); none for anything else.
+uint64_t limitFileValue(const std::string& path) {
+    std::ifstream in(path);
     std::string text;
-    if (!(in >> text) || text == "max")
+    if (!(in >> text) || text.empty() || text == "max" ||
+        text.find_first_not_of("0123456789") != std::string::npos)
         return UINT64_MAX;
     try {
         return std::stoull(text);
@@ -78,7 +80,55 @@ uint64_t cgroupLimit() {
     }
 }
 
+// The smallest value of `file` in the cgroup at `path` below `root` and in each of its
+// ancestors: a parent's cap binds every group beneath it.
+uint64_t smallestAlongPath(const std::string& root, std::string path, const char* file) {
+    uint64_t smallest = UINT64_MAX;
+    for (;;) {
+        while (!path.empty() && path.back() == '/')
+            path.pop_back();
+        smallest = std::min(smallest, limitFileValue(root + path + "/" + file));
+        if (path.empty())
+            return smallest;
+        path.erase(path.rfind('/') == std::string::npos ? 0 : path.rfind('/'));
+    }
+}
+
 } // namespace
+
+namespace detail {
+
+uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup, const std::string& cgroupRoot) {
+    std::ifstream in(procSelfCgroup);
+    if (!in)
+        return limitFileValue(cgroupRoot + "/memory.max");
+    std::string line;
+    std::string unifiedPath;
+    bool unified = false;
+    // Lines are "hierarchy:controllers:path"; version 2 has the one line "0::path".
+    while (std::getline(in, line)) {
+        const size_t first = line.find(':');
+        const size_t second = first == std::string::npos ? first : line.find(':', first + 1);
+        if (second == std::string::npos)
+            continue;
+        const std::string controllers = line.substr(first + 1, second - first - 1);
+        const std::string path = line.substr(second + 1);
+        if (line.compare(0, first, "0") == 0 && controllers.empty()) {
+            unified = true;
+            unifiedPath = path;
+            continue;
+        }
+        std::istringstream names(controllers);
+        for (std::string name; std::getline(names, name, ',');)
+            if (name == "memory") // version 1 (also in a hybrid layout): its own hierarchy
+                return smallestAlongPath(cgroupRoot + "/memory", path, "memory.limit_in_bytes");
+    }
+    if (unified)
+        return smallestAlongPath(cgroupRoot, unifiedPath, "memory.max");
+    return UINT64_MAX;
+}
+
+} // namespace detail
 
 void* VirtualMemAlloc(unsigned int size) {
     if (size == 0)
@@ -205,7 +255,8 @@ void VirtualMemStatus(tZYRVirtualMemoryInfo* info) {
     uint64_t totalVirtual = totalPhys + swapTotal;
     if (::getrlimit(RLIMIT_AS, &addressSpace) == 0 && addressSpace.rlim_cur != RLIM_INFINITY)
         totalVirtual = std::min<uint64_t>(totalVirtual, addressSpace.rlim_cur);
-    totalVirtual = std::min(totalVirtual, cgroupLimit());
+    totalVirtual =
+        std::min(totalVirtual, detail::cgroupMemoryLimit("/proc/self/cgroup", "/sys/fs/cgroup"));
     const uint64_t vmSize = procField("/proc/self/status", "VmSize", 0);
     const uint64_t availVirtual = totalVirtual > vmSize ? totalVirtual - vmSize : 0;
     const uint64_t availPageFile = availPhys + swapFree;

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 
 #include "ZYRStdExport.h"
 
@@ -23,5 +24,14 @@ ZYRSTD_API void VirtualMemDecommit(void* base, void* addr, unsigned int size);
 ZYRSTD_API unsigned int VirtualMemAllocUnitSize();
 ZYRSTD_API unsigned int GetPageSize();
 ZYRSTD_API void VirtualMemStatus(tZYRVirtualMemoryInfo* info);
+
+namespace detail {
+// The memory cap of this process's own cgroup, UINT64_MAX for none: `procSelfCgroup` is
+// read as /proc/self/cgroup and the groups are found under `cgroupRoot` (/sys/fs/cgroup).
+// Version 2: the smallest memory.max along the group's path; version 1: the smallest
+// memory.limit_in_bytes along its memory group's path. Exported for the tests only.
+ZYRSTD_API uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup,
+                                      const std::string& cgroupRoot);
+} // namespace detail
 
 } // namespace ZYRStd
