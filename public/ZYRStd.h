@@ -57,6 +57,7 @@
 #include "zyr/std/ZYRDictEnumProcs.h"
 #include "zyr/std/ZYRFixed.h"
 #include "zyr/std/ZYRMem.h"
+#include "zyr/std/ZYRMemReports.h"
 #include "zyr/std/ZYROEMInterfacesInternal.h"
 #include "zyr/std/ZYRPool.h"
 #include "zyr/std/ZYRResourceDirs.h"
