@@ -155,9 +155,9 @@ bool hasText(const sZYRTraceMsg* msg) {
 
 // One message part into the log (or standard output while it is closed): `head`, the
 // message text, an optional line break and `tail`, in one write under the log mutex, then
-// flushed. Wide texts take the path form only in the log file.
-void writePart(std::string_view head, const sZYRTraceMsg& msg, bool lineBreak,
-               std::string_view tail) {
+// flushed. Wide texts take the path form only in the log file. `head` is the caller's
+// scratch text and is used up.
+void writePart(std::string& head, const sZYRTraceMsg& msg, bool lineBreak, std::string_view tail) {
     std::string wideInFile;
     std::string wideOnScreen;
     if (!msg.text) {
@@ -167,14 +167,22 @@ void writePart(std::string_view head, const sZYRTraceMsg& msg, bool lineBreak,
     TraceLog& log = traceLog();
     ZYRStd::mutex::scoped_lock lock(log.mutex);
     FILE* out = log.file ? log.file : stdout;
-    const std::string_view text =
-        msg.text ? std::string_view(msg.text) : (log.file ? wideInFile : wideOnScreen);
-    std::fwrite(head.data(), 1, head.size(), out);
-    std::fwrite(text.data(), 1, text.size(), out);
+    if (msg.text)
+        head += msg.text;
+    else
+        head += log.file ? wideInFile : wideOnScreen;
     if (lineBreak)
-        std::fputc('\n', out);
-    std::fwrite(tail.data(), 1, tail.size(), out);
+        head += '\n';
+    head += tail;
+    std::fwrite(head.data(), 1, head.size(), out);
     std::fflush(out);
+}
+
+// Per-thread scratch text for message parts, so that writing allocates nothing once warm.
+std::string& scratch() {
+    thread_local std::string text;
+    text.clear();
+    return text;
 }
 
 void writeMarker(std::string_view marker) {
@@ -186,12 +194,10 @@ void writeMarker(std::string_view marker) {
 }
 
 // "<ZYRTrace> Job 7 L2 [1.50000000 sec] [C:Render/Bands] [F:band/12] " and a line break.
-std::string formatHead(int32_t jobNumber, const CZYRUniString& area, const CZYRUniString& category,
-                       const sZYRTraceMsgDetail* detail) {
+std::string& formatHead(std::string& head, int32_t jobNumber, const CZYRUniString& area,
+                        const CZYRUniString& category, const sZYRTraceMsgDetail* detail) {
     const sZYRTraceMsgDetail none{0, nullptr, 0, nullptr, 0, 0};
     const sZYRTraceMsgDetail& d = detail ? *detail : none;
-    std::string head;
-    head.reserve(128);
     char number[96];
     std::snprintf(number, sizeof number, "<ZYRTrace> Job %d L%d [%#.9g sec] [C:", jobNumber,
                   d.level, d.clockTicks / 1000.0);
@@ -340,8 +346,8 @@ void CZYRProgressInterface::TraceMsg(int32_t jobNumber, I_Job*, I_Surface*,
                          kWriterTraceMsgLine, [&] {
                              if (!hasText(msg))
                                  return;
-                             writePart(formatHead(jobNumber, area, category, detail), *msg, true,
-                                       {});
+                             writePart(formatHead(scratch(), jobNumber, area, category, detail),
+                                       *msg, true, {});
                          });
 }
 
@@ -353,8 +359,8 @@ void CZYRProgressInterface::beginTraceMsg(int32_t jobNumber, I_Job*, I_Surface*,
                          kWriterSource, kWriterBeginLine, [&] {
                              if (!hasText(msg))
                                  return;
-                             writePart(formatHead(jobNumber, area, category, detail), *msg, true,
-                                       "<<\n");
+                             writePart(formatHead(scratch(), jobNumber, area, category, detail),
+                                       *msg, true, "<<\n");
                          });
 }
 
@@ -362,7 +368,7 @@ void CZYRProgressInterface::traceMsg(const sZYRTraceMsg* msg, I_Error& err) {
     ZYRErrorBoundaryVoid(err, "Unknown exception in CZYRProgressInterface::traceMsg", kWriterSource,
                          kWriterContinuationLine, [&] {
                              if (hasText(msg))
-                                 writePart({}, *msg, true, {});
+                                 writePart(scratch(), *msg, true, {});
                          });
 }
 
@@ -451,20 +457,22 @@ void CZYRTraceMsg::internalInit() {
         if (!config && !global)
             return; // tracing is off for this job
 
-        if (global) {
-            if (isEmptyDict(config.get())) {
-                config = global;
-            } else {
-                // Merged into a copy: the job's own dictionary belongs to the host and may be
-                // finalised or read by other threads.
-                config = C_SmartPtr<I_Dict>(config->clone(err), false);
-                throwCZYRErrorIfErrorOccurred(err);
+        if (global && isEmptyDict(config.get())) {
+            config = global;
+        } else {
+            // A copy of the job's configuration, merged into: the job's dictionary belongs
+            // to the host, may be finalised or read by other threads, and levels looked up
+            // once may be cached only while the configuration cannot change.
+            config = C_SmartPtr<I_Dict>(config->clone(err), false);
+            throwCZYRErrorIfErrorOccurred(err);
+            if (global) {
                 MergeInto merge(config.get());
                 global->enumerate(&merge, err);
                 throwCZYRErrorIfErrorOccurred(err);
             }
         }
         config_ = CZYRDict(config);
+        configEmpty_ = isEmptyDict(config.get());
 
         const CZYRUniString path = readString(config.get(), CZYRUniString("Path").getImpl());
         {
@@ -492,14 +500,25 @@ void CZYRTraceMsg::internalInit() {
 
 int32_t CZYRTraceMsg::configuredLevel(const CZYRUniString& area,
                                       const CZYRUniString& category) const {
-    I_Dict* config = config_.getImpl();
-    if (isEmptyDict(config))
+    if (configEmpty_)
         return 0;
     if (fixedLevelSet_)
         return fixedLevel_;
     if (area.isEmpty())
         return 0;
-    const C_SmartPtr<I_Dict> areaDict = readDict(config, area.getImpl());
+    for (const CachedLevel& cached : levelCache_)
+        if (cached.area.getImpl() == area.getImpl() &&
+            cached.category.getImpl() == category.getImpl())
+            return cached.level;
+    const int32_t level = lookUpLevel(area, category);
+    // The entry keeps both strings alive, so their addresses cannot be reused meanwhile.
+    levelCache_[nextCachedLevel_] = {area, category, level};
+    nextCachedLevel_ = (nextCachedLevel_ + 1) % kCachedLevels;
+    return level;
+}
+
+int32_t CZYRTraceMsg::lookUpLevel(const CZYRUniString& area, const CZYRUniString& category) const {
+    const C_SmartPtr<I_Dict> areaDict = readDict(config_.getImpl(), area.getImpl());
     if (!areaDict)
         return 0;
     int32_t value = 0;
@@ -520,7 +539,7 @@ bool CZYRTraceMsg::passes(const CZYRUniString& area, const CZYRUniString& catego
                           bool alwaysTrace) const {
     if (alwaysTrace)
         return true;
-    if (isEmptyDict(config_.getImpl()))
+    if (configEmpty_)
         return false;
     return level <= (fixedLevelSet_ ? fixedLevel_ : 0) || level <= configuredLevel(area, category);
 }
@@ -668,7 +687,7 @@ void ZYRTraceMsgCallbackInternal(sZYRTraceMsg* msg, sZYRTraceMsgDetail* detail, 
     if (!hasText(msg) || !detail || detail->level != ZYRPublic::kZYRTraceMsgLevel4)
         return;
     try {
-        writePart({}, *msg, false, {});
+        writePart(scratch(), *msg, false, {});
     } catch (...) {
         // A report line that cannot be written is dropped; the callback must not throw.
     }

@@ -2,6 +2,7 @@
 // interface or to the process-wide trace log, and the log writer.
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <string>
 
@@ -115,6 +116,16 @@ private:
     bool routesToHost(const CZYRUniString& area, const CZYRUniString& category) const;
     int32_t jobNumber() const;
     int32_t configuredLevel(const CZYRUniString& area, const CZYRUniString& category) const;
+    int32_t lookUpLevel(const CZYRUniString& area, const CZYRUniString& category) const;
+
+    // The levels of the latest (area, category) pairs, by string object: the configuration
+    // is this object's own and does not change, so a level once found stays right.
+    struct CachedLevel {
+        CZYRUniString area;
+        CZYRUniString category;
+        int32_t level = 0;
+    };
+    static constexpr size_t kCachedLevels = 4;
 
     C_SmartPtr<I_Job> job_;
     C_SmartPtr<I_Surface> surface_;
@@ -130,6 +141,9 @@ private:
     CZYRUniString lastArea_;
     CZYRUniString lastCategory_;
     bool sendToHost_ = false;
+    bool configEmpty_ = true;
+    mutable std::array<CachedLevel, kCachedLevels> levelCache_;
+    mutable size_t nextCachedLevel_ = 0;
 };
 
 // Closes the trace log; the next configuration that enables tracing opens one again.
