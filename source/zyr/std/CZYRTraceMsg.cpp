@@ -452,6 +452,10 @@ void CZYRTraceMsg::internalInit() {
 
         C_SmartPtr<I_Dict> jobDict(job_->getJobDict(err), false);
         throwCZYRErrorIfErrorOccurred(err);
+        // Read once: a job's parameters do not change while it runs. A job without
+        // "JPJobID" prints as job 0.
+        if (!readNumber(jobDict.get(), common->str_JPJobID().get(), jobNumber_))
+            jobNumber_ = 0;
         const C_SmartPtr<I_Dict> global = ZYRTracingDict::getInstance().getTracingDict();
         C_SmartPtr<I_Dict> config = readDict(jobDict.get(), common->str_ZYRTraceMsg().get());
         if (!config && !global)
@@ -549,16 +553,6 @@ bool CZYRTraceMsg::routesToHost(const CZYRUniString& area, const CZYRUniString& 
            (textIs(area, u"FontMgr") && textIs(category, u"EmulatedFontInfo"));
 }
 
-int32_t CZYRTraceMsg::jobNumber() const {
-    C_Error err;
-    const C_SmartPtr<I_Dict> jobDict(job_->getJobDict(err), false);
-    int32_t number = 0;
-    // A job without "JPJobID" prints as job 0.
-    if (!readNumber(jobDict.get(), GetCommonUniStrings()->str_JPJobID().get(), number))
-        number = 0;
-    return number;
-}
-
 void CZYRTraceMsg::emit(Kind kind, const CZYRUniString& area, const CZYRUniString& category,
                         int32_t level, const sZYRTraceMsg& msg, const char* srcFile,
                         unsigned int srcLine) {
@@ -580,12 +574,11 @@ void CZYRTraceMsg::emit(Kind kind, const CZYRUniString& area, const CZYRUniStrin
             progress_->traceMsg(job_.get(), surface_.get(), area.getImpl(), category.getImpl(),
                                 &msg, &record, err);
     } else {
-        const int32_t number = jobNumber();
         if (kind == Kind::begin)
-            writer_.beginTraceMsg(number, job_.get(), surface_.get(), area, category, &msg, &record,
-                                  err);
+            writer_.beginTraceMsg(jobNumber_, job_.get(), surface_.get(), area, category, &msg,
+                                  &record, err);
         else
-            writer_.TraceMsg(number, job_.get(), surface_.get(), area, category, &msg, &record,
+            writer_.TraceMsg(jobNumber_, job_.get(), surface_.get(), area, category, &msg, &record,
                              err);
     }
     lastArea_ = area;

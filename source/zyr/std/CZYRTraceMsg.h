@@ -114,7 +114,6 @@ private:
               const sZYRTraceMsg& msg, const char* srcFile, unsigned int srcLine);
     void continuation(const sZYRTraceMsg& msg);
     bool routesToHost(const CZYRUniString& area, const CZYRUniString& category) const;
-    int32_t jobNumber() const;
     int32_t configuredLevel(const CZYRUniString& area, const CZYRUniString& category) const;
     int32_t lookUpLevel(const CZYRUniString& area, const CZYRUniString& category) const;
 
@@ -142,6 +141,7 @@ private:
     CZYRUniString lastCategory_;
     bool sendToHost_ = false;
     bool configEmpty_ = true;
+    int32_t jobNumber_ = 0; // "JPJobID" of the job's parameters, 0 without one
     mutable std::array<CachedLevel, kCachedLevels> levelCache_;
     mutable size_t nextCachedLevel_ = 0;
 };
