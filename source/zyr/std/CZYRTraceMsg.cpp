@@ -34,6 +34,9 @@ constexpr const char* kOpenFailedWarning =
     "TRACE WARNING: File open failed for trace log file. Trace logs will be shown in standard "
     "output\n";
 
+// Trace clocks count from the library's load, not from the first message.
+[[maybe_unused]] const uint32_t clockStartedAtLoad = detail::processClockMs();
+
 // ---- the trace log -----------------------------------------------------------------------
 
 struct TraceLog {
