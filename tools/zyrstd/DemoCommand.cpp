@@ -1,6 +1,7 @@
 // zyrstd demo: how a host embeds the library. It starts the library up, allocates under a
 // memory limit, follows one allocation under memory pressure through the renderer and the
-// flushable caches, and ends with the leak report.
+// flushable caches, runs a small traced job that ends with a memory report, and ends with
+// the leak report.
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
@@ -8,6 +9,7 @@
 #include <vector>
 
 #include "Commands.h"
+#include "I_Job.h"
 #include "I_SurfaceQueue.h"
 #include "ZYRStd.h"
 
@@ -150,6 +152,145 @@ void allocationUnderPressure() {
     std::remove(logPath.c_str());
 }
 
+// The engine side of a traced job: a job whose interface set has only a progress interface,
+// which shows what the library routes to the host.
+template <class Interface> class Counted : public Interface {
+public:
+    void addRef() override { ++count_; }
+    void release() override {
+        if (--count_ == 0)
+            delete this;
+    }
+    bool isShared() const override { return count_ > 1; }
+    unsigned int debugGetRefCount() const override { return count_; }
+    virtual ~Counted() = default;
+
+private:
+    unsigned int count_ = 1;
+};
+
+class HostProgress : public Counted<ZYRPublic::I_OEMProgressInterface> {
+public:
+    void traceMsg(const ZYRPublic::sZYRTraceMsg*, ZYRPublic::I_Error&) override {}
+    void traceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString*,
+                  ZYRPublic::I_UniString*, const ZYRPublic::sZYRTraceMsg* msg,
+                  const ZYRPublic::sZYRTraceMsgDetail* detail, ZYRPublic::I_Error&) override {
+        std::printf("   the host's progress interface receives (level %d): %s\n", detail->level,
+                    msg->text ? msg->text : "(wide text)");
+    }
+    void beginTraceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString*,
+                       ZYRPublic::I_UniString*, const ZYRPublic::sZYRTraceMsg*,
+                       const ZYRPublic::sZYRTraceMsgDetail*, ZYRPublic::I_Error&) override {}
+    void endTraceMsg(ZYRPublic::I_Error&) override {}
+};
+
+class HostInterfaces : public Counted<ZYRPublic::I_OEMInterfaceSet> {
+public:
+    bool getOEMCuttingInfoMgr(ZYRPublic::I_OEMCuttingInfoMgr**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMPDFPreProcessor(ZYRPublic::I_OEMPDFPreProcessor**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMTagEvaluatorInterface(ZYRPublic::I_OEMTagEvaluatorInterface**,
+                                     ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMXObjectResolver(ZYRPublic::I_OEMXObjectResolver**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMXObjMgr(ZYRPublic::I_OEMXObjMgr**, ZYRPublic::I_Error&) override { return false; }
+    bool getOEMDeviceColorAdjustment(ZYRPublic::I_OEMDeviceColorAdjustment**,
+                                     ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMScreenMgr(ZYRPublic::I_OEMScreenMgr**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMFrameMarkerFactory(ZYRPublic::I_OEMFrameMarkerFactory**,
+                                  ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMRasterInterface(ZYRPublic::I_OEMRasterInterface**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMRasterBufferMgr(ZYRPublic::I_OEMRasterBufferMgr**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+    bool getOEMProgressInterface(ZYRPublic::I_OEMProgressInterface** out,
+                                 ZYRPublic::I_Error&) override {
+        *out = new HostProgress;
+        return true;
+    }
+    bool getOEMCalibrationMgr(ZYRPublic::I_OEMCalibrationMgr**, ZYRPublic::I_Error&) override {
+        return false;
+    }
+};
+
+class HostJob : public Counted<ZYRPublic::I_Job> {
+public:
+    explicit HostJob(const CZYRDict& params) : params_(params) {}
+    uint64_t getJobID() const override { return 1; }
+    ZYRPublic::I_Dict* getJobDict(ZYRPublic::I_Error&) override {
+        params_.getImpl()->addRef();
+        return params_.getImpl();
+    }
+    ZYRPublic::I_OEMInterfaceSet* getOEMInterfaces(ZYRPublic::I_Error&) override {
+        return new HostInterfaces;
+    }
+
+private:
+    CZYRDict params_;
+};
+
+CZYRDict areaLevel(const char* key, unsigned int level) {
+    CZYRDict area;
+    area.set(CZYRUniString(key), level);
+    return area;
+}
+
+void tracedJob() {
+    section("A traced job and its memory report");
+    InitCommonUniStrings();
+    InitDynamicUniStringCache();
+    const std::string logPath = tempPath("zyrstd-demo-trace.log");
+    std::remove(logPath.c_str());
+    {
+        // The job's trace configuration: where the log goes and how much each area says.
+        CZYRDict config;
+        config.set(CZYRUniString("Path"), CZYRUniString(logPath.c_str()));
+        config.set(CZYRUniString("Render"), areaLevel("All", 3));
+        config.set(CZYRUniString("Memory"), areaLevel("All", 4));
+        CZYRDict params;
+        params.set(CZYRUniString("JPJobID"), 1);
+        params.set(CZYRUniString("ZYRTraceMsg"), config);
+        CZYRTraceMsg trace(C_SmartPtr<ZYRPublic::I_Job>(new HostJob(params), false));
+
+        const CZYRUniString render("Render");
+        trace.traceMsg(render, CZYRUniString("Bands"), ZYRPublic::kZYRTraceMsgLevel2,
+                       "band 1 of 4 rendered", false, "demo", __LINE__);
+        trace.traceMsg(render, CZYRUniString("Bands"), ZYRPublic::kZYRTraceMsgLevel5,
+                       "too detailed for level 3: filtered out");
+        trace.beginTraceMsg(render, CZYRUniString("Fonts"), ZYRPublic::kZYRTraceMsgLevel1,
+                            "fonts used:");
+        trace.traceMsg(u"C:\\Fonts\\Serif.ttf");
+        trace.traceMsg("Sans (emulated)");
+        trace.endTraceMsg();
+        trace.traceMsg(CZYRUniString("DLCacheOEMInfo"), CZYRUniString("Cache"),
+                       ZYRPublic::kZYRTraceMsgLevel0, "display-list cache: 3 entries");
+        ReportMemoryUsage(trace, kReportMemoryUsageAfterJob, "demo", ZYRPublic::kZYRTraceMsgLevel2);
+        DumpVMStatistics(trace);
+    }
+    closeTraceLogPath();
+    ReleaseDynamicUniStringCache();
+    ReleaseCommonUniStrings();
+
+    std::printf("   the trace log (%s):\n", logPath.c_str());
+    std::ifstream log(logPath);
+    for (std::string line; std::getline(log, line);)
+        std::printf("   | %s\n", line.c_str());
+}
+
 } // namespace
 
 int runDemo(int argc, char**) {
@@ -190,6 +331,7 @@ int runDemo(int argc, char**) {
     ZYRFree(tooBig);
 
     allocationUnderPressure();
+    tracedJob();
     TerminateErrorStk();
 
     section("Memory state and leak report");

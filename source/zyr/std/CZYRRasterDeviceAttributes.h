@@ -1,0 +1,104 @@
+// The raster device a surface is rendered for (CZYRRasterDeviceAttributes) and its colorant
+// order (CZYRColorantOrderArray). The library stores, copies and compares these values;
+// their meanings belong to the engine's modules.
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRDict.h"
+#include "zyr/std/CZYRRect.h"
+#include "zyr/std/CZYRStdAllocator.h"
+#include "zyr/std/CZYRString.h"
+
+namespace ZYRStd {
+
+class ZYRSTD_API CZYRColorantOrderArray : public CZYRClientBase {
+public:
+    struct Entry {
+        CZYRString name;
+        int32_t number;
+    };
+
+    CZYRColorantOrderArray() = default;
+    CZYRColorantOrderArray(const CZYRColorantOrderArray&) = default;
+    CZYRColorantOrderArray& operator=(const CZYRColorantOrderArray&) = default;
+    ~CZYRColorantOrderArray() override;
+
+    void add(const CZYRString& name, int32_t number) { entries_.push_back({name, number}); }
+    unsigned int getCount() const { return static_cast<unsigned int>(entries_.size()); }
+    // Throws kZYRErrorBadParam past the end.
+    const Entry& getEntry(unsigned int index) const;
+    int32_t getValue() const { return value_; }
+    void setValue(int32_t value) { value_ = value; }
+
+    // Entry by entry (name and number), and the extra value.
+    bool operator==(const CZYRColorantOrderArray& other) const;
+
+private:
+    std::vector<Entry, CZYRStdAllocator<Entry>> entries_;
+    int32_t value_ = 0;
+};
+
+// Four 32-bit values the device carries as one block, {2, 1, 512, 0} by default.
+struct sZYRDeviceValueBlock {
+    int32_t value[4];
+    bool operator==(const sZYRDeviceValueBlock&) const = default;
+};
+
+class ZYRSTD_API CZYRRasterDeviceAttributes : public CZYRClientBase {
+public:
+    // 0 components, 612 by 792 at 300 by 300, further values 8, 1, 1, 1, block {2, 1, 512,
+    // 0}, flags clear, no colorants, an empty array.
+    CZYRRasterDeviceAttributes();
+    // Throws kZYRErrorBadParam "invalid num components in colorant array" when the number of
+    // components differs from the colorant count and `thirdFlag` is false.
+    CZYRRasterDeviceAttributes(unsigned int numComponents, unsigned int firstValue,
+                               double horizontalResolution, double verticalResolution,
+                               const CZYRRect& rect, unsigned int fourthValue,
+                               const sZYRDeviceValueBlock& block, bool firstFlag,
+                               const CZYRColorantOrderArray& colorantOrder,
+                               unsigned int secondValue, unsigned int thirdValue, bool secondFlag,
+                               bool thirdFlag, CZYRArray array);
+    CZYRRasterDeviceAttributes(const CZYRRasterDeviceAttributes&) = default;
+    CZYRRasterDeviceAttributes& operator=(const CZYRRasterDeviceAttributes&) = default;
+    ~CZYRRasterDeviceAttributes() override;
+
+    unsigned int getNumComponents() const { return numComponents_; }
+    const CZYRRect& getRect() const { return rect_; }
+    unsigned int getFirstValue() const { return firstValue_; }
+    unsigned int getSecondValue() const { return secondValue_; }
+    unsigned int getThirdValue() const { return thirdValue_; }
+    double getHorizontalResolution() const { return horizontalResolution_; }
+    double getVerticalResolution() const { return verticalResolution_; }
+    unsigned int getFourthValue() const { return fourthValue_; }
+    const sZYRDeviceValueBlock& getValueBlock() const { return block_; }
+    bool getFirstFlag() const { return firstFlag_; }
+    bool getSecondFlag() const { return secondFlag_; }
+    const CZYRColorantOrderArray& getColorantOrder() const { return colorantOrder_; }
+    bool getThirdFlag() const { return thirdFlag_; }
+    const CZYRArray& getArray() const { return array_; }
+
+    // Every value, the colorant order, and arrays of the same length.
+    bool operator==(const CZYRRasterDeviceAttributes& other) const;
+
+private:
+    unsigned int numComponents_ = 0;
+    CZYRRect rect_;
+    unsigned int firstValue_ = 8;
+    unsigned int secondValue_ = 1;
+    unsigned int thirdValue_ = 1;
+    double horizontalResolution_ = 300.0;
+    double verticalResolution_ = 300.0;
+    unsigned int fourthValue_ = 1;
+    sZYRDeviceValueBlock block_{2, 1, 512, 0};
+    bool firstFlag_ = false;
+    bool secondFlag_ = false;
+    CZYRColorantOrderArray colorantOrder_;
+    bool thirdFlag_ = false;
+    CZYRArray array_;
+};
+
+} // namespace ZYRStd

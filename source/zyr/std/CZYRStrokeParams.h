@@ -1,0 +1,64 @@
+// The parameters of a stroke: width, miter limit, dashes, caps and joins, and a matrix.
+#pragma once
+
+#include <cstdint>
+
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRMatrix.h"
+#include "zyr/std/CZYRMemBuffer.h"
+
+namespace ZYRStd {
+
+// The engine's values; the library only stores, copies and compares them.
+enum eZYRLineCapType : int32_t { kZYRLineCapDefault = 2 };
+enum eZYRLineJoinType : int32_t { kZYRLineJoinDefault = 0 };
+
+struct sStrokeParams {
+    float lineWidth;
+    float miterLimit;
+    float dashOffset;
+    int32_t dashCount;
+    float* dashArray; // into the owning CZYRStrokeParams' dash storage, or null
+    bool strokeAdjust;
+    eZYRLineCapType lineCap;
+    eZYRLineJoinType lineJoin;
+    int32_t extra;
+};
+
+class ZYRSTD_API CZYRStrokeParams : public CZYRClientBase {
+public:
+    CZYRStrokeParams() = default;
+    // The copy gets dash storage of its own.
+    CZYRStrokeParams(const CZYRStrokeParams& other);
+    CZYRStrokeParams& operator=(const CZYRStrokeParams& other);
+    ~CZYRStrokeParams() override;
+
+    const sStrokeParams& getStrokeParams() const { return params_; }
+    const CZYRMatrix& getMatrix() const { return matrix_; }
+    void setMatrix(const CZYRMatrix& matrix) { matrix_ = matrix; }
+
+    // A width not above 0 (or not a number) stores 0.
+    void setLineWidth(float width);
+    // A limit not above 1 (or not a number) stores 1.
+    void setMiterLimit(float limit);
+    void setDashedOffset(float offset) { params_.dashOffset = offset; }
+    // Copies `count` values into the dash storage, which grows but never shrinks. A negative
+    // count, or values missing for a positive one, throws kZYRErrorBadParam.
+    void setDashedArray(const float* values, int count);
+    void setStrokeAdjust(bool adjust) { params_.strokeAdjust = adjust; }
+    void setLineCap(eZYRLineCapType cap) { params_.lineCap = cap; }
+    void setLineJoin(eZYRLineJoinType join) { params_.lineJoin = join; }
+
+    // Width, miter limit, offset, adjust, count, cap, join, and the dash values when both
+    // have some in different storage.
+    bool operator==(const CZYRStrokeParams& other) const;
+
+private:
+    CZYRMemBuffer<float> dashStorage_;
+    sStrokeParams params_{
+        1.0f, 10.0f, 0.0f, 0, nullptr, false, kZYRLineCapDefault, kZYRLineJoinDefault, 0};
+    CZYRMatrix matrix_;
+};
+
+} // namespace ZYRStd

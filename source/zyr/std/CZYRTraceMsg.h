@@ -1,0 +1,157 @@
+// Trace messages bound to a job: the per-job level filter, routing to the host's progress
+// interface or to the process-wide trace log, and the log writer.
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <string>
+
+#include "C_SmartPtr.h"
+#include "I_Error.h"
+#include "I_Job.h"
+#include "I_Surface.h"
+#include "ZYRStdExport.h"
+#include "sZYRTraceMsg.h"
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRDict.h"
+#include "zyr/std/CZYRUniString.h"
+
+namespace ZYRStd {
+
+using ZYRPublic::eZYRTraceMsgLevel;
+using ZYRPublic::I_Job;
+using ZYRPublic::I_OEMProgressInterface;
+using ZYRPublic::I_Surface;
+using ZYRPublic::sZYRTraceMsg;
+using ZYRPublic::sZYRTraceMsgDetail;
+
+// The five levels above 8 that configurations keep as they are.
+constexpr int32_t kZYRTraceMsgKeptLevelFirst = 0x1FAB1DEA;
+constexpr int32_t kZYRTraceMsgKeptLevelLast = 0x1FAB1DEE;
+
+// A configured value as a level: below 0 gives 0, 0 to 8 and the kept levels stay, the
+// rest gives 8.
+ZYRSTD_API int32_t mapToTraceMsgLevel(int32_t value);
+
+// Writes messages into the trace log (standard output while the log is closed). Head and
+// text of one message go out in one write under the log mutex and are flushed at once.
+// Failures are recorded in `err`, never thrown.
+class ZYRSTD_API CZYRProgressInterface {
+public:
+    void TraceMsg(int32_t jobNumber, I_Job* job, I_Surface* surface, const CZYRUniString& area,
+                  const CZYRUniString& category, const sZYRTraceMsg* msg,
+                  const sZYRTraceMsgDetail* detail, ZYRPublic::I_Error& err);
+    void beginTraceMsg(int32_t jobNumber, I_Job* job, I_Surface* surface, const CZYRUniString& area,
+                       const CZYRUniString& category, const sZYRTraceMsg* msg,
+                       const sZYRTraceMsgDetail* detail, ZYRPublic::I_Error& err);
+    void traceMsg(const sZYRTraceMsg* msg, ZYRPublic::I_Error& err);
+    void endTraceMsg(ZYRPublic::I_Error& err);
+};
+
+// The tracing dictionary that applies to every job, merged into each job's configuration.
+class ZYRSTD_API ZYRTracingDict {
+public:
+    static ZYRTracingDict& getInstance();
+    // Keeps a clone of `dict`; an invalid or empty dictionary clears it.
+    void setTracingDict(const CZYRDict& dict);
+    // A new reference, or null.
+    C_SmartPtr<ZYRPublic::I_Dict> getTracingDict() const;
+    ~ZYRTracingDict();
+
+private:
+    ZYRTracingDict() = default;
+    ZYRTracingDict(const ZYRTracingDict&) = delete;
+    ZYRTracingDict& operator=(const ZYRTracingDict&) = delete;
+
+    static C_SmartPtr<ZYRPublic::I_Dict> tracingDict;
+};
+
+// One thread at a time. Failures are thrown as CZYRError; anything else thrown inside
+// becomes kZYRErrorUnknown "Unknown exception in CZYRTraceMsg::<operation>".
+class ZYRSTD_API CZYRTraceMsg : public CZYRClientBase {
+public:
+    // Throws the job look-up's error when the job has no progress interface.
+    explicit CZYRTraceMsg(const C_SmartPtr<I_Job>& job);
+    // Finds the job through the surface's owner and its parent; a surface whose walk meets
+    // a null step throws kZYRErrorInvalidData "miss job".
+    explicit CZYRTraceMsg(const C_SmartPtr<I_Surface>& surface);
+    CZYRTraceMsg(const CZYRTraceMsg& other) = default;
+    CZYRTraceMsg& operator=(const CZYRTraceMsg& other) = default;
+    // Neither ends an open message nor closes the log.
+    ~CZYRTraceMsg() override;
+
+    void beginTraceMsg(const CZYRUniString& area, const CZYRUniString& category,
+                       eZYRTraceMsgLevel level, const char* text, bool alwaysTrace = false,
+                       const char* srcFile = nullptr, unsigned int srcLine = 0);
+    void beginTraceMsg(const CZYRUniString& area, const CZYRUniString& category,
+                       eZYRTraceMsgLevel level, const char16_t* text, bool alwaysTrace = false,
+                       const char* srcFile = nullptr, unsigned int srcLine = 0);
+    // Continuation texts and the end of the open message; nothing without one.
+    void traceMsg(const char* text);
+    void traceMsg(const char16_t* text);
+    void endTraceMsg();
+    // A whole message.
+    void traceMsg(const CZYRUniString& area, const CZYRUniString& category, eZYRTraceMsgLevel level,
+                  const char* text, bool alwaysTrace = false, const char* srcFile = nullptr,
+                  unsigned int srcLine = 0);
+    void traceMsg(const CZYRUniString& area, const CZYRUniString& category, eZYRTraceMsgLevel level,
+                  const char16_t* text, bool alwaysTrace = false, const char* srcFile = nullptr,
+                  unsigned int srcLine = 0);
+
+    eZYRTraceMsgLevel getTraceMsgLevel(const CZYRUniString& area,
+                                       const CZYRUniString& category) const;
+
+    const C_SmartPtr<I_Job>& getJob() const { return job_; }
+    bool isSendToHost() const { return sendToHost_; }
+
+private:
+    enum class Kind { whole, begin };
+
+    void internalInit();
+    bool passes(const CZYRUniString& area, const CZYRUniString& category, int32_t level,
+                bool alwaysTrace) const;
+    void emit(Kind kind, const CZYRUniString& area, const CZYRUniString& category, int32_t level,
+              const sZYRTraceMsg& msg, const char* srcFile, unsigned int srcLine);
+    void continuation(const sZYRTraceMsg& msg);
+    bool routesToHost(const CZYRUniString& area, const CZYRUniString& category) const;
+    int32_t configuredLevel(const CZYRUniString& area, const CZYRUniString& category) const;
+    int32_t lookUpLevel(const CZYRUniString& area, const CZYRUniString& category) const;
+
+    // The levels of the latest (area, category) pairs, by string object: the configuration
+    // is this object's own and does not change, so a level once found stays right.
+    struct CachedLevel {
+        CZYRUniString area;
+        CZYRUniString category;
+        int32_t level = 0;
+    };
+    static constexpr size_t kCachedLevels = 4;
+
+    C_SmartPtr<I_Job> job_;
+    C_SmartPtr<I_Surface> surface_;
+    CZYRDict config_;
+    C_SmartPtr<I_OEMProgressInterface> progress_;
+    bool fixedLevelSet_ = false;
+    int fixedLevel_ = 0;
+    int defaultLevel_ = 0;
+    CZYRUniString keyAll_;
+    CZYRUniString keyDefault_;
+    bool inMessage_ = false;
+    CZYRProgressInterface writer_;
+    CZYRUniString lastArea_;
+    CZYRUniString lastCategory_;
+    bool sendToHost_ = false;
+    bool configEmpty_ = true;
+    int32_t jobNumber_ = 0; // "JPJobID" of the job's parameters, 0 without one
+    mutable std::array<CachedLevel, kCachedLevels> levelCache_;
+    mutable size_t nextCachedLevel_ = 0;
+};
+
+// Closes the trace log; the next configuration that enables tracing opens one again.
+ZYRSTD_API void closeTraceLogPath();
+// The trace log's path while it is open, else empty (for hosts that show where it is).
+ZYRSTD_API std::string ZYRGetTraceLogPath();
+// A trace callback for the library's own reports: writes the text of level-4 records.
+ZYRSTD_API void ZYRTraceMsgCallbackInternal(sZYRTraceMsg* msg, sZYRTraceMsgDetail* detail,
+                                            void* clientData);
+
+} // namespace ZYRStd
