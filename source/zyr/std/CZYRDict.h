@@ -1,4 +1,5 @@
-// Dictionaries and arrays of typed values, their value wrappers and enumeration callbacks.
+// Dictionaries of typed values, their value wrapper and enumeration callbacks; arrays
+// come along from CZYRArray.h.
 #pragma once
 
 #include <cstdint>
@@ -17,9 +18,8 @@ using ZYRPublic::I_Array;
 using ZYRPublic::I_Dict;
 using ZYRPublic::I_DictEnumProcs;
 
-// New empty containers with one reference for the caller.
+// A new empty dictionary with one reference for the caller.
 [[nodiscard]] ZYRSTD_API I_Dict* createDict(ZYRPublic::I_Error& err);
-[[nodiscard]] ZYRSTD_API I_Array* createArray(ZYRPublic::I_Error& err);
 
 class CZYRArray;
 class CZYRDictEnumProcs;
@@ -68,50 +68,6 @@ private:
     I_Dict* valid() const;
 };
 
-// A shared array; copies share contents. Failures are thrown as CZYRError.
-class ZYRSTD_API CZYRArray : public CZYRInterfaceValue<I_Array> {
-public:
-    CZYRArray(); // a new, empty array
-    CZYRArray(const CZYRArray& other) = default;
-    CZYRArray(CZYRArray&& other) noexcept = default;
-    CZYRArray(const C_SmartPtr<I_Array>& array) : CZYRInterfaceValue(array.get(), true) {}
-    CZYRArray(I_Array* array, bool addRef) : CZYRInterfaceValue(array, addRef) {}
-    CZYRArray& operator=(const CZYRArray& other) = default;
-    CZYRArray& operator=(CZYRArray&& other) noexcept = default;
-    ~CZYRArray() override;
-
-    // Setting past the end grows the array; the elements in between are holes.
-    void set(unsigned int index, const CZYRUniString& value);
-    void set(unsigned int index, const CZYRDict& value);
-    void set(unsigned int index, const CZYRArray& value);
-    void set(unsigned int index, const CZYRDataBuffer& value);
-    void set(unsigned int index, unsigned int value);
-    void set(unsigned int index, int32_t value);
-    void set(unsigned int index, double value);
-    void set(unsigned int index, bool value);
-    void insert(unsigned int index);
-    void remove(unsigned int index);
-
-    bool get(unsigned int index, CZYRDict& out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, CZYRUniString& out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, CZYRArray& out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, CZYRDataBuffer& out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, unsigned int* out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, int32_t* out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, double* out, bool throwIfMissing = false) const;
-    bool get(unsigned int index, bool* out, bool throwIfMissing = false) const;
-
-    unsigned int getLength() const;
-    eZYRValType getType(unsigned int index) const;
-    void finalize();
-    bool isFinalized() const;
-    CZYRArray clone() const;
-    unsigned long long getUniqueID() const;
-
-private:
-    I_Array* valid() const;
-};
-
 // Enumeration callbacks in wrapper types; true means "go on".
 class ZYRSTD_API CZYRDictEnumProcs {
 public:
@@ -127,3 +83,5 @@ public:
 };
 
 } // namespace ZYRStd
+
+#include "zyr/std/CZYRArray.h"

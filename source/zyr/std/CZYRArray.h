@@ -1,0 +1,67 @@
+// Arrays of typed values and their value wrapper.
+#pragma once
+
+#include <cstdint>
+
+#include "C_SmartPtr.h"
+#include "I_Dict.h"
+#include "ZYRStdExport.h"
+#include "zyr/std/CZYRDataBuffer.h"
+#include "zyr/std/CZYRPublicObject.h"
+#include "zyr/std/CZYRUniString.h"
+
+namespace ZYRStd {
+
+using ZYRPublic::eZYRValType;
+using ZYRPublic::I_Array;
+
+// A new empty array with one reference for the caller.
+[[nodiscard]] ZYRSTD_API I_Array* createArray(ZYRPublic::I_Error& err);
+
+class CZYRDict;
+
+// A shared array; copies share contents. Failures are thrown as CZYRError.
+class ZYRSTD_API CZYRArray : public CZYRInterfaceValue<I_Array> {
+public:
+    CZYRArray(); // a new, empty array
+    CZYRArray(const CZYRArray& other) = default;
+    CZYRArray(CZYRArray&& other) noexcept = default;
+    CZYRArray(const C_SmartPtr<I_Array>& array) : CZYRInterfaceValue(array.get(), true) {}
+    CZYRArray(I_Array* array, bool addRef) : CZYRInterfaceValue(array, addRef) {}
+    CZYRArray& operator=(const CZYRArray& other) = default;
+    CZYRArray& operator=(CZYRArray&& other) noexcept = default;
+    ~CZYRArray() override;
+
+    // Setting past the end grows the array; the elements in between are holes.
+    void set(unsigned int index, const CZYRUniString& value);
+    void set(unsigned int index, const CZYRDict& value);
+    void set(unsigned int index, const CZYRArray& value);
+    void set(unsigned int index, const CZYRDataBuffer& value);
+    void set(unsigned int index, unsigned int value);
+    void set(unsigned int index, int32_t value);
+    void set(unsigned int index, double value);
+    void set(unsigned int index, bool value);
+    void insert(unsigned int index);
+    void remove(unsigned int index);
+
+    bool get(unsigned int index, CZYRDict& out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, CZYRUniString& out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, CZYRArray& out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, CZYRDataBuffer& out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, unsigned int* out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, int32_t* out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, double* out, bool throwIfMissing = false) const;
+    bool get(unsigned int index, bool* out, bool throwIfMissing = false) const;
+
+    unsigned int getLength() const;
+    eZYRValType getType(unsigned int index) const;
+    void finalize();
+    bool isFinalized() const;
+    CZYRArray clone() const;
+    unsigned long long getUniqueID() const;
+
+private:
+    I_Array* valid() const;
+};
+
+} // namespace ZYRStd
