@@ -20,6 +20,7 @@ std::vector<std::string> calls;
 std::atomic<int> delayMs{0};
 std::atomic<bool> refuseSessions{false};
 std::atomic<int> optIn{0};
+std::atomic<int> started{0};
 Kelvrin session;
 
 std::string text(const char* s) {
@@ -27,6 +28,7 @@ std::string text(const char* s) {
 }
 
 void record(std::string call) {
+    started.fetch_add(1);
     if (const int ms = delayMs.load())
         std::this_thread::sleep_for(std::chrono::milliseconds(ms));
     const std::lock_guard guard(callsLock);
@@ -45,6 +47,9 @@ KELVRIN_API void RecordingTakeCalls(std::vector<std::string>& out) {
 }
 KELVRIN_API void RecordingSetDelay(int ms) {
     delayMs = ms;
+}
+KELVRIN_API int RecordingCallsStarted() {
+    return started;
 }
 KELVRIN_API void RecordingRefuseSessions(bool refuse) {
     refuseSessions = refuse;
