@@ -357,6 +357,8 @@ bool Farlamp::LoggingEnabled() {
 // ---- data groups --------------------------------------------------------------------------
 
 void Farlamp::LogDataObject(const C_SmartPtr<I_AnalyticsData>& record) {
+    if (!loggingEnabled)
+        return; // the common case of an opted-out session, without the lock
     const std::lock_guard lock(stateLock);
     if (!loggingEnabled || !logHandle || !record)
         return;

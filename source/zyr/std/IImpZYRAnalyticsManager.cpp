@@ -4,9 +4,8 @@
 
 #include <boost/thread/thread.hpp>
 
+#include <atomic>
 #include <deque>
-#include <memory>
-#include <shared_mutex>
 #include <utility>
 
 #include "zyr/std/CZYRClientBase.h"
@@ -27,6 +26,7 @@ public:
     ~IImpZYRAnalyticsManager() override { stop(); }
 
     void start() {
+        terminating_ = false;
         worker_ = boost::thread([this] { run(); });
     }
 
@@ -35,7 +35,7 @@ public:
             return;
         {
             const mutex::scoped_lock lock(lock_);
-            if (terminating_)
+            if (terminating_.load(std::memory_order_relaxed))
                 throw CZYRError(ZYRPublic::kZYRErrorInvalidFuncCall,
                                 "Attempt to enqueue Job after ZYRTerminate called.", kSource,
                                 __LINE__);
@@ -46,6 +46,7 @@ public:
     }
 
     // Sets the terminating flag and joins the worker; what it has not reached is dropped.
+    // Enqueues keep failing until the next start.
     void stop() {
         {
             const mutex::scoped_lock lock(lock_);
@@ -54,96 +55,95 @@ public:
         wakeup_.notify_one();
         if (worker_.joinable())
             worker_.join();
+        const mutex::scoped_lock lock(lock_);
+        queue_.clear();
+        current_.reset();
     }
 
 private:
+    // Takes everything queued under one lock, so that producers rarely meet the worker on
+    // it, and logs the records in order, each only while termination has not begun.
     void run() {
+        std::deque<C_SmartPtr<I_AnalyticsData>> taken;
         for (;;) {
-            C_SmartPtr<I_AnalyticsData> record;
             {
                 mutex::scoped_lock lock(lock_);
                 while (queue_.empty()) {
-                    if (terminating_)
+                    if (terminating_.load(std::memory_order_relaxed))
                         return;
                     wakeup_.do_wait(lock);
                 }
-                current_ = std::move(queue_.front());
-                queue_.pop_front();
-                if (terminating_)
-                    return; // none is logged once termination began
-                record = current_;
+                taken.swap(queue_);
             }
-            Farlamp::LogDataObject(record);
+            for (auto& record : taken) {
+                // Acquire: pairs with the store in stop(); none is logged once it is seen.
+                if (terminating_.load(std::memory_order_acquire))
+                    return;
+                current_ = std::move(record);
+                Farlamp::LogDataObject(current_);
+            }
+            taken.clear();
         }
     }
 
     boost::thread worker_;
-    bool terminating_ = false;      // guarded by lock_
+    // Written under lock_; the worker also reads it between records without the lock.
+    std::atomic<bool> terminating_{false};
     detail::condition_impl wakeup_; // the queue got a record, or termination began
-    mutex lock_;                    // guards terminating_, queue_ and current_
+    mutex lock_;                    // guards queue_
     std::deque<C_SmartPtr<I_AnalyticsData>> queue_;
-    C_SmartPtr<I_AnalyticsData> current_; // the record being logged
+    C_SmartPtr<I_AnalyticsData> current_; // the record being logged; the worker's own
 };
 
-// Producers read the singleton under a shared lock, so that ZYRAnalyticsManagerTerm cannot
-// destroy the manager while an enqueue is inside it.
-std::shared_mutex singletonLock;
-IImpZYRAnalyticsManager* singleton = nullptr; // guarded by singletonLock
+// The manager lives as long as the process, so that a producer holding its pointer while
+// ZYRAnalyticsManagerTerm runs meets the terminating error, never a destroyed object.
+IImpZYRAnalyticsManager& theManager() {
+    static IImpZYRAnalyticsManager manager;
+    return manager;
+}
+// Acquire/release: a producer that sees the pointer sees the started manager.
+std::atomic<IImpZYRAnalyticsManager*> singleton{nullptr};
 
 } // namespace
 
 IZYRAnalyticsManager::~IZYRAnalyticsManager() = default;
 
 bool ZYRAnalyticsManagerInit() {
-    {
-        const std::shared_lock lock(singletonLock);
-        if (singleton)
-            return true;
-    }
+    if (singleton.load(std::memory_order_acquire))
+        return true;
     const bool wanted = ZYRIsAnalyticsActive();
     const bool ok = Farlamp::StartSession(wanted, ZYRGetAnalyticsLogFolder());
     // A session also opens when analytics are off (it records nothing); records stay
     // disabled then, since nothing would log them.
     ZYRSetAnalyticsActive(ok && wanted);
     if (ok) {
-        auto manager = std::make_unique<IImpZYRAnalyticsManager>();
-        manager->start();
-        const std::unique_lock lock(singletonLock);
-        singleton = manager.release();
+        IImpZYRAnalyticsManager& manager = theManager();
+        manager.start();
+        singleton.store(&manager, std::memory_order_release);
     }
     return true;
 }
 
 bool ZYRAnalyticsManagerTerm() {
-    IImpZYRAnalyticsManager* manager;
-    {
-        const std::shared_lock lock(singletonLock);
-        manager = singleton;
-    }
     // The worker is joined before the session closes: a worker still logging would call
-    // into the unloaded telemetry library. Producers meanwhile see the terminating error.
-    if (manager) {
+    // into the unloaded telemetry library.
+    if (IImpZYRAnalyticsManager* manager = singleton.load(std::memory_order_acquire)) {
         manager->stop();
-        {
-            const std::unique_lock lock(singletonLock); // waits for enqueues under way
-            singleton = nullptr;
-        }
-        delete manager;
+        singleton.store(nullptr, std::memory_order_release);
     }
     Farlamp::CloseSession();
     return true;
 }
 
 IZYRAnalyticsManager* GetZYRAnalyticsManager() {
-    const std::shared_lock lock(singletonLock);
-    return singleton;
+    return singleton.load(std::memory_order_acquire);
 }
 
 bool ZYREnqueueAnalyticsRecord(C_SmartPtr<I_AnalyticsData> record) {
-    const std::shared_lock lock(singletonLock);
-    if (!singleton)
+    IImpZYRAnalyticsManager* manager = singleton.load(std::memory_order_acquire);
+    if (!manager)
         return false;
-    singleton->enqueue(std::move(record));
+    manager->enqueue(std::move(record));
     return true;
 }
 

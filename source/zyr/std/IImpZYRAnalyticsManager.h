@@ -23,8 +23,8 @@ public:
 // Both always return true; a session that cannot start leaves analytics inactive.
 ZYRSTD_API bool ZYRAnalyticsManagerInit();
 ZYRSTD_API bool ZYRAnalyticsManagerTerm();
-// The running manager or null. Callers that may race with ZYRAnalyticsManagerTerm use
-// ZYREnqueueAnalyticsRecord instead, which keeps the manager alive across the call.
+// The running manager or null. The manager outlives ZYRAnalyticsManagerTerm, so a pointer
+// taken before it only meets the terminating error.
 ZYRSTD_API IZYRAnalyticsManager* GetZYRAnalyticsManager();
 
 // Enqueues on the running manager; false when there is none. Throws what enqueue throws.
