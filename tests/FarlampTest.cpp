@@ -325,4 +325,10 @@ TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
     EXPECT_EQ(recorder.take(), lastRun);
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take(), Calls{}) << "a flushed run is not logged again";
+
+    // Extents beyond the printed range are clamped rather than converted.
+    Farlamp::UpdateCurrentSurfaceInfo(1e300, -1e300, 1);
+    Farlamp::LogSurfaceDataGroup();
+    Farlamp::FlushJob(0);
+    EXPECT_EQ(recorder.take().at(1), "UTAddToGroup(102,Surface Resolution,2147483647X-2147483648)");
 }

@@ -8,6 +8,7 @@
 #include <cstdio>
 #include <cstring>
 #include <filesystem>
+#include <limits>
 #include <optional>
 #include <sstream>
 #include <string>
@@ -187,6 +188,15 @@ template <class T, class Source> std::optional<T> readValue(Source* source, cons
     if (source->get(CZYRUniString(key).getImpl(), &v, err) && !err.errorOccurred())
         return v;
     return std::nullopt;
+}
+
+// A surface extent as the whole number "%d" prints; out-of-range values are clamped, since
+// converting them would be undefined.
+int wholeUnits(double extent) {
+    if (!(extent > std::numeric_limits<int>::min()))
+        return extent > 0 ? std::numeric_limits<int>::max() : std::numeric_limits<int>::min();
+    return extent < std::numeric_limits<int>::max() ? static_cast<int>(extent)
+                                                    : std::numeric_limits<int>::max();
 }
 
 // A folder the session can write to: created when missing, then probed with a file.
@@ -556,8 +566,8 @@ void Farlamp::LogSurfaceDataGroupHelper(sSurfaceInfo& info) {
     if (!logHandle)
         return;
     char resolution[64];
-    std::snprintf(resolution, sizeof resolution, "%dX%d", static_cast<int>(info.width),
-                  static_cast<int>(info.height));
+    std::snprintf(resolution, sizeof resolution, "%dX%d", wholeUnits(info.width),
+                  wholeUnits(info.height));
     int group = -1;
     entry.newDataGroup(logHandle, "SurfaceInfo", "", "Surface", group, nullptr, 0);
     entry.addToGroup(logHandle, group, "Surface Resolution", resolution);
