@@ -263,9 +263,25 @@ constexpr std::array<GroupRule, 8> kGroupRules = {{
 
 // ---- loading ------------------------------------------------------------------------------
 
+namespace {
+
+// The path of `name` in this library's own directory. dlopen by name finds it there through
+// the library's RUNPATH, but not when a sanitizer's interceptor makes the call (the search
+// then uses the interceptor's RUNPATH), so the logger also asks for it by path.
+std::string besideThisLibrary(const char* name) {
+    Dl_info info{};
+    if (!dladdr(reinterpret_cast<void*>(&Farlamp::LoggingEnabled), &info) || !info.dli_fname)
+        return name;
+    return (std::filesystem::path(info.dli_fname).parent_path() / name).string();
+}
+
+} // namespace
+
 void Farlamp::LoadLibraryFunction() {
     // The platform-version test of the original always passes here.
     libInst = dlopen(kLibraryName, RTLD_NOW | RTLD_LOCAL);
+    if (!libInst)
+        libInst = dlopen(besideThisLibrary(kLibraryName).c_str(), RTLD_NOW | RTLD_LOCAL);
     if (!libInst)
         return;
     EntryPoints found;
