@@ -33,16 +33,20 @@ public:
     void enqueue(C_SmartPtr<I_AnalyticsData> record) override {
         if (!record)
             return;
+        bool wasEmpty;
         {
             const mutex::scoped_lock lock(lock_);
             if (terminating_.load(std::memory_order_relaxed))
                 throw CZYRError(ZYRPublic::kZYRErrorInvalidFuncCall,
                                 "Attempt to enqueue Job after ZYRTerminate called.", kSource,
                                 __LINE__);
+            wasEmpty = queue_.empty();
             queue_.push_back(std::move(record));
         }
-        // Woken outside the lock, so that the worker does not wake only to block on it.
-        wakeup_.notify_one();
+        // The worker waits only on an empty queue, so only the first record wakes it; woken
+        // outside the lock, so that it does not wake only to block on it.
+        if (wasEmpty)
+            wakeup_.notify_one();
     }
 
     // Sets the terminating flag and joins the worker; what it has not reached is dropped.
