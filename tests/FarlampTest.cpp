@@ -2,6 +2,7 @@
 // arguments for every group, document facts, errors, events, surfaces and the session folder.
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -331,4 +332,23 @@ TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
     Farlamp::LogSurfaceDataGroup();
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take().at(1), "UTAddToGroup(102,Surface Resolution,2147483647X-2147483648)");
+}
+
+// A library that lacks an entry point is not used, and no other is looked for in its place:
+// the logger does nothing. Run in a child process, where the incomplete library is the first
+// one named libKelvrin.so.
+TEST(FarlampLibraryTest, IncompleteLibraryLeavesTheLoggerIdle) {
+    EXPECT_EXIT(
+        {
+            if (!dlopen(ZYRSTD_INCOMPLETE_KELVRIN, RTLD_NOW | RTLD_GLOBAL))
+                std::_Exit(2);
+            zyrtest::TempDir dir;
+            const std::u16string folder = wide(dir.path());
+            const bool started = Farlamp::StartSession(true, folder.c_str());
+            const bool idle = !started && !Farlamp::LoggingEnabled() &&
+                              Farlamp::LogEvent(kZYRAnalyticsEventGlobalRasterization, false) == 0;
+            Farlamp::CloseSession();
+            std::_Exit(idle ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
 }
