@@ -1,6 +1,6 @@
 # Two commands do everything on a fresh Debian machine: `make demo` and `make test`.
 # Each target installs the Debian packages it needs and no more.
-BUILD_PACKAGES   := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev
+BUILD_PACKAGES   := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev nlohmann-json3-dev
 TEST_PACKAGES    := $(BUILD_PACKAGES) googletest libgtest-dev python3 binutils
 BENCH_PACKAGES   := $(BUILD_PACKAGES) libbenchmark-dev libssl-dev libinih-dev libabsl-dev
 FUZZ_PACKAGES    := $(BUILD_PACKAGES) clang libclang-rt-14-dev

@@ -1,11 +1,14 @@
 // zyrstd demo: how a host embeds the library. It starts the library up, allocates under a
 // memory limit, follows one allocation under memory pressure through the renderer and the
-// flushable caches, runs a small traced job that ends with a memory report, and ends with
-// the leak report.
+// flushable caches, runs a small traced job that ends with a memory report, logs analytics
+// records into a telemetry session file, and ends with the leak report.
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "Commands.h"
@@ -291,6 +294,70 @@ void tracedJob() {
         std::printf("   | %s\n", line.c_str());
 }
 
+// Analytics: records logged on the library's worker into a telemetry session file in a
+// temporary folder, whose path and lines are printed.
+void analyticsSession() {
+    section("Analytics records and the telemetry session");
+    std::string folder = (std::filesystem::temp_directory_path() / "zyrstd-analytics-XXXXXX");
+    if (!::mkdtemp(folder.data())) {
+        std::puts("   no temporary folder: analytics skipped");
+        return;
+    }
+    InitCommonUniStrings();
+    InitDynamicUniStringCache();
+    const std::u16string folder16(folder.begin(), folder.end());
+    ZYRSetAnalyticsActive(true);
+    ZYRSetAnalyticsLogFolder(folder16.c_str());
+    ZYRAnalyticsManagerInit();
+    if (!ZYRIsAnalyticsActive()) {
+        std::puts("   libKelvrin.so was not found: analytics stay inactive");
+    } else {
+        CZYRAnalyticsData product;
+        product.set(CZYRUniString("DataGroupName"), CZYRUniString("ProductInfo"));
+        product.set(CZYRUniString("OEMName"), CZYRUniString("Demo Printers"));
+        product.set(CZYRUniString("xobjMode"), 0u);
+        product.finalize();
+        CZYRAnalyticsData job;
+        job.set(CZYRUniString("DataGroupName"), CZYRUniString("JobInfo"));
+        job.set(CZYRUniString("StartTime"), 100.0);
+        job.set(CZYRUniString("SurfaceCount"), 2u);
+        job.finalize();
+        std::puts("   two records finalized; the worker logs them while this thread goes on");
+        Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false);
+        for (int page = 0; page < 2; ++page) {
+            Farlamp::UpdateCurrentSurfaceInfo(2480, 3508, 3);
+            Farlamp::LogSurfaceDataGroup();
+        }
+        // Termination drops what the worker has not reached: give it a moment first.
+        const auto sessionFile = [&] {
+            for (const auto& entry : std::filesystem::directory_iterator(folder))
+                if (entry.path().extension() == ".jsonl")
+                    return entry.path().string();
+            return std::string();
+        };
+        const auto lines = [](const std::string& file) {
+            std::ifstream in(file);
+            std::vector<std::string> all;
+            for (std::string line; std::getline(in, line);)
+                all.push_back(line);
+            return all;
+        };
+        for (int i = 0; i < 2000 && lines(sessionFile()).size() < 6; ++i)
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        Farlamp::FlushJob(102.5);
+        ZYRAnalyticsManagerTerm();
+        const std::string file = sessionFile();
+        std::printf("   session file: %s\n", file.c_str());
+        for (const auto& line : lines(file))
+            std::printf("     %s\n", line.c_str());
+    }
+    ZYRAnalyticsManagerTerm();
+    ZYRSetAnalyticsActive(false);
+    ZYRSetAnalyticsLogFolder(nullptr);
+    ReleaseDynamicUniStringCache();
+    ReleaseCommonUniStrings();
+}
+
 } // namespace
 
 int runDemo(int argc, char**) {
@@ -332,6 +399,7 @@ int runDemo(int argc, char**) {
 
     allocationUnderPressure();
     tracedJob();
+    analyticsSession();
     TerminateErrorStk();
 
     section("Memory state and leak report");

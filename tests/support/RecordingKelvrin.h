@@ -1,0 +1,69 @@
+// The tests' side of the recording telemetry library: loads it once by path, so that the
+// logger's dlopen("libKelvrin.so") finds it by its internal name instead of ours.
+#pragma once
+
+#include <dlfcn.h>
+
+#include <chrono>
+#include <stdexcept>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace zyrtest {
+
+class RecordingKelvrin {
+public:
+    // The process-wide instance; the library stays loaded until the process ends.
+    static RecordingKelvrin& get() {
+        static RecordingKelvrin instance;
+        return instance;
+    }
+
+    // The calls recorded since the last take, one line each, e.g. "UTAddToGroup(100,k,v)".
+    std::vector<std::string> take() {
+        std::vector<std::string> calls;
+        take_(calls);
+        return calls;
+    }
+    // Each call sleeps this long before it is recorded.
+    void setDelay(int ms) { setDelay_(ms); }
+    void refuseSessions(bool refuse) { refuse_(refuse); }
+    int callsStarted() { return started_(); }
+    // Waits (up to 10 s) until `count` calls were recorded since the last take.
+    std::vector<std::string> waitFor(size_t count) {
+        std::vector<std::string> all;
+        for (int i = 0; i < 10000 && all.size() < count; ++i) {
+            for (auto& call : take())
+                all.push_back(std::move(call));
+            if (all.size() < count)
+                std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
+        return all;
+    }
+
+private:
+    RecordingKelvrin() {
+        handle_ = dlopen(ZYRSTD_RECORDING_KELVRIN, RTLD_NOW | RTLD_GLOBAL);
+        if (!handle_)
+            throw std::runtime_error(dlerror());
+        take_ = symbol<void (*)(std::vector<std::string>&)>("RecordingTakeCalls");
+        setDelay_ = symbol<void (*)(int)>("RecordingSetDelay");
+        refuse_ = symbol<void (*)(bool)>("RecordingRefuseSessions");
+        started_ = symbol<int (*)()>("RecordingCallsStarted");
+    }
+    template <class F> F symbol(const char* name) {
+        auto* f = reinterpret_cast<F>(dlsym(handle_, name));
+        if (!f)
+            throw std::runtime_error(name);
+        return f;
+    }
+
+    void* handle_ = nullptr;
+    void (*take_)(std::vector<std::string>&) = nullptr;
+    void (*setDelay_)(int) = nullptr;
+    void (*refuse_)(bool) = nullptr;
+    int (*started_)() = nullptr;
+};
+
+} // namespace zyrtest
