@@ -270,6 +270,19 @@ TEST(IHardwareInfoTest, NullRecordsAndOverlargeCounts) {
     EXPECT_EQ(cpuPerf.str().find(L"\t\tCore 129 "), std::wstring::npos);
 }
 
+TEST(IHardwareInfoTest, CreateReturnsNullWhenAllocationFails) {
+    zyrtest::FailingHost host;
+    host.failAll = true;
+    ZYRStd::tZYRMemMgr record = host.record();
+    zyrtest::installFront(0, &record);
+    IHardwareInfo* info = createHardwareInfo();
+    const unsigned int calls = host.calls;
+    zyrtest::installFront(0);
+    EXPECT_EQ(info, nullptr);
+    EXPECT_GT(calls, 0u) << "the object was not allocated through the front";
+    delete info;
+}
+
 TEST(IHardwareInfoTest, ProcessorsAndSystemFromTheTree) {
     FakeTree tree;
     buildMachine(tree);

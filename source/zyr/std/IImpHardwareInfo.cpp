@@ -10,6 +10,8 @@
 #include <string>
 #include <vector>
 
+#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/CZYRError.h"
 #include "zyr/std/ZYRHardwareQuerySource.h"
 
 namespace ZYRStd {
@@ -97,7 +99,8 @@ template <std::size_t N> std::wstring wide(const char16_t (&field)[N]) {
     return out;
 }
 
-class IImpHardwareInfo final : public IHardwareInfo {
+// Its storage comes from the allocation front and counts against the memory limit.
+class IImpHardwareInfo final : public IHardwareInfo, public CZYRClientBase {
 public:
     explicit IImpHardwareInfo(const char* root) : source_(root ? root : "/") {}
 
@@ -284,7 +287,9 @@ IHardwareInfo* createHardwareInfo() {
 
 IHardwareInfo* createHardwareInfo(const char* systemRoot) {
     try {
-        return new (std::nothrow) IImpHardwareInfo(systemRoot);
+        return new IImpHardwareInfo(systemRoot);
+    } catch (const CZYRError&) {
+        return nullptr; // the front refused the object
     } catch (const std::bad_alloc&) {
         return nullptr; // the root's text could not be copied
     }

@@ -46,7 +46,12 @@ bool hasInvariantTsc() {
 #endif
 }
 
-const bool useTsc = hasInvariantTsc();
+// Asked on first use, so that a stop watch in another file's static initialiser sees the
+// same tick source as every later one.
+bool usesTsc() {
+    static const bool invariant = hasInvariantTsc();
+    return invariant;
+}
 
 long long monotonicNanos() {
     timespec ts{};
@@ -56,7 +61,7 @@ long long monotonicNanos() {
 
 inline long long readTicks() {
 #ifdef ZYR_TIMING_X86
-    if (useTsc) {
+    if (usesTsc()) {
         // lfence orders the read after earlier instructions as the serialising cpuid did,
         // without cpuid's exit to the hypervisor on virtual machines.
         _mm_lfence();
@@ -206,7 +211,7 @@ void ZYRTimingManager::InitTiming() {
     fAvgOuterConstructTime = rounded(outer.GetTotalTicks()) - fAvgInnerConstructTime;
 
     // 2. Ticks per second, against the monotonic clock.
-    if (!useTsc) {
+    if (!usesTsc()) {
         fClocksPerSec = 1000000000LL;
         return;
     }
@@ -243,7 +248,7 @@ long long ZYRTimingManager::GetAvgOuterConstructTime() {
 }
 
 bool ZYRTimingManager::UsesTimeStampCounter() {
-    return useTsc;
+    return usesTsc();
 }
 
 void ZYRTimingManager::InitializeSurfaceTime() {}
