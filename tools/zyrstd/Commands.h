@@ -14,5 +14,7 @@ int runEncode(int argc, char** argv);
 int runDecode(int argc, char** argv);
 // config FILE... | config --defaults: the effective start-up options after the setup files.
 int runConfig(int argc, char** argv);
+// hwinfo [--root DIR]: the hardware reports and the timing lines, in UTF-8.
+int runHwinfo(int argc, char** argv);
 
 } // namespace zyrtool

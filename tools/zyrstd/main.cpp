@@ -32,6 +32,10 @@ constexpr Command kCommands[] = {
      "                  on standard error\n"
      "  config --defaults\n"
      "                  print the options' defaults"},
+    {"hwinfo", zyrtool::runHwinfo,
+     "hwinfo [--root DIR]\n"
+     "                  print the memory, processor, operating-system, disk and load reports\n"
+     "                  and the timing calibration; --root reads /proc, /sys and /etc under DIR"},
     {"demo", zyrtool::runDemo,
      "demo            run a host start-up, allocation under a limit and the leak report"},
 };
