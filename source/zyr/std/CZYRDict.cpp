@@ -10,6 +10,7 @@
 #include "zyr/std/CZYRValue.h"
 #include "zyr/std/IImpDictEnumProcs.h"
 #include "zyr/std/ZYRErrorBoundary.h"
+#include "zyr/std/ZYRMem.h"
 
 namespace ZYRStd {
 
@@ -24,6 +25,25 @@ constexpr std::array<uint32_t, 28> kBucketPrimes{
     786433u,    1572869u,   3145739u,   6291469u,   12582917u,   25165843u,   50331653u,
     100663319u, 201326611u, 402653189u, 805306457u, 1610612741u, 3221225473u, 4294967291u};
 
+// A new dictionary starts with this many buckets; growth then follows the prime table, and
+// enumeration order follows the buckets, so hosts see both.
+constexpr uint32_t kInitialBuckets = 193;
+
+// hash % count without a division: Lemire's fastmod, exact for every 32-bit hash and count.
+// A look-up otherwise spends a good part of its time in the divider.
+class BucketIndex {
+public:
+    explicit BucketIndex(uint32_t count) : count_(count), inverse_(~uint64_t{0} / count + 1) {}
+    uint32_t operator()(uint32_t hash) const {
+        const uint64_t low = inverse_ * hash;
+        return static_cast<uint32_t>((static_cast<unsigned __int128>(low) * count_) >> 64);
+    }
+
+private:
+    uint64_t count_;
+    uint64_t inverse_;
+};
+
 uint32_t bucketCountFor(uint64_t needed) {
     const auto found = std::lower_bound(kBucketPrimes.begin(), kBucketPrimes.end(), needed);
     return found == kBucketPrimes.end() ? kBucketPrimes.back() : *found;
@@ -31,11 +51,9 @@ uint32_t bucketCountFor(uint64_t needed) {
 
 class IImp_ZYRDict final : public ContainerBase<I_Dict> {
 public:
-    IImp_ZYRDict() : buckets_(193, nullptr) {}
+    IImp_ZYRDict() : buckets_(kInitialBuckets, nullptr), bucketOf_(kInitialBuckets) {}
     ~IImp_ZYRDict() override {
-        for (Node*& head : buckets_)
-            while (head)
-                destroy(std::exchange(head, head->next));
+        // The node store releases every entry when it goes.
     }
 
     void enumerate(I_DictEnumProcs* procs, I_Error& err) override {
@@ -80,7 +98,7 @@ public:
                 raise(kZYRErrorBadParam, "Bad argument to IImp_ZYRDict::remove", __LINE__);
             refuseIfFinalized();
             const uint32_t hash = key->hashCode();
-            for (Node** link = &buckets_[hash % buckets_.size()]; *link; link = &(*link)->next) {
+            for (Node** link = &buckets_[bucketOf_(hash)]; *link; link = &(*link)->next) {
                 if (matches(*link, key, hash)) {
                     destroy(std::exchange(*link, (*link)->next));
                     --count_;
@@ -144,25 +162,90 @@ public:
     }
 
 private:
-    struct Node : CZYRClientBase {
-        Node(I_UniString* k, uint32_t h, CZYRValue v) : key(k), hash(h), value(std::move(v)) {
+    struct Node {
+        Node(I_UniString* k, uint32_t h, const CZYRValue& v) noexcept : key(k), hash(h), value(v) {
             key->addRef();
         }
-        ~Node() override { key->release(); }
+        ~Node() { key->release(); }
         Node* next = nullptr;
-        I_UniString* key;
-        uint32_t hash; // the key's hash, kept so that rehashing asks no string again
+        I_UniString* key; // null while the node waits on the free list
+        uint32_t hash;    // the key's hash, kept so that rehashing asks no string again
         CZYRValue value;
     };
 
-    static void destroy(Node* node) { delete node; }
+    // The nodes live in slabs from the front, growing from a few nodes for the many small
+    // dictionaries to a thousand for large ones: one allocation per slab instead of one per
+    // entry, and a destructor that walks memory in order instead of chasing chains.
+    class NodeStore {
+    public:
+        NodeStore() = default;
+        NodeStore(const NodeStore&) = delete;
+        NodeStore& operator=(const NodeStore&) = delete;
+        ~NodeStore() {
+            while (Slab* slab = slabs_) {
+                for (unsigned int i = 0; i < slab->used; ++i)
+                    if (slab->nodes()[i].key)
+                        slab->nodes()[i].~Node();
+                slabs_ = slab->next;
+                ZYRFree(slab);
+            }
+        }
+
+        Node* make(I_UniString* key, uint32_t hash, const CZYRValue& value) {
+            static_assert(
+                std::is_nothrow_constructible_v<Node, I_UniString*, uint32_t, const CZYRValue&>,
+                "a node is built in place and must not fail half way");
+            if (free_)
+                return ::new (std::exchange(free_, free_->next)) Node(key, hash, value);
+            if (!slabs_ || slabs_->used == slabs_->capacity)
+                addSlab();
+            return ::new (&slabs_->nodes()[slabs_->used++]) Node(key, hash, value);
+        }
+        void destroy(Node* node) noexcept {
+            node->~Node();
+            giveBack(node);
+        }
+
+    private:
+        struct Slab {
+            Slab* next;
+            unsigned int used;
+            unsigned int capacity;
+            Node* nodes() { return reinterpret_cast<Node*>(this + 1); }
+        };
+        static_assert(sizeof(Slab) % alignof(Node) == 0);
+
+        static constexpr unsigned int kFirstSlabNodes = 4;
+        static constexpr unsigned int kLargestSlabNodes = 1024;
+
+        // A node on the free list keeps only its link; a null key marks it unused.
+        void giveBack(Node* node) noexcept {
+            node->key = nullptr;
+            node->next = free_;
+            free_ = node;
+        }
+        void addSlab() {
+            const unsigned int capacity =
+                slabs_ ? std::min(slabs_->capacity * 2, kLargestSlabNodes) : kFirstSlabNodes;
+            void* memory =
+                ZYRMalloc(static_cast<unsigned int>(sizeof(Slab) + capacity * sizeof(Node)));
+            if (!memory)
+                throw ZYROutOfMemoryError(kSource, __LINE__);
+            slabs_ = ::new (memory) Slab{slabs_, 0, capacity};
+        }
+
+        Slab* slabs_ = nullptr;
+        Node* free_ = nullptr;
+    };
+
+    void destroy(Node* node) noexcept { nodes_.destroy(node); }
 
     static bool matches(const Node* node, I_UniString* key, uint32_t hash) {
         return node->hash == hash && (node->key == key || node->key->equals(key));
     }
 
     Node* find(I_UniString* key, uint32_t hash) const {
-        for (Node* node = buckets_[hash % buckets_.size()]; node; node = node->next)
+        for (Node* node = buckets_[bucketOf_(hash)]; node; node = node->next)
             if (matches(node, key, hash))
                 return node;
         return nullptr;
@@ -182,15 +265,17 @@ private:
         if (newCount <= buckets_.size())
             return;
         Buckets fresh(newCount, nullptr);
+        const BucketIndex freshOf(newCount);
         for (Node* head : buckets_) {
             while (head) {
                 Node* node = std::exchange(head, head->next);
-                Node*& slot = fresh[node->hash % newCount];
+                Node*& slot = fresh[freshOf(node->hash)];
                 node->next = slot;
                 slot = node;
             }
         }
         buckets_.swap(fresh);
+        bucketOf_ = freshOf;
     }
 
     void insertOrAssign(I_UniString* key, const CZYRValue& value) {
@@ -200,8 +285,8 @@ private:
             node->value = value; // the node keeps the key object it was first stored with
             return;
         }
-        Node*& head = buckets_[hash % buckets_.size()];
-        Node* node = new Node(key, hash, value);
+        Node*& head = buckets_[bucketOf_(hash)];
+        Node* node = nodes_.make(key, hash, value);
         node->next = head;
         head = node;
         ++count_;
@@ -229,7 +314,9 @@ private:
     }
 
     using Buckets = std::vector<Node*, CZYRStdAllocator<Node*>>;
+    NodeStore nodes_; // before the buckets that point into it
     Buckets buckets_;
+    BucketIndex bucketOf_;
     unsigned int count_ = 0;
 };
 

@@ -1,6 +1,7 @@
 // Unicode strings on ICU: construction, conversion, comparison, interning and path forms.
 #include "zyr/std/CZYRUniString.h"
 
+#include <atomic>
 #include <unicode/ucnv.h>
 #include <unicode/unistr.h>
 #include <unicode/utf16.h>
@@ -14,11 +15,11 @@
 
 #include "zyr/std/CZYRCommonUniStrings.h"
 #include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRUniqueID.h"
 #include "zyr/std/CZYRSmartPtr.h"
 #include "zyr/std/CZYRString.h"
 #include "zyr/std/ZYRErrorBoundary.h"
 #include "zyr/std/ZYRMem.h"
+#include "zyr/std/ZYRUniqueID.h"
 
 namespace ZYRStd {
 
@@ -176,7 +177,17 @@ public:
                (otherBytes == 0 || std::memcmp(data(), otherData, otherBytes) == 0);
     }
 
-    uint32_t hashCode() const override { return static_cast<uint32_t>(text_.hashCode()); }
+    // The text never changes once the string is shared, so its hash is worked out once.
+    // Threads that race here compute the same value, so relaxed order is enough; the high
+    // word marks the hash as known (a hash may well be 0).
+    uint32_t hashCode() const override {
+        uint64_t known = hash_.load(std::memory_order_relaxed);
+        if (known == 0) {
+            known = (uint64_t{1} << 32) | static_cast<uint32_t>(text_.hashCode());
+            hash_.store(known, std::memory_order_relaxed);
+        }
+        return static_cast<uint32_t>(known);
+    }
 
     const char* getUTF16LEBuffer(unsigned int* sizeInBytes) const override {
         if (!sizeInBytes)
@@ -212,6 +223,7 @@ private:
 
     uint64_t id_ = 0;
     icu::UnicodeString text_;
+    mutable std::atomic<uint64_t> hash_{0};
 };
 
 I_UniString* create(I_Error& err, const char* createMessage, auto&& build) {
