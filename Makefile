@@ -20,7 +20,7 @@ FUZZ_SECONDS ?= 60
 SOAK_SECONDS ?= 60
 
 .PHONY: all deps deps-test deps-bench deps-fuzz deps-package build demo test test-normal \
-        test-asan test-tsan bench fuzz soak install package clean format
+        test-asan test-tsan bench fuzz soak install package package-check clean format
 
 all: build
 
@@ -115,6 +115,17 @@ package: deps-package
 	cmake --build $(PACKAGE_BUILD)
 	cd $(PACKAGE_BUILD) && cpack -G DEB
 	@ls -1 $(PACKAGE_BUILD)/*.deb
+
+# Installs the packages of `make package` with apt (as root), builds and runs the install
+# test's consumer against them with pkg-config and with CMake, and removes them again.
+package-check: package
+	DEBIAN_FRONTEND=noninteractive apt-get install -y -qq ./$(PACKAGE_BUILD)/libzyrstd*.deb
+	g++ -std=c++20 tests/install/consumer/app.cpp -o $(PACKAGE_BUILD)/app-deb \
+	  $$(pkg-config --cflags --libs zyrstd-hostkit) && ./$(PACKAGE_BUILD)/app-deb
+	cmake -S tests/install/consumer -B $(PACKAGE_BUILD)/consumer -G Ninja && \
+	  cmake --build $(PACKAGE_BUILD)/consumer && ./$(PACKAGE_BUILD)/consumer/app
+	zyrstd --help > /dev/null
+	DEBIAN_FRONTEND=noninteractive apt-get remove -y -qq libzyrstd-dev libzyrstd0
 
 format:
 	clang-format -i $$(git ls-files '*.cpp' '*.h')
