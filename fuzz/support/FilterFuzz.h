@@ -3,6 +3,7 @@
 // input gives the input back.
 #pragma once
 
+#include <algorithm>
 #include <cstdlib>
 #include <string>
 
@@ -13,10 +14,11 @@ namespace zyrfuzz {
 using MemStream = ZYRStd::CZYRSmartZYRRefPtr<ZYRFileSys::IImpZYRMemStream>;
 using AnyStream = ZYRStd::CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>;
 
-inline MemStream memoryStream(const std::string& text) {
-    MemStream s(
-        new ZYRFileSys::IImpZYRMemStream(ZYRStreams::kZYRStreamRead | ZYRStreams::kZYRStreamWrite,
-                                         static_cast<unsigned int>(text.size() * 3 + 64), nullptr));
+// A stream holding `text`, with room for at least `room` bytes in all.
+inline MemStream memoryStream(const std::string& text, size_t room = 0) {
+    MemStream s(new ZYRFileSys::IImpZYRMemStream(
+        ZYRStreams::kZYRStreamRead | ZYRStreams::kZYRStreamWrite,
+        static_cast<unsigned int>(std::max(room, text.size()) + 64), nullptr));
     s->write(text.data(), 1, static_cast<unsigned int>(text.size()));
     s->setPos(0);
     return s;
@@ -45,7 +47,8 @@ template <class Encoder, class Decoder> void fuzzFilter(const uint8_t* data, siz
         // Malformed text is refused with an error; that is the contract.
     }
 
-    MemStream encoded = memoryStream("");
+    // Either encoding takes at most three characters a byte, line ends included.
+    MemStream encoded = memoryStream("", input.size() * 3);
     {
         Encoder encoder{AnyStream(encoded)};
         encoder.write(input.data(), 1, static_cast<unsigned int>(input.size()));
