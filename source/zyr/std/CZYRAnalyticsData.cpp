@@ -105,19 +105,6 @@ private:
     raise(kZYRErrorInvalidObject, "Null object", line);
 }
 
-// Runs `call` with a local status and throws what it recorded.
-template <class Call> auto throwing(Call call) {
-    C_Error err;
-    if constexpr (std::is_void_v<decltype(call(err))>) {
-        call(err);
-        throwCZYRErrorIfErrorOccurred(err);
-    } else {
-        auto result = call(err);
-        throwCZYRErrorIfErrorOccurred(err);
-        return result;
-    }
-}
-
 } // namespace
 
 I_AnalyticsData* createAnalyticsData(ZYRPublic::I_Error& err) {

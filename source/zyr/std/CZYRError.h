@@ -1,6 +1,8 @@
 // Errors as exceptions (CZYRError and its kin) and as statuses (C_Error), and the bridges.
 #pragma once
 
+#include <type_traits>
+
 #include <new>
 
 #include "I_Error.h"
@@ -122,5 +124,19 @@ ZYRSTD_API void throwCZYRErrorIfErrorOccurred(const I_Error& err);
 ZYRSTD_API eZYRErrorType ZYRErrorFromStdException(const std::exception& e) noexcept;
 ZYRSTD_API eZYRErrorType ZYRErrorFromJTError(unsigned int code) noexcept;
 [[noreturn]] ZYRSTD_API void throwAssertionFailed(const char* srcFileName, int srcLineNumber);
+
+// Runs `call` with a local status and throws what it recorded: how a value wrapper turns
+// a boundary operation's status back into an exception.
+template <class Call> auto throwing(Call call) {
+    C_Error err;
+    if constexpr (std::is_void_v<decltype(call(err))>) {
+        call(err);
+        throwCZYRErrorIfErrorOccurred(err);
+    } else {
+        auto result = call(err);
+        throwCZYRErrorIfErrorOccurred(err);
+        return result;
+    }
+}
 
 } // namespace ZYRStd

@@ -284,19 +284,6 @@ template <class Store> void cloneValue(const CZYRValue& value, I_Error& err, Sto
     raise(kZYRErrorInvalidObject, "Null object", line);
 }
 
-// Runs `call` with a local status and throws what it recorded.
-template <class Call> auto throwing(Call call) {
-    C_Error err;
-    if constexpr (std::is_void_v<decltype(call(err))>) {
-        call(err);
-        throwCZYRErrorIfErrorOccurred(err);
-    } else {
-        auto result = call(err);
-        throwCZYRErrorIfErrorOccurred(err);
-        return result;
-    }
-}
-
 inline bool missing(bool found, bool throwIfMissing) {
     if (!found && throwIfMissing)
         raise(kZYRErrorKeyNotFound, "Key not found", __LINE__);
