@@ -42,4 +42,19 @@ g++ -std=c++20 "$here/consumer/app.cpp" -o "$work/app-pc" \
 cmake -S "$here/consumer" -B "$work/consumer" -G Ninja -DCMAKE_PREFIX_PATH="$prefix" >/dev/null
 cmake --build "$work/consumer" >/dev/null
 "$work/consumer/app"
+
+# The demo logs analytics through the libKelvrin.so installed beside the library; without
+# it (a host that ships none) the demo still runs and analytics stay inactive.
+export TMPDIR="$work"
+out="$("$prefix/bin/zyrstd" demo)"
+grep -q "session file: $work/.*\.jsonl" <<<"$out" || {
+    echo "the installed demo wrote no telemetry session"; exit 1
+}
+if ! /sbin/ldconfig -p | grep -q libKelvrin.so; then
+    rm -f "$prefix"/lib/libKelvrin.so*
+    out="$("$prefix/bin/zyrstd" demo)" || { echo "the demo fails without libKelvrin.so"; exit 1; }
+    grep -q "libKelvrin.so was not found: analytics stay inactive" <<<"$out" || {
+        echo "without libKelvrin.so the demo did not say that analytics stay inactive"; exit 1
+    }
+fi
 echo "install test: ok"
