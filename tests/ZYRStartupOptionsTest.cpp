@@ -370,22 +370,16 @@ TEST(ZYRStartupOptionsTest, TypedSetters) {
     const char16_t folder[] = u"/var/log/analytics";
     ZYRSetAnalyticsLogFolder(folder);
     EXPECT_EQ(ZYRGetAnalyticsLogFolder(), folder) << "the pointer itself is kept";
-    ZYRSetImageBufferSize(4096);
-    EXPECT_EQ(ZYRGetImageBufferSize(), 4096u);
     ZYRSetXPShadeMarkerOption(0xFFFFFFFFu);
     EXPECT_EQ(ZYRGetXPShadeMarkerOption(), 0xFFFFFFFFu);
     ZYRSetMaxXobjToInvestigate(-3);
     EXPECT_EQ(ZYRGetMaxXobjToInvestigate(), -3);
-    ZYRSetLimitPlanarmapPrecision(eZYRPlanarmapPrecisionOption{2});
-    EXPECT_EQ(ZYRGetLimitPlanarmapPrecision(), eZYRPlanarmapPrecisionOption{2});
     ZYRSetMaxDiskUsage(1LL << 40);
     ZYRSetMaxSLInMemory(-1);
     ZYRSetMaxSurfacesOnQueue(1LL << 33);
     EXPECT_EQ(ZYRGetMaxDiskUsage(), 1LL << 40);
     EXPECT_EQ(ZYRGetMaxSLInMemory(), -1);
     EXPECT_EQ(ZYRGetMaxSurfacesOnQueue(), 1LL << 33);
-    ZYRSetShadeQuadLimit(0.75);
-    EXPECT_EQ(ZYRGetShadeQuadLimit(), 0.75);
 
     long long queue = 0;
     ZYRSetDefaultMaxSurfacesOnQueue(queue);
