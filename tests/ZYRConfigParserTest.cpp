@@ -272,13 +272,6 @@ TEST_F(ZYRConfigParserTest, LineEndsAndLineNumbers) {
     const Parsed failed = parseBuffer("A=1\r\n\r\n  Lonely\r\nB=2\r\n");
     EXPECT_TRUE(failed.missingValue);
     EXPECT_EQ(failed.errorLine, 3u);
-
-    // A callback without line numbers gets the same pairs.
-    std::string text = "A=1\nB 2\n";
-    PlainCollector plain;
-    ParseConfigData(reinterpret_cast<unsigned char*>(text.data()), ZYRPublic::kZYRConfigDataBuffer,
-                    static_cast<unsigned int>(text.size()), plain);
-    EXPECT_EQ(plain.pairs, (std::vector<Pair>{{"A", "1"}, {"B", "2"}}));
 }
 
 // Random texts of the format's hard parts, read in random block sizes, against the model.
