@@ -175,8 +175,6 @@ TEST(CZYRMaskCacheTest, ConversionMatchesAPerPixelReference) {
     EXPECT_EQ(size, 4u);
     EXPECT_EQ(mask->data[0], 0x01);
     EXPECT_TRUE(allZero(mask->data + 1, 3));
-    EXPECT_EQ(mask->width, 1);
-    EXPECT_EQ(mask->height, 1);
     cache.DeleteBitmapMask(mask);
     unsigned char twoNibbles[] = {0x12};
     mask = cache.CreateBitmapMask(twoNibbles, 2, 1, 1, size, true, false);

@@ -36,6 +36,12 @@ CZYRDict levels(std::initializer_list<std::pair<const char*, int32_t>> entries) 
     return d;
 }
 
+// A trace configuration with its "Path".
+CZYRDict withPath(const std::string& path, CZYRDict config = CZYRDict()) {
+    config.set(CZYRUniString("Path"), CZYRUniString(path.c_str()));
+    return config;
+}
+
 // Job parameters with "JPJobID" and a trace configuration.
 CZYRDict jobParams(const CZYRDict& config, int32_t jobId = 7) {
     CZYRDict params;
@@ -56,6 +62,25 @@ bool startsWith(const std::string& s, const std::string& prefix) {
     return s.compare(0, prefix.size(), prefix) == 0;
 }
 
+constexpr const char* kSource = "source/zyr/std/CZYRTraceMsg";
+
+// Runs `call`, which must throw a CZYRError of `type` and of the `message`, `file` and `line`
+// that are given.
+template <class Call>
+void expectError(Call call, ZYRPublic::eZYRErrorType type, const char* message = nullptr,
+                 const char* file = nullptr, int line = 0) {
+    try {
+        call();
+        ADD_FAILURE() << "no error";
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), type);
+        // Only what is given is checked.
+        EXPECT_STREQ(e.getMessage(), message ? message : e.getMessage());
+        EXPECT_STREQ(e.getSrcFileName(), file ? file : e.getSrcFileName());
+        EXPECT_EQ(e.getSrcLineNumber(), line ? line : e.getSrcLineNumber());
+    }
+}
+
 // Built on use: the string tables exist only once main() has run.
 CZYRUniString render() {
     return CZYRUniString("Render");
@@ -65,10 +90,7 @@ const char16_t* const kNoWide = nullptr;
 } // namespace
 
 TEST_F(CZYRTraceMsgTest, HeadLayoutOfTheWriter) {
-    // Open the log in the temporary directory through a configuration.
-    CZYRDict config;
-    config.set(CZYRUniString("Path"), CZYRUniString(dir.file("t.log").c_str()));
-    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config)));
+    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(withPath(dir.file("t.log")))));
     ASSERT_EQ(ZYRGetTraceLogPath(), dir.file("t.log"));
 
     CZYRProgressInterface writer;
@@ -93,8 +115,7 @@ TEST_F(CZYRTraceMsgTest, HeadLayoutOfTheWriter) {
 }
 
 TEST_F(CZYRTraceMsgTest, BeginContinuationEndLayoutAndWideTexts) {
-    CZYRDict config = levels({{"Default", 0}});
-    config.set(CZYRUniString("Path"), CZYRUniString(dir.file("t.log").c_str()));
+    CZYRDict config = withPath(dir.file("t.log"), levels({{"Default", 0}}));
     config.set(render(), levels({{"Bands", 3}}));
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config, 12)));
 
@@ -130,8 +151,7 @@ TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
     EXPECT_EQ(mapToTraceMsgLevel(-5), 0);
     EXPECT_EQ(mapToTraceMsgLevel(8), 8);
 
-    CZYRDict config;
-    config.set(CZYRUniString("Path"), CZYRUniString("stdout"));
+    CZYRDict config = withPath("stdout");
     config.set(CZYRUniString("Default"), 5u);
     config.set(CZYRUniString("Nine"), levels({{"All", 9}, {"Cat", 1}}));
     config.set(CZYRUniString("Kept"), levels({{"Cat", 531308012}}));
@@ -142,38 +162,35 @@ TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
     config.set(CZYRUniString("NotADict"), 4u);
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config)));
 
+    // Levels are remembered per string object: asked again, through other objects of the
+    // same text, and with many areas in turn, each pair keeps its own level.
     const CZYRUniString cat("Cat");
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Nine"), cat), 8) << "All wins and maps";
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Kept"), cat), 531308012);
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Negative"), cat), 0);
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), cat), 5) << "configuration Default";
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), CZYRUniString("Other")), 2);
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Unknown"), cat), 0);
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("NotADict"), cat), 0);
-    EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString(), cat), 0);
-
-    // Levels are remembered per string object; other objects of the same text and many
-    // areas in turn still get their own levels.
     C_Error err;
     const CZYRUniString loose(createUniString("Nine", err), false);
     const CZYRUniString looseCat(createUniString("Cat", err), false);
     for (int round = 0; round < 3; ++round) {
-        EXPECT_EQ(trace.getTraceMsgLevel(loose, looseCat), 8);
-        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), CZYRUniString("Other")), 2);
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Nine"), cat), 8) << "All wins and maps";
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Kept"), cat), 531308012);
-        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), cat), 5);
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Negative"), cat), 0);
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), cat), 5)
+            << "configuration Default";
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), CZYRUniString("Other")), 2);
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Unknown"), cat), 0);
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("NotADict"), cat), 0);
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString(), cat), 0);
+        EXPECT_EQ(trace.getTraceMsgLevel(loose, looseCat), 8);
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Nine"), CZYRUniString("Zzz")), 8);
     }
 }
 
+// "stdout" opens no file and sends everything to the host.
 TEST_F(CZYRTraceMsgTest, AllOverridesAreasAndLevelZeroPasses) {
     FakeProgress* host = nullptr;
-    CZYRDict config = levels({{"All", 3}});
-    config.set(CZYRUniString("Path"), CZYRUniString("stdout"));
+    CZYRDict config = withPath("stdout", levels({{"All", 3}}));
     config.set(render(), levels({{"All", 8}}));
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config), &host));
     ASSERT_TRUE(trace.isSendToHost());
+    EXPECT_EQ(ZYRGetTraceLogPath(), "");
 
     trace.traceMsg(render(), CZYRUniString("X"), ZYRPublic::kZYRTraceMsgLevel3, "three");
     trace.traceMsg(render(), CZYRUniString("X"), ZYRPublic::kZYRTraceMsgLevel4, "four");
@@ -181,19 +198,24 @@ TEST_F(CZYRTraceMsgTest, AllOverridesAreasAndLevelZeroPasses) {
                    "zero");
     trace.traceMsg(CZYRUniString("Elsewhere"), CZYRUniString(), ZYRPublic::kZYRTraceMsgLevel8,
                    "forced", true);
-    ASSERT_EQ(host->calls.size(), 3u);
+    trace.beginTraceMsg(render(), CZYRUniString("B"), ZYRPublic::kZYRTraceMsgLevel1, u"wide");
+    trace.traceMsg(u"part");
+    trace.endTraceMsg();
+    ASSERT_EQ(host->calls.size(), 6u);
     EXPECT_EQ(host->calls[0].text, "three");
     EXPECT_EQ(host->calls[0].level, 3);
     EXPECT_EQ(host->calls[1].text, "zero");
     EXPECT_EQ(host->calls[2].text, "forced");
+    EXPECT_EQ(host->calls[3].text, "wide");
+    EXPECT_EQ(host->calls[4].text, "part");
+    EXPECT_EQ(host->calls[5].kind, "end");
     EXPECT_EQ(trace.getTraceMsgLevel(render(), CZYRUniString("X")), 3);
 }
 
 TEST_F(CZYRTraceMsgTest, RoutingToTheHost) {
     FakeProgress* host = nullptr;
-    CZYRDict config = levels({{"All", 8}});
-    config.set(CZYRUniString("Path"), CZYRUniString(dir.file("t.log").c_str()));
-    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config), &host));
+    CZYRTraceMsg trace(
+        zyrtest::makeJob(jobParams(withPath(dir.file("t.log"), levels({{"All", 8}}))), &host));
     EXPECT_FALSE(trace.isSendToHost());
 
     const CZYRUniString fontMgr("FontMgr");
@@ -218,26 +240,9 @@ TEST_F(CZYRTraceMsgTest, RoutingToTheHost) {
     EXPECT_NE(log.find("[C:FontMgr/Other] \nto log\n"), std::string::npos) << log;
 
     // A later "stdout" configuration keeps the open log and does not send to the host.
-    CZYRDict toHost;
-    toHost.set(CZYRUniString("Path"), CZYRUniString("stdout"));
-    CZYRTraceMsg later(zyrtest::makeJob(jobParams(toHost)));
+    CZYRTraceMsg later(zyrtest::makeJob(jobParams(withPath("stdout"))));
     EXPECT_FALSE(later.isSendToHost());
     EXPECT_EQ(ZYRGetTraceLogPath(), dir.file("t.log"));
-}
-
-TEST_F(CZYRTraceMsgTest, StdoutPathOpensNoFileAndSendsEverythingToTheHost) {
-    FakeProgress* host = nullptr;
-    CZYRDict config = levels({{"All", 2}});
-    config.set(CZYRUniString("Path"), CZYRUniString("stdout"));
-    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config), &host));
-    EXPECT_EQ(ZYRGetTraceLogPath(), "");
-    trace.beginTraceMsg(render(), CZYRUniString("B"), ZYRPublic::kZYRTraceMsgLevel1, u"wide");
-    trace.traceMsg(u"part");
-    trace.endTraceMsg();
-    ASSERT_EQ(host->calls.size(), 3u);
-    EXPECT_EQ(host->calls[0].text, "wide");
-    EXPECT_EQ(host->calls[1].text, "part");
-    EXPECT_EQ(host->calls[2].kind, "end");
 }
 
 TEST_F(CZYRTraceMsgTest, WithoutConfigurationOnlyAlwaysTraceReachesStandardOutput) {
@@ -264,10 +269,9 @@ TEST_F(CZYRTraceMsgTest, WithoutConfigurationOnlyAlwaysTraceReachesStandardOutpu
 }
 
 TEST_F(CZYRTraceMsgTest, OpenFailureWarnsAndFallsBackToStandardOutput) {
-    CZYRDict config = levels({{"All", 8}});
-    config.set(CZYRUniString("Path"), CZYRUniString(dir.file("missing/dir/t.log").c_str()));
     ::testing::internal::CaptureStdout();
-    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config)));
+    CZYRTraceMsg trace(
+        zyrtest::makeJob(jobParams(withPath(dir.file("missing/dir/t.log"), levels({{"All", 8}})))));
     trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel1, "shown");
     const std::string out = ::testing::internal::GetCapturedStdout();
     EXPECT_TRUE(startsWith(out, "TRACE WARNING: File open failed for trace log file. Trace logs "
@@ -293,8 +297,7 @@ TEST_F(CZYRTraceMsgTest, DefaultLogIsInTheTemporaryDirectory) {
 }
 
 TEST_F(CZYRTraceMsgTest, ProcessWideDictionaryMerges) {
-    CZYRDict global = levels({{"Default", 1}});
-    global.set(CZYRUniString("Path"), CZYRUniString("stdout"));
+    CZYRDict global = withPath("stdout", levels({{"Default", 1}}));
     global.set(render(), levels({{"All", 6}}));
     ZYRTracingDict::getInstance().setTracingDict(global);
     // The stored dictionary is a clone: later changes to the original do not reach it.
@@ -321,9 +324,7 @@ TEST_F(CZYRTraceMsgTest, ProcessWideDictionaryMerges) {
 }
 
 TEST_F(CZYRTraceMsgTest, TwoThreadsNeverMixHeadsAndTexts) {
-    CZYRDict config = levels({{"All", 8}});
-    config.set(CZYRUniString("Path"), CZYRUniString(dir.file("t.log").c_str()));
-    CZYRDict params = jobParams(config);
+    CZYRDict params = jobParams(withPath(dir.file("t.log"), levels({{"All", 8}})));
     params.finalize();
     const auto job = zyrtest::makeJob(params);
     { CZYRTraceMsg open(job); }
@@ -350,76 +351,43 @@ TEST_F(CZYRTraceMsgTest, TwoThreadsNeverMixHeadsAndTexts) {
 }
 
 TEST_F(CZYRTraceMsgTest, ConstructionFailures) {
-    // No progress interface.
-    auto set = zyrtest::make<zyrtest::FakeInterfaceSet>();
     auto job = zyrtest::make<zyrtest::FakeJob>();
-    job->interfaces = set;
-    try {
-        CZYRTraceMsg trace{C_SmartPtr<ZYRPublic::I_Job>(job)};
-        FAIL() << "no progress interface";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorBadParam);
-        EXPECT_STREQ(e.getMessage(), "Required OEM interface not found");
-        EXPECT_EQ(e.getSrcLineNumber(), 42);
-    }
-    // No interface set at all.
+    job->interfaces = zyrtest::make<zyrtest::FakeInterfaceSet>();
+    const auto build = [&] { CZYRTraceMsg trace{C_SmartPtr<ZYRPublic::I_Job>(job)}; };
+    expectError(build, ZYRPublic::kZYRErrorBadParam, "Required OEM interface not found", nullptr,
+                42);
     job->interfaces.reset();
-    try {
-        CZYRTraceMsg trace{C_SmartPtr<ZYRPublic::I_Job>(job)};
-        FAIL() << "no interface set";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInitFailed);
-        EXPECT_STREQ(e.getMessage(), "Error getting OEM Interface");
-    }
+    expectError(build, ZYRPublic::kZYRErrorInitFailed, "Error getting OEM Interface");
     // A surface whose walk breaks.
-    try {
-        CZYRTraceMsg trace(zyrtest::makeSurface(4, C_SmartPtr<ZYRPublic::I_Job>()));
-        FAIL() << "no job behind the surface";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInvalidData);
-        EXPECT_STREQ(e.getMessage(), "miss job");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRTraceMsg");
-    }
+    expectError([] { CZYRTraceMsg trace(zyrtest::makeSurface(4, C_SmartPtr<ZYRPublic::I_Job>())); },
+                ZYRPublic::kZYRErrorInvalidData, "miss job", kSource);
     EXPECT_THROW(CZYRTraceMsg(C_SmartPtr<ZYRPublic::I_Surface>()), CZYRError);
 
     // A complete surface chain finds the job.
     FakeProgress* host = nullptr;
-    CZYRDict config;
-    config.set(CZYRUniString("Path"), CZYRUniString("stdout"));
-    CZYRTraceMsg fromSurface(zyrtest::makeSurface(4, zyrtest::makeJob(jobParams(config), &host)));
+    CZYRTraceMsg fromSurface(
+        zyrtest::makeSurface(4, zyrtest::makeJob(jobParams(withPath("stdout")), &host)));
     fromSurface.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, "ok");
     EXPECT_EQ(host->calls.size(), 1u);
 }
 
 TEST_F(CZYRTraceMsgTest, HostFailuresAreThrown) {
     FakeProgress* host = nullptr;
-    CZYRDict config;
-    config.set(CZYRUniString("Path"), CZYRUniString("stdout"));
-    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config), &host));
+    CZYRTraceMsg trace(zyrtest::makeJob(jobParams(withPath("stdout")), &host));
     host->failWith = ZYRPublic::kZYRErrorTypeCheck;
-    try {
-        trace.beginTraceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, "x");
-        FAIL();
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorTypeCheck);
-    }
+    expectError(
+        [&] { trace.beginTraceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, "x"); },
+        ZYRPublic::kZYRErrorTypeCheck);
     EXPECT_THROW(trace.traceMsg("more"), CZYRError) << "the begun message is open";
     host->failWith = ZYRPublic::kZYRErrorNoError;
     host->throwForeign = true;
-    try {
-        trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, kNoWide);
-        FAIL();
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorUnknown);
-        EXPECT_STREQ(e.getMessage(), "Unknown exception in CZYRTraceMsg::traceMsg");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRTraceMsg");
-    }
+    expectError([&] { trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, kNoWide); },
+                ZYRPublic::kZYRErrorUnknown, "Unknown exception in CZYRTraceMsg::traceMsg",
+                kSource);
 }
 
 TEST_F(CZYRTraceMsgTest, CallbackWritesLevelFourTextsAndTakesTheLeakReport) {
-    CZYRDict config;
-    config.set(CZYRUniString("Path"), CZYRUniString(dir.file("t.log").c_str()));
-    { CZYRTraceMsg open(zyrtest::makeJob(jobParams(config))); }
+    { CZYRTraceMsg open(zyrtest::makeJob(jobParams(withPath(dir.file("t.log"))))); }
 
     sZYRTraceMsg msg{"four ", nullptr};
     sZYRTraceMsgDetail detail{4, nullptr, 0, nullptr, 0, 0};

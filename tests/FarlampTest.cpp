@@ -26,6 +26,25 @@ std::u16string wide(const std::string& s) {
     return std::u16string(s.begin(), s.end());
 }
 
+// The recorder's calls for the entries "key,value" of group `id`, after the group's creation
+// when it has a `name` (and a `label`, when not the name).
+Calls group(int id, const char* name, std::initializer_list<const char*> entries,
+            const char* label = nullptr) {
+    const std::string number = std::to_string(id);
+    Calls calls;
+    if (name)
+        calls.push_back(std::string("UTNewDataGroup(") + name + ",," + (label ? label : name) +
+                        ")=" + number);
+    for (const char* entry : entries)
+        calls.push_back("UTAddToGroup(" + number + "," + entry + ")");
+    return calls;
+}
+
+Calls operator+(Calls first, const Calls& second) {
+    first.insert(first.end(), second.begin(), second.end());
+    return first;
+}
+
 std::u16string drainErrorStack() {
     std::u16string text;
     CZYRErrorStk stack;
@@ -53,13 +72,20 @@ protected:
         (void)recorder.take();
     }
 
-    // An enabled record of group `group`; values are set by the caller.
-    static CZYRAnalyticsData record(const char* group) {
+    // An enabled record of group `group` with the given key and value pairs.
+    template <class... Pairs> static CZYRAnalyticsData record(const char* group, Pairs... pairs) {
         ZYRSetAnalyticsActive(true);
         CZYRAnalyticsData r;
         if (group)
             r.set(CZYRUniString("DataGroupName"), CZYRUniString(group));
+        setPairs(r, pairs...);
         return r;
+    }
+    static void setPairs(CZYRAnalyticsData&) {}
+    template <class Value, class... Rest>
+    static void setPairs(CZYRAnalyticsData& r, const char* key, Value value, Rest... rest) {
+        r.set(CZYRUniString(key), value);
+        setPairs(r, rest...);
     }
 
     RecordingKelvrin& recorder = RecordingKelvrin::get();
@@ -111,51 +137,24 @@ TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
 
 TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
     start();
-    auto product = record("ProductInfo");
-    product.set(CZYRUniString("OEMName"), CZYRUniString("Acme"));
-    product.set(CZYRUniString("OEMModelName"), CZYRUniString("P1"));
-    product.set(CZYRUniString("NumDevices"), CZYRUniString("2"));
-    product.set(CZYRUniString("InstanceMode"), CZYRUniString("Single"));
-    product.set(CZYRUniString("xobjMode"), 2u);
-    Farlamp::LogDataObject(product);
-
-    auto font = record("FontInfo");
-    font.set(CZYRUniString("NumSubstFont"), 3u);
-    font.set(CZYRUniString("UseDefaultFont"), true);
-    font.set(CZYRUniString("UseFontEmulation"), int32_t{-1});
-    Farlamp::LogDataObject(font);
-
-    auto drip = record("DripSessionInfo");
-    drip.set(CZYRUniString("NumWorkers"), 4u);
-    drip.set(CZYRUniString("WorkerCrashedCount"), 0u);
-    Farlamp::LogDataObject(drip);
-
-    auto control = record("dripCntrlJobInfo");
-    control.set(CZYRUniString("JobStatus"), CZYRUniString("Done"));
-    control.set(CZYRUniString("JobCompleteTime"), 2.5);
-    control.set(CZYRUniString("NumSurfaces"), 9u);
-    Farlamp::LogDataObject(control);
-
-    auto error = record("ErrorInfo");
-    error.set(CZYRUniString("Area"), CZYRUniString("PDF"));
-    error.set(CZYRUniString("Type"), CZYRUniString("kZYRErrorPDF"));
-    error.set(CZYRUniString("Parameter1"), CZYRUniString("page 3"));
-    Farlamp::LogDataObject(error);
-
-    auto job = record("JobInfo");
-    job.set(CZYRUniString("StartTime"), 10.0);
-    job.set(CZYRUniString("SurfaceCount"), 2u);
-    job.set(CZYRUniString("TotalMediaSize"), 1.5);
-    job.set(CZYRUniString("ErrorOccured"), CZYRUniString(u"n\u00e9"));
+    using S = CZYRUniString;
+    Farlamp::LogDataObject(record("ProductInfo", "OEMName", S("Acme"), "OEMModelName", S("P1"),
+                                  "NumDevices", S("2"), "InstanceMode", S("Single"), "xobjMode",
+                                  2u));
+    Farlamp::LogDataObject(record("FontInfo", "NumSubstFont", 3u, "UseDefaultFont", true,
+                                  "UseFontEmulation", int32_t{-1}));
+    Farlamp::LogDataObject(record("DripSessionInfo", "NumWorkers", 4u, "WorkerCrashedCount", 0u));
+    Farlamp::LogDataObject(record("dripCntrlJobInfo", "JobStatus", S("Done"), "JobCompleteTime",
+                                  2.5, "NumSurfaces", 9u));
+    Farlamp::LogDataObject(record("ErrorInfo", "Area", S("PDF"), "Type", S("kZYRErrorPDF"),
+                                  "Parameter1", S("page 3")));
+    const auto job = record("JobInfo", "StartTime", 10.0, "SurfaceCount", 2u, "TotalMediaSize", 1.5,
+                            "ErrorOccured", S(u"n\u00e9"));
     Farlamp::LogDataObject(job);
-
-    auto raster = record("RasterCacheInfo");
-    raster.set(CZYRUniString("NumSmallRasters"), 5u);
-    raster.set(CZYRUniString("RasterDiskCachingEnabled"), false);
+    const auto raster =
+        record("RasterCacheInfo", "NumSmallRasters", 5u, "RasterDiskCachingEnabled", false);
     Farlamp::LogDataObject(raster);
-
-    auto dl = record("DLCacheInfo");
-    dl.set(CZYRUniString("NumLargeDLs"), 1u);
+    const auto dl = record("DLCacheInfo", "NumLargeDLs", 1u);
     Farlamp::LogDataObject(dl);
 
     // Records without a known group name are not logged.
@@ -163,57 +162,35 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
     Farlamp::LogDataObject(record(nullptr));
     Farlamp::LogDataObject(C_SmartPtr<I_AnalyticsData>());
 
-    const Calls expected = {
-        "UTNewDataGroup(ProductInfo,,ProductInfo)=100",
-        "UTAddToGroup(100,OEMName,Acme)",
-        "UTAddToGroup(100,OEMModelName,P1)",
-        "UTAddToGroup(100,NumDevices,2)",
-        "UTAddToGroup(100,InstanceMode,Single)",
-        "UTAddToGroup(100,xobjMode,2)",
-        "UTNewDataGroup(FontInfo,,FontInfo)=101",
-        "UTAddToGroup(101,NumSubstFont,3)",
-        "UTAddToGroup(101,PreferredFont,ERROR : PreferredFont Not Found)",
-        "UTAddToGroup(101,UseDefaultFont,1)",
-        "UTAddToGroup(101,UseFontEmulation,-1)",
-        "UTNewDataGroup(DripSessionInfo,,DripSessionInfo)=102",
-        "UTAddToGroup(102,NumWorkers,4)",
-        "UTAddToGroup(102,WorkerCrashedCount,0)",
-        "UTNewDataGroup(dripCntrlJobInfo,,dripCntrlJobInfo)=103",
-        "UTAddToGroup(103,JobStatus,Done)",
-        "UTAddToGroup(103,JobCompleteTime,2.5)",
-        "UTAddToGroup(103,NumSurfaces,9)",
-        "UTNewDataGroup(ErrorInfo,,ErrorInfo)=104",
-        "UTAddToGroup(104,Area,PDF)",
-        "UTAddToGroup(104,Type,kZYRErrorPDF)",
-        "UTAddToGroup(104,Parameter1,page 3)",
-        "UTNewDataGroup(JobInfo,,JobInfo)=105",
-        "UTAddToGroup(105,SurfaceCount,2)",
-        "UTAddToGroup(105,TotalMediaSize,1.5)",
-        "UTAddToGroup(105,ErrorOccured,n\xc3\xa9)",
-        "UTAddToGroup(105,NumSmallRasters,5)",
-        "UTAddToGroup(105,RasterDiskCachingEnabled,0)",
-        "UTAddToGroup(105,NumLargeDLs,1)",
-    };
+    const Calls expected =
+        group(100, "ProductInfo",
+              {"OEMName,Acme", "OEMModelName,P1", "NumDevices,2", "InstanceMode,Single",
+               "xobjMode,2"}) +
+        group(101, "FontInfo",
+              {"NumSubstFont,3", "PreferredFont,ERROR : PreferredFont Not Found",
+               "UseDefaultFont,1", "UseFontEmulation,-1"}) +
+        group(102, "DripSessionInfo", {"NumWorkers,4", "WorkerCrashedCount,0"}) +
+        group(103, "dripCntrlJobInfo", {"JobStatus,Done", "JobCompleteTime,2.5", "NumSurfaces,9"}) +
+        group(104, "ErrorInfo", {"Area,PDF", "Type,kZYRErrorPDF", "Parameter1,page 3"}) +
+        group(105, "JobInfo", {"SurfaceCount,2", "TotalMediaSize,1.5", "ErrorOccured,n\xc3\xa9"}) +
+        // The cache groups add to the job's group.
+        group(105, nullptr, {"NumSmallRasters,5", "RasterDiskCachingEnabled,0", "NumLargeDLs,1"});
     EXPECT_EQ(recorder.take(), expected);
 
     // The job's start time gives its completion time; the next job gets a new group.
     Farlamp::LogEvent(kZYRAnalyticsEventHasTransparency, false);
     Farlamp::FlushJob(12.345);
-    const Calls flushed = {"UTAddToGroup(105,CompletionTime,2.35)",
-                           "UTAddToGroup(105,HasTrapping,0)",
-                           "UTAddToGroup(105,HasTransparency,1)"};
-    EXPECT_EQ(recorder.take(), flushed);
+    EXPECT_EQ(recorder.take(),
+              group(105, nullptr, {"CompletionTime,2.35", "HasTrapping,0", "HasTransparency,1"}));
     Farlamp::LogDataObject(job);
     EXPECT_EQ(recorder.take().front(), "UTNewDataGroup(JobInfo,,JobInfo)=106");
 
     // A product mode other than 0 and 2 keeps the cache groups out.
-    auto other = record("ProductInfo");
-    other.set(CZYRUniString("xobjMode"), 1u);
-    Farlamp::LogDataObject(other);
+    Farlamp::LogDataObject(record("ProductInfo", "xobjMode", 1u));
     Farlamp::LogDataObject(raster);
     Farlamp::LogDataObject(dl);
-    const Calls onlyProduct = {"UTAddToGroup(100,xobjMode,1)"};
-    EXPECT_EQ(recorder.take(), onlyProduct) << "the product group is reused";
+    EXPECT_EQ(recorder.take(), group(100, nullptr, {"xobjMode,1"}))
+        << "the product group is reused";
 
     // The product group exists, so closing adds no placeholder.
     Farlamp::CloseSession();
@@ -232,13 +209,9 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
     info.set(CZYRUniString("SecurityType"), 0u);
     info.set(CZYRUniString("NumPages"), 12u);
     Farlamp::LogDict(info);
-    const Calls facts = {"UTNewDataGroup(PDFInfo,,PDFInfo)=100",
-                         "UTAddToGroup(100,PDFVersion,1.7)",
-                         "UTAddToGroup(100,PDFX,1)",
-                         "UTAddToGroup(100,creatorApp,Writer)",
-                         "UTAddToGroup(100,PreTrapped,False)",
-                         "UTAddToGroup(100,HasPassword,0)",
-                         "UTAddToGroup(100,NumPages,12)"};
+    const Calls facts = group(100, "PDFInfo",
+                              {"PDFVersion,1.7", "PDFX,1", "creatorApp,Writer", "PreTrapped,False",
+                               "HasPassword,0", "NumPages,12"});
     EXPECT_EQ(recorder.take(), facts);
     info.set(CZYRUniString("DataGroupName"), CZYRUniString("Other"));
     Farlamp::LogDict(info);
@@ -246,20 +219,12 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
 
     Farlamp::LogZYRError(kZYRErrorBadParam, "Streams", "source/zyr/std\\deep/CZYRDict.cpp");
     Farlamp::LogZYRError(kZYRErrorFatal, "Init", "plain.cpp");
-    const Calls errors = {"UTNewDataGroup(ErrorInfo,,ErrorInfo)=101",
-                          "UTAddToGroup(101,Area,Streams)",
-                          "UTAddToGroup(101,Type,kZYRErrorBadParam)",
-                          "UTAddToGroup(101,Parameter1,CZYRDict.cpp)",
-                          "UTAddToGroup(101,Parameter2,)",
-                          "UTAddToGroup(101,Parameter3,)",
-                          "UTAddToGroup(101,Fatal,0)",
-                          "UTNewDataGroup(ErrorInfo,,ErrorInfo)=102",
-                          "UTAddToGroup(102,Area,Init)",
-                          "UTAddToGroup(102,Type,kZYRErrorFatal)",
-                          "UTAddToGroup(102,Parameter1,plain.cpp)",
-                          "UTAddToGroup(102,Parameter2,)",
-                          "UTAddToGroup(102,Parameter3,)",
-                          "UTAddToGroup(102,Fatal,1)"};
+    const Calls errors = group(101, "ErrorInfo",
+                               {"Area,Streams", "Type,kZYRErrorBadParam", "Parameter1,CZYRDict.cpp",
+                                "Parameter2,", "Parameter3,", "Fatal,0"}) +
+                         group(102, "ErrorInfo",
+                               {"Area,Init", "Type,kZYRErrorFatal", "Parameter1,plain.cpp",
+                                "Parameter2,", "Parameter3,", "Fatal,1"});
     EXPECT_EQ(recorder.take(), errors);
     EXPECT_EQ(drainErrorStack(), u"");
 
@@ -270,10 +235,10 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
 
     // Never created, the product group gets placeholders when the session closes.
     Farlamp::CloseSession();
-    const Calls closing = {
-        "UTNewDataGroup(ProductInfo,,ProductInfo)=104", "UTAddToGroup(104,OEMName,NoData)",
-        "UTAddToGroup(104,OEMModelName,NoData)",        "UTAddToGroup(104,NumDevices,NoData)",
-        "UTAddToGroup(104,InstanceMode,NoData)",        "UTCloseSession()"};
+    const Calls closing = group(104, "ProductInfo",
+                                {"OEMName,NoData", "OEMModelName,NoData", "NumDevices,NoData",
+                                 "InstanceMode,NoData"}) +
+                          Calls{"UTCloseSession()"};
     EXPECT_EQ(recorder.take(), closing);
 }
 
@@ -315,15 +280,13 @@ TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
     EXPECT_EQ(recorder.take(), Calls{}) << "the run is still open";
     Farlamp::UpdateCurrentSurfaceInfo(1000.9, 500, 0);
     Farlamp::LogSurfaceDataGroup();
-    const Calls firstRun = {"UTNewDataGroup(SurfaceInfo,,Surface)=100",
-                            "UTAddToGroup(100,Surface Resolution,2480X3508)",
-                            "UTAddToGroup(100,Placed Objects,4)", "UTAddToGroup(100,count,3)"};
-    EXPECT_EQ(recorder.take(), firstRun);
+    EXPECT_EQ(recorder.take(),
+              group(100, "SurfaceInfo",
+                    {"Surface Resolution,2480X3508", "Placed Objects,4", "count,3"}, "Surface"));
     Farlamp::FlushJob(0);
-    const Calls lastRun = {"UTNewDataGroup(SurfaceInfo,,Surface)=101",
-                           "UTAddToGroup(101,Surface Resolution,1000X500)",
-                           "UTAddToGroup(101,Placed Objects,0)", "UTAddToGroup(101,count,1)"};
-    EXPECT_EQ(recorder.take(), lastRun);
+    EXPECT_EQ(recorder.take(),
+              group(101, "SurfaceInfo",
+                    {"Surface Resolution,1000X500", "Placed Objects,0", "count,1"}, "Surface"));
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take(), Calls{}) << "a flushed run is not logged again";
 

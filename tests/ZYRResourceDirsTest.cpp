@@ -156,8 +156,6 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     EXPECT_EQ(ZYRGetTempDirectory(), "/tmp/zyr work");
 }
 
-// Whichever allocation fails, the call either throws or hands out what it built, and
-// nothing is lost.
 TEST(ZYRResourceDirsTest, FirstCacheNamesOfAProcessAre1001And1002) {
     // The death-test child runs only this statement, so its counter is untouched.
     EXPECT_EXIT(
@@ -178,6 +176,8 @@ TEST(ZYRResourceDirsTest, FirstCacheNamesOfAProcessAre1001And1002) {
         ::testing::ExitedWithCode(0), "");
 }
 
+// Whichever allocation fails, the call either throws or hands out what it built, and
+// nothing is lost.
 TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
     zyrtest::FailingHost host;
     tZYRMemMgr record = host.record();

@@ -2,7 +2,9 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <ranges>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "TestSupport.h"
@@ -12,107 +14,61 @@ namespace {
 using zyrtest::Outcome;
 using zyrtest::writeFile;
 
-// Every option with its default, in print order; the RAM budget depends on the machine.
-constexpr const char* kDefaultsBeforeRAM = "NumMTRThreads = -1\n"
-                                           "NumMTBThreads = -1\n"
-                                           "MTRThreshold = 100000\n"
-                                           "MTRFallbackPerBand = true\n"
-                                           "HasExternalCompositor = false\n";
-constexpr const char* kDefaultsAfterRAM = "XObjDLCacheMaxDisk = 9223372036854775807\n"
-                                          "VDPThroughFlattener = true\n"
-                                          "XObjDLSharedCache = false\n"
-                                          "MaxPatternCacheEntry = 50\n"
-                                          "ImageMarkerType = 0\n"
-                                          "ImageMarkerTiling = 0\n"
-                                          "ImageMarkerFactorSourceStep = 1.5\n"
-                                          "ImageMarkerFactorTiling = 1\n"
-                                          "MeshMarkerFactorD11 = 0.125\n"
-                                          "MeshMarkerFactorD18 = 0.125\n"
-                                          "MeshMarkerFactorD48 = 0.25\n"
-                                          "SSE2 = 1\n"
-                                          "UseNewImageMarker = 1\n"
-                                          "OverScanIdntImageMaskMarking = true\n"
-                                          "SLCompression = 1\n"
-                                          "SLCompressionRatio = 1.5\n"
-                                          "SL0CompressionRatio = 2\n"
-                                          "UseNullGraphics = false\n"
-                                          "MaxCacheShades = 100\n"
-                                          "RasterizeTilingPattern = true\n"
-                                          "TileSuperCell = true\n"
-                                          "OptimizePortPipeLine = 0\n"
-                                          "RenderAllInterpretedSurfaces = false\n"
-                                          "SingleThreadProcess = false\n"
-                                          "SurfaceOverLap = 3\n"
-                                          "XPVDPCacheOverlapThreshold = 100\n"
-                                          "XPVDPOptimizeFlattening = 1\n"
-                                          "AdjustImageNearCopydot = false\n"
-                                          "DisableAxialShadeOptimization = false\n"
-                                          "SplitShadeWithAbruptColorChange = true\n"
-                                          "SplitShadeAbruptChangeThreshold = 30\n"
-                                          "ClipsubPathStackSizeThreshold = 14\n"
-                                          "CopyDotMethod = 1\n"
-                                          "EnableBPCbyObjectType = false\n"
-                                          "EnableExternalDLCachePurge = true\n"
-                                          "EnableXObjDLCachePurge = false\n"
-                                          "EnableXPVDPDLCachePurge = false\n"
-                                          "GRMemoryThreshold = 0\n"
-                                          "GRPMThreshold = 0\n"
-                                          "GRFLThreshold = 0\n"
-                                          "GROption = 0\n"
-                                          "UseFasterOpaqueMarking = -1\n"
-                                          "ConvertComplexPatternToImage = true\n"
-                                          "DontCopyDevImage = true\n"
-                                          "UsePathCache = true\n"
-                                          "UseInPlaceComposition = true\n"
-                                          "GRSAOCTilingPattern = false\n"
-                                          "GRCacheOpaqueTilingPattern = true\n"
-                                          "DisableOPInMarker = true\n"
-                                          "UseFasterTransparencyTilingPattern = true\n"
-                                          "UseOldHOVReducer = true\n"
-                                          "MaxGlyphCache = 67108864\n"
-                                          "MaxGraphPathCache = 134217728\n"
-                                          "OptimizeArtworkTree = true\n"
-                                          "OverscanImageMasksThreshold = 1\n"
-                                          "PDFGCPageInterval = 5000\n"
-                                          "PDFGCMemoryThreshold = 8388608\n"
-                                          "PDFGCInterpreterThreadMemoryThreshold = 0\n"
-                                          "PDFGCMainThreadMemoryThreshold = 0\n"
-                                          "PathWidthAdjustment = 0\n"
-                                          "SubPathSizeThreshold = 24\n"
-                                          "AdjustPathWidthInsideTilingPattern = false\n"
-                                          "DiscardEmptyPathAfterAdjustment = true\n"
-                                          "ReplaceSourceColorPrecision = true\n"
-                                          "ShiftImageMaskDeviceDelta = 0.1\n"
-                                          "ShipXPImageSlicesInOrder = false\n"
-                                          "TrapPixelOverlap = 1\n"
-                                          "TrappingLibraryPath = \n"
-                                          "UseNewTrapReducer = true\n"
-                                          "XObjDLCachePurgeChild = true\n"
-                                          "XObjDLCachePurgePercentage = 0\n"
-                                          "DisableXPImageDLOptimization = false\n"
-                                          "EmitIMG_META = true\n"
-                                          "AtomicRegionDirectCMYKOption = 1\n"
-                                          "ThreadPriority = false\n"
-                                          "UseNullXPDevice = false\n"
-                                          "UseNullXPImage = false\n"
-                                          "XPShadeCache = true\n"
-                                          "RasterizeAllTransparencyShades = false\n";
+// Every option with its default, in print order, "; " between them; the RAM budget depends
+// on the machine.
+constexpr const char* kDefaults =
+    "NumMTRThreads = -1; NumMTBThreads = -1; MTRThreshold = 100000; "
+    "MTRFallbackPerBand = true; HasExternalCompositor = false; XObjDLCacheMaxRAM = ; "
+    "XObjDLCacheMaxDisk = 9223372036854775807; VDPThroughFlattener = true; "
+    "XObjDLSharedCache = false; MaxPatternCacheEntry = 50; ImageMarkerType = 0; "
+    "ImageMarkerTiling = 0; ImageMarkerFactorSourceStep = 1.5; "
+    "ImageMarkerFactorTiling = 1; MeshMarkerFactorD11 = 0.125; "
+    "MeshMarkerFactorD18 = 0.125; MeshMarkerFactorD48 = 0.25; SSE2 = 1; "
+    "UseNewImageMarker = 1; OverScanIdntImageMaskMarking = true; SLCompression = 1; "
+    "SLCompressionRatio = 1.5; SL0CompressionRatio = 2; UseNullGraphics = false; "
+    "MaxCacheShades = 100; RasterizeTilingPattern = true; TileSuperCell = true; "
+    "OptimizePortPipeLine = 0; RenderAllInterpretedSurfaces = false; "
+    "SingleThreadProcess = false; SurfaceOverLap = 3; XPVDPCacheOverlapThreshold = 100; "
+    "XPVDPOptimizeFlattening = 1; AdjustImageNearCopydot = false; "
+    "DisableAxialShadeOptimization = false; SplitShadeWithAbruptColorChange = true; "
+    "SplitShadeAbruptChangeThreshold = 30; ClipsubPathStackSizeThreshold = 14; "
+    "CopyDotMethod = 1; EnableBPCbyObjectType = false; "
+    "EnableExternalDLCachePurge = true; EnableXObjDLCachePurge = false; "
+    "EnableXPVDPDLCachePurge = false; GRMemoryThreshold = 0; GRPMThreshold = 0; "
+    "GRFLThreshold = 0; GROption = 0; UseFasterOpaqueMarking = -1; "
+    "ConvertComplexPatternToImage = true; DontCopyDevImage = true; UsePathCache = true; "
+    "UseInPlaceComposition = true; GRSAOCTilingPattern = false; "
+    "GRCacheOpaqueTilingPattern = true; DisableOPInMarker = true; "
+    "UseFasterTransparencyTilingPattern = true; UseOldHOVReducer = true; "
+    "MaxGlyphCache = 67108864; MaxGraphPathCache = 134217728; "
+    "OptimizeArtworkTree = true; OverscanImageMasksThreshold = 1; "
+    "PDFGCPageInterval = 5000; PDFGCMemoryThreshold = 8388608; "
+    "PDFGCInterpreterThreadMemoryThreshold = 0; PDFGCMainThreadMemoryThreshold = 0; "
+    "PathWidthAdjustment = 0; SubPathSizeThreshold = 24; "
+    "AdjustPathWidthInsideTilingPattern = false; DiscardEmptyPathAfterAdjustment = true; "
+    "ReplaceSourceColorPrecision = true; ShiftImageMaskDeviceDelta = 0.1; "
+    "ShipXPImageSlicesInOrder = false; TrapPixelOverlap = 1; TrappingLibraryPath = ; "
+    "UseNewTrapReducer = true; XObjDLCachePurgeChild = true; "
+    "XObjDLCachePurgePercentage = 0; DisableXPImageDLOptimization = false; "
+    "EmitIMG_META = true; AtomicRegionDirectCMYKOption = 1; ThreadPriority = false; "
+    "UseNullXPDevice = false; UseNullXPImage = false; XPShadeCache = true; "
+    "RasterizeAllTransparencyShades = false";
 
-// The defaults with some lines replaced, as "Key = value" lines.
-std::string defaultsWith(const std::string& ramLine, const std::vector<std::string>& lines) {
-    // A leading line end lets every key be found as "\nKey = ".
-    std::string out = "\n" + std::string(kDefaultsBeforeRAM) + ramLine + kDefaultsAfterRAM;
-    for (const std::string& line : lines) {
+// The defaults as printed, with the RAM budget `ram` and some "Key = value" lines replaced.
+std::string defaultsWith(const std::string& ram, const std::vector<std::string>& lines) {
+    std::string out;
+    for (const auto part : std::views::split(std::string_view(kDefaults), std::string_view("; "))) {
+        std::string line(part.begin(), part.end());
         const std::string key = line.substr(0, line.find(" = ") + 3);
-        const size_t at = out.find("\n" + key);
-        if (at == std::string::npos) {
-            ADD_FAILURE() << "no default line for " << key;
-            continue;
+        if (key == "XObjDLCacheMaxRAM = ")
+            line += ram;
+        for (const std::string& changed : lines) {
+            if (changed.starts_with(key))
+                line = changed;
         }
-        const size_t end = out.find('\n', at + 1);
-        out.replace(at + 1, end - at - 1, line);
+        out += line + "\n";
     }
-    return out.substr(1);
+    return out;
 }
 
 class ZyrstdConfigTest : public ::testing::Test {
@@ -134,19 +90,6 @@ protected:
         writeFile(path, text);
         return path;
     }
-    // The defaults' RAM line, taken from --defaults.
-    std::string ramLine() {
-        const Outcome defaults = zyrstd({"config", "--defaults"});
-        const std::string key = "\nXObjDLCacheMaxRAM = ";
-        const size_t at = defaults.out.find(key);
-        const size_t end = defaults.out.find('\n', at + 1);
-        if (at == std::string::npos || end == std::string::npos ||
-            defaults.out.find_first_not_of("0123456789", at + key.size()) != end) {
-            ADD_FAILURE() << "no RAM budget in " << defaults.out;
-            return "";
-        }
-        return defaults.out.substr(at + 1, end - at);
-    }
 
     std::string tool_;
     zyrtest::TempDir dir_;
@@ -158,11 +101,13 @@ TEST_F(ZyrstdConfigTest, Defaults) {
     const Outcome result = zyrstd({"config", "--defaults"});
     EXPECT_EQ(result.exitCode, 0) << result.err;
     EXPECT_EQ(result.err, "");
-    const std::string ram = ramLine();
-    ASSERT_FALSE(ram.empty());
-    const unsigned long long budget = std::stoull(ram.substr(ram.find('=') + 2));
-    EXPECT_GT(budget, 0u);
-    EXPECT_EQ(budget % 4096, 0u) << "a whole number of pages";
+    const std::string key = "\nXObjDLCacheMaxRAM = ";
+    ASSERT_NE(result.out.find(key), std::string::npos) << result.out;
+    const size_t at = result.out.find(key) + key.size();
+    const std::string ram = result.out.substr(at, result.out.find('\n', at) - at);
+    ASSERT_TRUE(!ram.empty() && ram.find_first_not_of("0123456789") == ram.npos) << ram;
+    EXPECT_GT(std::stoull(ram), 0u);
+    EXPECT_EQ(std::stoull(ram) % 4096, 0u) << "a whole number of pages";
     EXPECT_EQ(result.out, defaultsWith(ram, {}));
 
     // An empty setup file and one of comments only change nothing.
@@ -202,12 +147,11 @@ TEST_F(ZyrstdConfigTest, EffectiveOptionsOfSetupFiles) {
               first + ":6: unknown key 'Typo'\n" + second + ":7: unknown key 'alsoWrong'\n");
     const std::string expected =
         "\n   TrapPixelOverlap set to 1.000000\n\n" +
-        defaultsWith("XObjDLCacheMaxRAM = 1073741824\n",
-                     {"NumMTRThreads = 8", "MaxCacheShades = 10", "GROption = 1",
-                      "TrappingLibraryPath = /opt/trap/libtrap.so", "SingleThreadProcess = true",
-                      "SurfaceOverLap = 1", "OverscanImageMasksThreshold = 0",
-                      "SLCompressionRatio = 0.75", "XObjDLSharedCache = true",
-                      "XPVDPOptimizeFlattening = 0"});
+        defaultsWith("1073741824", {"NumMTRThreads = 8", "MaxCacheShades = 10", "GROption = 1",
+                                    "TrappingLibraryPath = /opt/trap/libtrap.so",
+                                    "SingleThreadProcess = true", "SurfaceOverLap = 1",
+                                    "OverscanImageMasksThreshold = 0", "SLCompressionRatio = 0.75",
+                                    "XObjDLSharedCache = true", "XPVDPOptimizeFlattening = 0"});
     EXPECT_EQ(result.out, expected);
 }
 
