@@ -564,10 +564,6 @@ TEST_F(FileOperationsTest, MappedStreams) {
                    "error opening file");
 }
 
-} // namespace
-
-namespace {
-
 // A scripted system call: each step is the result of one call (with errno for -1).
 struct Script {
     std::vector<std::pair<ssize_t, int>> steps;
@@ -587,8 +583,6 @@ ssize_t scriptedRead(int, void*, size_t) {
 ssize_t scriptedWrite(int, const void*, size_t) {
     return script->next();
 }
-
-} // namespace
 
 TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
     struct Case {
@@ -619,8 +613,6 @@ TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
     script = nullptr;
 }
 
-namespace {
-
 // The host kit's procedures, noting which DI paths and path texts the host has handed out
 // and not yet been given back.
 struct DIPathLedger {
@@ -644,8 +636,6 @@ struct DIPathLedger {
         real.free(p);
     }
 };
-
-} // namespace
 
 TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     FileSysFixture fx(true);
@@ -677,3 +667,5 @@ TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     }
     zyrtest::installFront(0);
 }
+
+} // namespace

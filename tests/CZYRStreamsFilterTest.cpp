@@ -423,8 +423,6 @@ TEST(CZYRStreamsFilterTest, AgreesWithPythonBase64) {
     EXPECT_EQ(decodeHex(text), bytes);
 }
 
-} // namespace
-
 TEST(CZYRStreamsFilterTest, DecodingErrorTextsOutliveTheNextErrorAndTheThread) {
     using A85 = CZYRStreamFilterASCII85Decode;
     using Hex = CZYRStreamFilterASCIIHEXDecode;
@@ -468,3 +466,5 @@ TEST(CZYRStreamsFilterTest, ErrorReportingWriteEncodesWhateverTheStatusHolds) {
     EXPECT_EQ(contents(outHex), "4d616e>\r\n");
     EXPECT_STREQ(earlier.getMessage(), "earlier") << "a successful write changes no status";
 }
+
+} // namespace

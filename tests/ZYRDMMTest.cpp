@@ -123,8 +123,6 @@ size_t count(const std::string& text, const std::string& what) {
     return n;
 }
 
-} // namespace
-
 TEST_F(ZYRDMMTest, FlushWithNobodyToAsk) {
     EXPECT_FALSE(ZYRFlushMemory(nullptr, 100, eFlushMemorySeverityNormal));
     EXPECT_EQ(closeLog(), "Client unknown is asking for 100 bytes with severity <0>\n"
@@ -489,3 +487,5 @@ TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
     EXPECT_TRUE(answered) << "the totals waited behind the flush";
     EXPECT_EQ(totals.get(), 1000u);
 }
+
+} // namespace

@@ -44,8 +44,6 @@ std::vector<std::string> leakReport() {
     return lines;
 }
 
-} // namespace
-
 TEST_F(ZYRMemTest, PlainFrontEdgeCasesAndAccounting) {
     EXPECT_EQ(ZYRMalloc(0), nullptr);
     EXPECT_EQ(ZYRCalloc(0, 16), nullptr);
@@ -374,15 +372,11 @@ TEST_F(ZYRMemTest, MemOperationsCompareAsUnsignedBytes) {
     EXPECT_STREQ(buffer, "aabcdef");
 }
 
-namespace {
-
 std::u16string fetchNotices() {
     CZYRErrorStk stack;
     std::u16string text;
     return stack.getErrorMessage(text) ? text : u"<none>";
 }
-
-} // namespace
 
 TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
     ZYRSetMemLimit(400 * kMiB);
@@ -490,3 +484,5 @@ TEST_F(ZYRMemTest, DebugStateIsOneConsistentSnapshot) {
     churn.join();
     EXPECT_EQ(torn, 0) << "counters read while an allocation was half recorded";
 }
+
+} // namespace
