@@ -43,6 +43,8 @@ std::string md5Via(std::string_view text) {
 
 constexpr const char* kEmptyDigest = "d41d8cd98f00b204e9800998ecf8427e";
 
+} // namespace
+
 // The RFC 1321 suite, then runs of 'a' about the block boundaries: 55 bytes still leave room
 // for the length in the last block, 56 do not.
 TEST(CZYRHashTest, KnownDigests) {
@@ -181,5 +183,3 @@ TEST(CZYRHashTest, CreateReturnsNullWhenAllocationFails) {
     delete plain;
     delete withData;
 }
-
-} // namespace

@@ -123,6 +123,8 @@ size_t count(const std::string& text, const std::string& what) {
     return n;
 }
 
+} // namespace
+
 TEST_F(ZYRDMMTest, FlushWithNobodyToAsk) {
     EXPECT_FALSE(ZYRFlushMemory(nullptr, 100, eFlushMemorySeverityNormal));
     EXPECT_EQ(closeLog(), "Client unknown is asking for 100 bytes with severity <0>\n"
@@ -487,5 +489,3 @@ TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
     EXPECT_TRUE(answered) << "the totals waited behind the flush";
     EXPECT_EQ(totals.get(), 1000u);
 }
-
-} // namespace

@@ -81,6 +81,8 @@ int32_t operand(std::mt19937_64& rng) {
     }
 }
 
+} // namespace
+
 // Each table: signs and zeros, then halves, then one unit either side of each extreme.
 TEST(ZYRFixedTest, ProductsRoundHalfAwayAndSaturate) {
     // clang-format off
@@ -204,5 +206,3 @@ TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
         ASSERT_EQ(toFixed(x), refPFloatToFixed(x)) << "PFloatToFixed(" << x << ")";
     }
 }
-
-} // namespace

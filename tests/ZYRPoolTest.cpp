@@ -122,6 +122,8 @@ struct IntNode : redblack_node<int, IntNode> {
     int value;
 };
 
+} // namespace
+
 TEST(RedBlackTreeTest, RandomInsertUnlinkReplaceKeepsInvariants) {
     std::mt19937 rng(1234);
     std::deque<IntNode> storage; // stable addresses
@@ -652,5 +654,3 @@ TEST(ZYRStdAllocatorFixedSizePoolTest, RunsPagesAndFailure) {
     pool.FlushAll();
     EXPECT_NE(pool.Alloc(4), nullptr);
 }
-
-} // namespace
