@@ -171,9 +171,12 @@ TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
     EXPECT_EQ(utf8(fs->getDLCacheDirName()), cache);
     delete fs;
 
+    // An empty text stands for a name not given.
     auto create = [](const std::string& temp, const std::string& dl) {
-        delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(temp.c_str()),
-                                                   ZYRStd::CZYRUniString(dl.c_str()), nullptr);
+        auto uni = [](const std::string& t) {
+            return t.empty() ? ZYRStd::CZYRUniString() : ZYRStd::CZYRUniString(t.c_str());
+        };
+        delete ZYRFileSys::createDefaultFileSystem(uni(temp), uni(dl), nullptr);
     };
     create(longest, cache); // existing directories are fine
     const std::string tooLong = longest + "x";
