@@ -4,8 +4,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <fstream>
-#include <iterator>
 #include <new>
 #include <set>
 #include <string>
@@ -27,18 +25,11 @@ using ZYRStd::CZYRError;
 using ZYRStd::CZYRFileName;
 using ZYRStd::CZYRFileSys;
 using ZYRStd::CZYRSmartZYRRefPtr;
+using zyrtest::readFile;
+using zyrtest::writeFile;
 
 constexpr const char* kWindowsSource = "source/zyr/std/ZYRFileSys_Windows";
 constexpr const char* kHostSource = "source/zyr/std/ZYRFileSys_OEM";
-
-std::string readFile(const std::string& path) {
-    std::ifstream in(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
-}
-
-void writeFile(const std::string& path, const std::string& bytes) {
-    std::ofstream(path, std::ios::binary) << bytes;
-}
 
 bool exists(const std::string& path) {
     struct stat st;
@@ -51,7 +42,7 @@ std::string utf8(const ZYRStd::CZYRUniString& s) {
 
 template <class Body>
 void expectError(Body body, ZYRPublic::eZYRErrorType type, const char* message,
-                 const char* source) {
+                 const char* source = kWindowsSource) {
     try {
         body();
         ADD_FAILURE() << "no error; expected \"" << message << "\"";
@@ -60,6 +51,11 @@ void expectError(Body body, ZYRPublic::eZYRErrorType type, const char* message,
         EXPECT_STREQ(e.getMessage(), message);
         EXPECT_STREQ(e.getSrcFileName(), source);
     }
+}
+
+// The common failure of the native file operations.
+template <class Body> void expectOpFailed(Body body, const char* message) {
+    expectError(body, ZYRPublic::kZYRErrorFileOpFailed, message);
 }
 
 // A file name whose full path is missing, as a host's may be.
@@ -111,16 +107,16 @@ public:
 // ---- without a file system or factory -------------------------------------------------------
 
 TEST(CZYRFileSysTest, NothingInstalled) {
+    const char* notInstalled =
+        "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method";
     ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
     ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
     expectError([] { CZYRFileSys::fileExists(CZYRFileName()); },
-                ZYRPublic::kZYRErrorFileSystemNotInitialized,
-                "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method",
+                ZYRPublic::kZYRErrorFileSystemNotInitialized, notInstalled,
                 "source/zyr/std/CZYRFileSys");
     ZYRStd::ZYRStdInit_SetDefaultFileSysProc([]() -> ZYRFileSys::IZYRFileSys* { return nullptr; });
     expectError([] { CZYRFileSys::getTempDirName(); }, ZYRPublic::kZYRErrorFileSystemNotInitialized,
-                "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method",
-                "source/zyr/std/CZYRFileSys");
+                notInstalled, "source/zyr/std/CZYRFileSys");
     ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
     expectError([] { CZYRFileName name("/tmp/x"); }, ZYRPublic::kZYRErrorFatal,
                 "ZYRFactory Proc not set in ZYRStd", "source/zyr/std/ZYRStdInit");
@@ -174,30 +170,21 @@ TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
     EXPECT_EQ(utf8(fs->getTempDirName()), longest);
     EXPECT_EQ(utf8(fs->getDLCacheDirName()), cache);
     delete fs;
-    // Existing directories are fine.
-    delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(longest.c_str()),
-                                               ZYRStd::CZYRUniString(cache.c_str()), nullptr);
 
+    // An empty text stands for a name not given.
+    auto create = [](const std::string& temp, const std::string& dl) {
+        auto uni = [](const std::string& t) {
+            return t.empty() ? ZYRStd::CZYRUniString() : ZYRStd::CZYRUniString(t.c_str());
+        };
+        delete ZYRFileSys::createDefaultFileSystem(uni(temp), uni(dl), nullptr);
+    };
+    create(longest, cache); // existing directories are fine
     const std::string tooLong = longest + "x";
-    expectError(
-        [&] {
-            delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(tooLong.c_str()),
-                                                       ZYRStd::CZYRUniString(), nullptr);
-        },
-        ZYRPublic::kZYRErrorLimitCheck, "temp dir filename too long", kWindowsSource);
-    expectError(
-        [&] {
-            delete ZYRFileSys::createDefaultFileSystem(
-                ZYRStd::CZYRUniString(), ZYRStd::CZYRUniString(tooLong.c_str()), nullptr);
-        },
-        ZYRPublic::kZYRErrorLimitCheck, "DL Cache dir filename too long", kWindowsSource);
-    const std::string twoLevels = dir.file("missing/child");
-    expectError(
-        [&] {
-            delete ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(twoLevels.c_str()),
-                                                       ZYRStd::CZYRUniString(), nullptr);
-        },
-        ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed", kWindowsSource);
+    expectError([&] { create(tooLong, ""); }, ZYRPublic::kZYRErrorLimitCheck,
+                "temp dir filename too long");
+    expectError([&] { create("", tooLong); }, ZYRPublic::kZYRErrorLimitCheck,
+                "DL Cache dir filename too long");
+    expectOpFailed([&] { create(dir.file("missing/child"), ""); }, "Directory create failed");
 }
 
 // ---- file streams through both file systems -------------------------------------------------
@@ -259,19 +246,12 @@ TEST_P(FileStreamTest, OpenModesAndTransfers) {
 
     if (!GetParam()) {
         // What write-only means to a host file is the host's choice; natively it empties.
-        auto s = fx_.open(path, kZYRStreamWrite);
-        ASSERT_TRUE(s->isOpen());
-        s->write("n", 1, 1);
-        s->close();
+        fx_.open(path, kZYRStreamWrite)->write("n", 1, 1);
         EXPECT_EQ(readFile(path), "n");
     }
 
     const std::string created = fx_.dir_.file("created.bin");
-    {
-        auto s = fx_.open(created, kZYRStreamWrite | kZYRStreamTruncate);
-        ASSERT_TRUE(s->isOpen());
-        s->write("abc", 1, 3);
-    }
+    fx_.open(created, kZYRStreamWrite | kZYRStreamTruncate)->write("abc", 1, 3);
     EXPECT_EQ(readFile(created), "abc");
 
     const std::string temporary = fx_.dir_.file("gone.tmp");
@@ -283,8 +263,7 @@ TEST_P(FileStreamTest, OpenModesAndTransfers) {
     }
     EXPECT_FALSE(exists(temporary)) << "deleted when its last handle closed";
 
-    auto doomed = fx_.open(created, kZYRStreamRead);
-    doomed->removeFile();
+    fx_.open(created, kZYRStreamRead)->removeFile();
     EXPECT_FALSE(exists(created));
 }
 
@@ -299,11 +278,10 @@ TEST_P(FileStreamTest, FilesThatDoNotOpen) {
     EXPECT_EQ(missing->read(&c, 1, 1, err), 0u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorFileOpFailed);
     expectError([&] { missing->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
-                "stream is not writable", kWindowsSource);
+                "stream is not writable");
 
-    auto directory = fx_.open(fx_.dir_.path(), kZYRStreamRead);
     if (!GetParam()) {
-        EXPECT_FALSE(directory->isOpen()) << "a directory is not a file";
+        EXPECT_FALSE(fx_.open(fx_.dir_.path(), kZYRStreamRead)->isOpen()) << "not a file";
     }
 }
 
@@ -329,13 +307,9 @@ TEST_P(FileStreamTest, TemporaryFiles) {
     EXPECT_FALSE(exists(otherPath));
 
     if (!GetParam()) {
-        const std::string nowhere = fx_.dir_.file("no/such/dir");
-        expectError(
-            [&] {
-                CZYRFileSys::createTmpFileStream(CZYRFileName(nowhere.c_str()), u"x",
-                                                 kZYRStreamWrite);
-            },
-            ZYRPublic::kZYRErrorFileOpFailed, "File rename failed", kWindowsSource);
+        const CZYRFileName nowhere(fx_.dir_.file("no/such/dir").c_str());
+        expectOpFailed([&] { CZYRFileSys::createTmpFileStream(nowhere, u"x", kZYRStreamWrite); },
+                       "File rename failed");
     }
 }
 
@@ -365,16 +339,14 @@ TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
     ASSERT_TRUE(fileless);
     EXPECT_FALSE(fileless->isOpen());
     char c;
-    expectError([&] { fileless->read(&c, 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
-                "file stm not open", kWindowsSource);
+    expectOpFailed([&] { fileless->read(&c, 1, 1); }, "file stm not open");
     fx.record_ = ZYRHostKit::posixFileProcs();
 
     fx.record_.wPathToDIPath = nullptr;
     auto narrow = fx.open(path, kZYRStreamRead);
     ASSERT_TRUE(narrow && narrow->isOpen()) << "the narrow procedure stands in";
     fx.record_.pathToDIPath = nullptr;
-    expectError([&] { fx.open(path, kZYRStreamRead); }, ZYRPublic::kZYRErrorFileOpFailed,
-                "pathFromDIPath not implemented", kWindowsSource);
+    expectOpFailed([&] { fx.open(path, kZYRStreamRead); }, "pathFromDIPath not implemented");
     fx.record_ = ZYRHostKit::posixFileProcs();
 
     fx.record_.flush = nullptr;
@@ -409,33 +381,32 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
 
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), true);
     EXPECT_EQ(readFile(b), "alpha");
-    expectError([&] { CZYRFileSys::copy(name("a.txt"), name("b.txt"), true); },
-                ZYRPublic::kZYRErrorFileOpFailed, "File copy failed", kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::copy(name("a.txt"), name("b.txt"), true); },
+                   "File copy failed");
     writeFile(a, "beta");
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), false);
     EXPECT_EQ(readFile(b), "beta");
-    expectError([&] { CZYRFileSys::copy(name("a.txt"), name("a.txt"), false); },
-                ZYRPublic::kZYRErrorFileOpFailed, "File copy failed", kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::copy(name("a.txt"), name("a.txt"), false); },
+                   "File copy failed");
     EXPECT_EQ(readFile(a), "beta") << "copying a file onto itself must not empty it";
-    expectError([&] { CZYRFileSys::copy(name("none"), name("c.txt"), false); },
-                ZYRPublic::kZYRErrorFileOpFailed, "File copy failed", kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::copy(name("none"), name("c.txt"), false); },
+                   "File copy failed");
     EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::copy(CZYRFileName(""), name("c.txt"), false); // an empty path does nothing
 
-    expectError([&] { CZYRFileSys::rename(name("a.txt"), name("b.txt")); },
-                ZYRPublic::kZYRErrorFileOpFailed, "File rename failed", kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::rename(name("a.txt"), name("b.txt")); },
+                   "File rename failed");
     EXPECT_EQ(readFile(b), "beta") << "an existing target is not replaced";
     CZYRFileSys::rename(name("a.txt"), name("c.txt"));
     EXPECT_FALSE(exists(a));
     EXPECT_EQ(readFile(fx_.dir_.file("c.txt")), "beta");
-    expectError([&] { CZYRFileSys::rename(name("a.txt"), name("d.txt")); },
-                ZYRPublic::kZYRErrorFileOpFailed, "File rename failed", kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::rename(name("a.txt"), name("d.txt")); },
+                   "File rename failed");
 
     CZYRFileSys::remove(name("c.txt"), false);
     EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::remove(name("c.txt"), true);
-    expectError([&] { CZYRFileSys::remove(name("c.txt"), false); },
-                ZYRPublic::kZYRErrorFileOpFailed, "File delete failed", kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::remove(name("c.txt"), false); }, "File delete failed");
 
     EXPECT_TRUE(CZYRFileSys::isSameFile(name("x"), name("x")));
     EXPECT_FALSE(
@@ -449,11 +420,9 @@ TEST_F(FileOperationsTest, MakeDirectory) {
     ASSERT_EQ(::stat(fx_.dir_.file("sub").c_str(), &st), 0);
     EXPECT_TRUE(S_ISDIR(st.st_mode));
     CZYRFileSys::makeDirectory(name("sub")); // exists: nothing to do
-    expectError([&] { CZYRFileSys::makeDirectory(name("no/such")); },
-                ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed", kWindowsSource);
-    expectError([&] { CZYRFileSys::makeDirectory(CZYRFileName("")); },
-                ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed empty filename",
-                kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::makeDirectory(name("no/such")); }, "Directory create failed");
+    expectOpFailed([&] { CZYRFileSys::makeDirectory(CZYRFileName("")); },
+                   "Directory create failed empty filename");
 }
 
 // Collects what an enumeration reports.
@@ -506,15 +475,14 @@ TEST_F(FileOperationsTest, EnumDirectory) {
     EXPECT_TRUE(none.entries.empty());
 
     Collector ignored;
-    expectError([&] { CZYRFileSys::enumDirectory(name("missing"), ignored); },
-                ZYRPublic::kZYRErrorFileOpFailed, "Directory enum failed", kWindowsSource);
-    expectError([&] { CZYRFileSys::enumDirectory(CZYRFileName(""), ignored); },
-                ZYRPublic::kZYRErrorFileOpFailed, "Directory create failed empty filename",
-                kWindowsSource);
+    expectOpFailed([&] { CZYRFileSys::enumDirectory(name("missing"), ignored); },
+                   "Directory enum failed");
+    expectOpFailed([&] { CZYRFileSys::enumDirectory(CZYRFileName(""), ignored); },
+                   "Directory create failed empty filename");
     if (::geteuid() != 0) {
         ::chmod(empty.c_str(), 0);
-        expectError([&] { CZYRFileSys::enumDirectory(CZYRFileName(empty.c_str()), ignored); },
-                    ZYRPublic::kZYRErrorFileOpFailed, "Directory enum failed", kWindowsSource);
+        expectOpFailed([&] { CZYRFileSys::enumDirectory(name("empty"), ignored); },
+                       "Directory enum failed");
         ::chmod(empty.c_str(), 0700);
     }
 }
@@ -543,8 +511,7 @@ TEST_F(FileOperationsTest, MappedStreams) {
         whole.close();
         EXPECT_FALSE(whole.isMapped());
         char c;
-        expectError([&] { whole.read(&c, 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
-                    "file stm not mapped", kWindowsSource);
+        expectOpFailed([&] { whole.read(&c, 1, 1); }, "file stm not mapped");
         ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
         EXPECT_EQ(whole.read(&c, 1, 1, err), 0u);
         EXPECT_EQ(err, ZYRPublic::kZYRErrorFileOpFailed);
@@ -577,9 +544,9 @@ TEST_F(FileOperationsTest, MappedStreams) {
         EXPECT_EQ(window.getSize(), 100u);
     }
 
-    expectError(
+    expectOpFailed(
         [&] { ZYRStd::CZYRMemMapFStream past(name("mapped.bin"), kZYRStreamRead, 9990, 100); },
-        ZYRPublic::kZYRErrorFileOpFailed, "error mapping view of file", kWindowsSource);
+        "error mapping view of file");
 
     {
         // A writable view past the end grows the file; the bytes reach it.
@@ -594,15 +561,11 @@ TEST_F(FileOperationsTest, MappedStreams) {
     EXPECT_EQ(grown.substr(100), "ABCDEFGH");
 
     writeFile(fx_.dir_.file("empty.bin"), "");
-    expectError([&] { ZYRStd::CZYRMemMapFStream e(name("empty.bin"), kZYRStreamRead, 0, 0); },
-                ZYRPublic::kZYRErrorFileOpFailed, "Error mapping empty file", kWindowsSource);
-    expectError([&] { ZYRStd::CZYRMemMapFStream m(name("missing.bin"), kZYRStreamRead, 0, 0); },
-                ZYRPublic::kZYRErrorFileOpFailed, "error opening file", kWindowsSource);
+    expectOpFailed([&] { ZYRStd::CZYRMemMapFStream e(name("empty.bin"), kZYRStreamRead, 0, 0); },
+                   "Error mapping empty file");
+    expectOpFailed([&] { ZYRStd::CZYRMemMapFStream m(name("missing.bin"), kZYRStreamRead, 0, 0); },
+                   "error opening file");
 }
-
-} // namespace
-
-namespace {
 
 // A scripted system call: each step is the result of one call (with errno for -1).
 struct Script {
@@ -624,46 +587,34 @@ ssize_t scriptedWrite(int, const void*, size_t) {
     return script->next();
 }
 
-} // namespace
-
 TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
-    using ZYRStd::posixio::readFully;
-    using ZYRStd::posixio::writeFully;
+    struct Case {
+        bool write;
+        std::vector<std::pair<ssize_t, int>> steps;
+        size_t done;
+        int error;
+        const char* why;
+    };
+    const Case cases[] = {
+        {true, {{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}, 10, 0, "interrupts are retried"},
+        {true, {{3, 0}, {0, 0}}, 3, EIO, "a write that moves nothing must not be retried for ever"},
+        {true, {{2, 0}, {-1, ENOSPC}}, 2, ENOSPC, "the failure's errno"},
+        {true, {{-1, 0}}, 0, EIO, "a failure without errno"},
+        {false, {{-1, EINTR}, {7, 0}, {0, 0}}, 7, 0, "the end of the file is no error"},
+        {false, {{5, 0}, {-1, EBADF}}, 5, EBADF, "the failure's errno"},
+    };
     char buf[10] = {};
-    Script s;
-    script = &s;
-
-    s = {{{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}};
-    auto t = writeFully(3, buf, 10, scriptedWrite);
-    EXPECT_EQ(t.done, 10u);
-    EXPECT_EQ(t.error, 0);
-
-    s = {{{3, 0}, {0, 0}}};
-    t = writeFully(3, buf, 10, scriptedWrite);
-    EXPECT_EQ(t.done, 3u);
-    EXPECT_EQ(t.error, EIO) << "a write that moves nothing must not be retried for ever";
-
-    s = {{{2, 0}, {-1, ENOSPC}}};
-    t = writeFully(3, buf, 10, scriptedWrite);
-    EXPECT_EQ(t.done, 2u);
-    EXPECT_EQ(t.error, ENOSPC);
-
-    s = {{{-1, 0}}};
-    EXPECT_EQ(writeFully(3, buf, 10, scriptedWrite).error, EIO) << "a failure without errno";
-
-    s = {{{-1, EINTR}, {7, 0}, {0, 0}}};
-    t = readFully(3, buf, 10, scriptedRead);
-    EXPECT_EQ(t.done, 7u);
-    EXPECT_EQ(t.error, 0) << "the end of the file is no error";
-
-    s = {{{5, 0}, {-1, EBADF}}};
-    t = readFully(3, buf, 10, scriptedRead);
-    EXPECT_EQ(t.done, 5u);
-    EXPECT_EQ(t.error, EBADF);
+    for (const Case& c : cases) {
+        Script s{c.steps};
+        script = &s;
+        const auto t = c.write ? ZYRStd::posixio::writeFully(3, buf, 10, scriptedWrite)
+                               : ZYRStd::posixio::readFully(3, buf, 10, scriptedRead);
+        EXPECT_EQ(t.done, c.done) << c.why;
+        EXPECT_EQ(t.error, c.error) << c.why;
+        EXPECT_EQ(s.calls, s.steps.size()) << c.why;
+    }
     script = nullptr;
 }
-
-namespace {
 
 // The host kit's procedures, noting which DI paths and path texts the host has handed out
 // and not yet been given back.
@@ -688,8 +639,6 @@ struct DIPathLedger {
         real.free(p);
     }
 };
-
-} // namespace
 
 TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     FileSysFixture fx(true);
@@ -721,3 +670,5 @@ TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     }
     zyrtest::installFront(0);
 }
+
+} // namespace

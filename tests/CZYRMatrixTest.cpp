@@ -26,8 +26,6 @@ const CZYRMatrix kA(1, 2, 3, 4, 5, 6);
 const CZYRMatrix kB(7, 8, 9, 10, 11, 12);
 const double kNaN = std::numeric_limits<double>::quiet_NaN();
 
-} // namespace
-
 TEST(CZYRMatrixTest, IdentityValidityAndComparisons) {
     EXPECT_TRUE(CZYRMatrix().isIdentity());
     EXPECT_TRUE(CZYRMatrix(1, -0.0, 0, 1, 0, 0).isIdentity()) << "-0.0 compares equal to 0";
@@ -83,42 +81,36 @@ TEST(CZYRMatrixTest, ProductOrders) {
 }
 
 TEST(CZYRMatrixTest, PrefixAndPostfixForms) {
-    CZYRMatrix m = kA;
-    m.translate(2, 3);
-    EXPECT_TRUE(m == CZYRMatrix(1, 2, 3, 4, 16, 22));
-    m = kA;
-    m.translateMTX(2, 3);
-    EXPECT_TRUE(m == CZYRMatrix(1, 2, 3, 4, 7, 9));
-    m = kA;
-    m.scale(2, 3);
-    EXPECT_TRUE(m == CZYRMatrix(2, 4, 9, 12, 5, 6));
-    m = kA;
-    m.scaleMTX(2, 3);
-    EXPECT_TRUE(m == CZYRMatrix(2, 6, 6, 12, 10, 18));
+    const double rad = 30 * 3.141592653589793 / 180;
+    const CZYRMatrix R(std::cos(rad), std::sin(rad), -std::sin(rad), std::cos(rad), 0, 0);
+    const struct {
+        void (*apply)(CZYRMatrix&);
+        CZYRMatrix want;
+        double eps;
+    } forms[] = {
+        {[](CZYRMatrix& m) { m.translate(2, 3); }, {1, 2, 3, 4, 16, 22}, 0},
+        {[](CZYRMatrix& m) { m.translateMTX(2, 3); }, {1, 2, 3, 4, 7, 9}, 0},
+        {[](CZYRMatrix& m) { m.scale(2, 3); }, {2, 4, 9, 12, 5, 6}, 0},
+        {[](CZYRMatrix& m) { m.scaleMTX(2, 3); }, {2, 6, 6, 12, 10, 18}, 0},
+        {[](CZYRMatrix& m) { m.rotate(90); }, {3, 4, -1, -2, 5, 6}, 1e-12},
+        {[](CZYRMatrix& m) { m.rotateMTX(90); }, {-2, 1, -4, 3, -6, 5}, 1e-12},
+        {[](CZYRMatrix& m) { m.rotate(30); }, R * kA, 1e-12},
+        {[](CZYRMatrix& m) { m.rotateMTX(30); }, kA * R, 1e-12},
+    };
+    for (size_t i = 0; i < std::size(forms); ++i) {
+        CZYRMatrix m = kA;
+        forms[i].apply(m);
+        EXPECT_TRUE(near(m, forms[i].want, forms[i].eps)) << "form " << i;
+    }
 
     // cos 90 degrees is not 0 in double, and the rotation keeps that.
     const double cos90 = std::cos(90 * 3.141592653589793 / 180);
-    m = CZYRMatrix();
+    CZYRMatrix m;
     m.rotate(90);
     EXPECT_TRUE(m == CZYRMatrix(cos90, 1, -1, cos90, 0, 0));
     m = CZYRMatrix();
     m.rotate(360);
     EXPECT_FALSE(m.isIdentity());
-    m = kA;
-    m.rotate(90);
-    EXPECT_TRUE(near(m, CZYRMatrix(3, 4, -1, -2, 5, 6), 1e-12));
-    m = kA;
-    m.rotateMTX(90);
-    EXPECT_TRUE(near(m, CZYRMatrix(-2, 1, -4, 3, -6, 5), 1e-12));
-
-    const double rad = 30 * 3.141592653589793 / 180;
-    const CZYRMatrix R(std::cos(rad), std::sin(rad), -std::sin(rad), std::cos(rad), 0, 0);
-    m = kA;
-    m.rotate(30);
-    EXPECT_TRUE(near(m, R * kA, 1e-12));
-    m = kA;
-    m.rotateMTX(30);
-    EXPECT_TRUE(near(m, kA * R, 1e-12));
 
     // The free functions change the matrix exactly as the methods do.
     CZYRMatrix viaMethod = kA, viaFree = kA;
@@ -237,3 +229,5 @@ TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
         ASSERT_NEAR(got.top, hi[1], 1e-9) << "case " << i;
     }
 }
+
+} // namespace

@@ -2,14 +2,8 @@
 // encoded text against an independent implementation (Python's base64 module).
 #include <gtest/gtest.h>
 
-#include <cerrno>
-#include <fcntl.h>
-#include <fstream>
-#include <iterator>
 #include <random>
-#include <spawn.h>
 #include <string>
-#include <sys/wait.h>
 #include <thread>
 #include <vector>
 
@@ -18,8 +12,6 @@
 #include "zyr/std/CZYRStreamsFilterASCII85.h"
 #include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
 #include "zyr/std/IImpZYRMemStream.h"
-
-extern char** environ;
 
 namespace {
 
@@ -59,11 +51,12 @@ std::string randomBytes(size_t n, unsigned int seed, bool zeroRuns = false) {
     return out;
 }
 
-std::string encode85(const std::string& bytes, const char* prefix = nullptr,
-                     const char* eod = nullptr, bool allowZ = true, size_t chunk = 0) {
+// Encodes through writes of `chunk` bytes (all at once for 0).
+template <class Encoder, class... Args>
+std::string encode(const std::string& bytes, size_t chunk, Args... args) {
     Stream out = sink();
     {
-        CZYRStreamFilterASCII85 filter(CZYRSmartZYRRefPtr<IZYRStream>(out), prefix, eod, allowZ);
+        Encoder filter(CZYRSmartZYRRefPtr<IZYRStream>(out), args...);
         const size_t step = chunk ? chunk : std::max<size_t>(bytes.size(), 1);
         for (size_t at = 0; at < bytes.size(); at += step) {
             const size_t n = std::min(step, bytes.size() - at);
@@ -74,19 +67,14 @@ std::string encode85(const std::string& bytes, const char* prefix = nullptr,
     return contents(out);
 }
 
+std::string encode85(const std::string& bytes, const char* prefix = nullptr,
+                     const char* eod = nullptr, bool allowZ = true, size_t chunk = 0) {
+    return encode<CZYRStreamFilterASCII85>(bytes, chunk, prefix, eod, allowZ);
+}
+
 std::string encodeHex(const std::string& bytes, const char* prefix = nullptr,
                       const char* eod = nullptr, size_t chunk = 0) {
-    Stream out = sink();
-    {
-        CZYRStreamFilterASCIIHEX filter(CZYRSmartZYRRefPtr<IZYRStream>(out), prefix, eod);
-        const size_t step = chunk ? chunk : std::max<size_t>(bytes.size(), 1);
-        for (size_t at = 0; at < bytes.size(); at += step) {
-            const size_t n = std::min(step, bytes.size() - at);
-            filter.write(bytes.data() + at, 1, static_cast<unsigned int>(n));
-        }
-        filter.close();
-    }
-    return contents(out);
+    return encode<CZYRStreamFilterASCIIHEX>(bytes, chunk, prefix, eod);
 }
 
 // Decodes through reads of `step` bytes, to cross every buffer boundary.
@@ -113,8 +101,10 @@ std::string decodeHex(const std::string& text, unsigned int step = 4096) {
     return decode<CZYRStreamFilterASCIIHEXDecode>(text, step);
 }
 
-// The decoder's error for `text`: its type and message.
-template <class Decoder> std::string decodeError(const std::string& text) {
+// The first decoding error of `text`, as the caller keeps it; `where` gets its message with
+// the offending byte and offset the decoder reports.
+template <class Decoder>
+CZYRError firstError(const std::string& text, std::string* where = nullptr) {
     Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
     char buf[64];
     try {
@@ -129,28 +119,42 @@ template <class Decoder> std::string decodeError(const std::string& text) {
         } catch (const CZYRError& again) {
             EXPECT_EQ(first, again.getMessage());
         }
-        char where[64];
-        if (decoder.getFailureCharacter() >= 0)
-            std::snprintf(where, sizeof where, " 0x%02X at offset %llu",
-                          decoder.getFailureCharacter(), decoder.getFailureOffset());
-        else
-            std::snprintf(where, sizeof where, " at offset %llu", decoder.getFailureOffset());
-        return first + where;
-    }
-    return "(no error)";
-}
-
-// The first decoding error of `text`, as the caller keeps it.
-template <class Decoder> CZYRError firstError(const std::string& text) {
-    Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
-    char buf[64];
-    try {
-        while (decoder.read(buf, 1, sizeof buf) > 0) {
+        if (where) {
+            char at[64];
+            if (decoder.getFailureCharacter() >= 0)
+                std::snprintf(at, sizeof at, " 0x%02X at offset %llu",
+                              decoder.getFailureCharacter(), decoder.getFailureOffset());
+            else
+                std::snprintf(at, sizeof at, " at offset %llu", decoder.getFailureOffset());
+            *where = first + at;
         }
-    } catch (const CZYRError& e) {
         return e;
     }
+    if (where)
+        *where = "(no error)";
     return CZYRError(ZYRPublic::kZYRErrorNoError, "(no error)", "", 0);
+}
+
+template <class Decoder> std::string decodeError(const std::string& text) {
+    std::string where;
+    firstError<Decoder>(text, &where);
+    return where;
+}
+
+constexpr const char* kA85Source = "source/zyr/std/CZYRStreamsFilterASCII85";
+constexpr const char* kHexSource = "source/zyr/std/CZYRStreamsFilterASCIIHEX";
+
+template <class Body>
+void expectError(Body body, ZYRPublic::eZYRErrorType type, const char* message,
+                 const char* sourceFile) {
+    try {
+        body();
+        ADD_FAILURE() << "no error; expected \"" << message << "\"";
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), type);
+        EXPECT_STREQ(e.getMessage(), message);
+        EXPECT_STREQ(e.getSrcFileName(), sourceFile);
+    }
 }
 
 // ---- ASCII85 encoder ------------------------------------------------------------------------
@@ -209,22 +213,12 @@ TEST(CZYRStreamsFilterTest, ASCII85ArgumentsAndFailures) {
     Stream out = sink();
     const CZYRSmartZYRRefPtr<IZYRStream> target(out);
     EXPECT_NO_THROW(CZYRStreamFilterASCII85(target, "ab", "12345678901234"));
-    try {
-        CZYRStreamFilterASCII85 f(target, nullptr, "123456789012345");
-        ADD_FAILURE();
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorBadParam);
-        EXPECT_STREQ(e.getMessage(),
-                     "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCII85");
-    }
-    try {
-        CZYRStreamFilterASCII85 f(target, "abc", nullptr);
-        ADD_FAILURE();
-    } catch (const CZYRError& e) {
-        EXPECT_STREQ(e.getMessage(),
-                     "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long");
-    }
+    expectError([&] { CZYRStreamFilterASCII85 f(target, nullptr, "123456789012345"); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long", kA85Source);
+    expectError([&] { CZYRStreamFilterASCII85 f(target, "abc", nullptr); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long", kA85Source);
 
     CZYRStreamFilterASCII85 filter(target, nullptr, nullptr, true);
     EXPECT_STREQ(filter.getFilterName(), "ASCII85");
@@ -238,18 +232,13 @@ TEST(CZYRStreamsFilterTest, ASCII85ArgumentsAndFailures) {
     filter.close();
     filter.close();
     EXPECT_FALSE(filter.getTargetStream());
-    try {
-        filter.write("x", 1, 1);
-        ADD_FAILURE();
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorFileOpFailed);
-        EXPECT_STREQ(e.getMessage(), "CZYRStreamFilterASCII85::write - stream invalid");
-    }
+    expectError([&] { filter.write("x", 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
+                "CZYRStreamFilterASCII85::write - stream invalid", kA85Source);
     ZYRStd::C_Error err;
     EXPECT_EQ(filter.write("x", 1, 1, err), 0u);
     EXPECT_EQ(err.getError(), ZYRPublic::kZYRErrorFileOpFailed);
     EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCII85::write - stream invalid");
-    EXPECT_STREQ(err.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCII85");
+    EXPECT_STREQ(err.getSrcFileName(), kA85Source);
 
     // A target too small for the second line: the write fails, the target is dropped,
     // and the destructor's close does not throw.
@@ -301,23 +290,14 @@ TEST(CZYRStreamsFilterTest, ASCIIHexLayout) {
               0xFFFFFFFFu)
         << "saturates rather than wrapping to a small size";
 
-    Stream out = sink();
-    try {
-        CZYRStreamFilterASCIIHEX f(CZYRSmartZYRRefPtr<IZYRStream>(out), "abc", nullptr);
-        ADD_FAILURE();
-    } catch (const CZYRError& e) {
-        EXPECT_STREQ(e.getMessage(),
-                     "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: prefix is too long");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCIIHEX");
-    }
-    try {
-        CZYRStreamFilterASCIIHEX f(CZYRSmartZYRRefPtr<IZYRStream>(out), nullptr, "123456789012345");
-        ADD_FAILURE();
-    } catch (const CZYRError& e) {
-        EXPECT_STREQ(e.getMessage(),
-                     "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: eod is too long");
-    }
-    CZYRStreamFilterASCIIHEX closed{CZYRSmartZYRRefPtr<IZYRStream>(out)};
+    const CZYRSmartZYRRefPtr<IZYRStream> out(sink());
+    expectError(
+        [&] { CZYRStreamFilterASCIIHEX f(out, "abc", nullptr); }, ZYRPublic::kZYRErrorBadParam,
+        "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: prefix is too long", kHexSource);
+    expectError([&] { CZYRStreamFilterASCIIHEX f(out, nullptr, "123456789012345"); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: eod is too long", kHexSource);
+    CZYRStreamFilterASCIIHEX closed{out};
     EXPECT_STREQ(closed.getFilterName(), "ASCIIHEX");
     closed.close();
     ZYRStd::C_Error err;
@@ -378,7 +358,7 @@ TEST(CZYRStreamsFilterTest, ASCII85DecodeRules) {
     char buf[8];
     EXPECT_EQ(decoder.read(buf, 1, 8, err), 0u);
     EXPECT_EQ(err.getError(), ZYRPublic::kZYRErrorInvalidData);
-    EXPECT_STREQ(err.getSrcFileName(), "source/zyr/std/CZYRStreamsFilterASCII85");
+    EXPECT_STREQ(err.getSrcFileName(), kA85Source);
     EXPECT_STREQ(decoder.getFilterName(), "ASCII85Decode");
     decoder.close();
     EXPECT_FALSE(decoder.getSourceStream());
@@ -401,30 +381,15 @@ TEST(CZYRStreamsFilterTest, ASCIIHexDecodeRules) {
 
 // ---- against Python's base64 ----------------------------------------------------------------
 
-// Runs python3 on `script` with `input` as standard input; empty optional when python3 is
-// not there.
+// Runs python3 on `script` with the bytes of `input` as standard input; false when python3
+// is not there or fails.
 bool runPython(const std::string& script, const std::string& input, std::string& output,
                const zyrtest::TempDir& dir) {
-    const std::string inPath = dir.file("py.in"), outPath = dir.file("py.out");
-    std::ofstream(inPath, std::ios::binary) << input;
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 0, inPath.c_str(), O_RDONLY, 0);
-    posix_spawn_file_actions_addopen(&actions, 1, outPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
-    std::string program = "python3", flag = "-c", code = script;
-    char* argv[] = {program.data(), flag.data(), code.data(), nullptr};
-    pid_t pid = 0;
-    const int spawned = posix_spawnp(&pid, "python3", &actions, nullptr, argv, environ);
-    posix_spawn_file_actions_destroy(&actions);
-    if (spawned != 0)
-        return false;
-    int status = 0;
-    while (::waitpid(pid, &status, 0) < 0 && errno == EINTR) {
-    }
-    std::ifstream in(outPath, std::ios::binary);
-    output.assign(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-    return WIFEXITED(status) && WEXITSTATUS(status) == 0;
+    zyrtest::writeFile(dir.file("py.in"), input);
+    const zyrtest::Outcome run =
+        zyrtest::runProgram("python3", {"-c", script}, dir, dir.file("py.in"));
+    output = run.out;
+    return run.exitCode == 0;
 }
 
 TEST(CZYRStreamsFilterTest, AgreesWithPythonBase64) {
@@ -457,8 +422,6 @@ TEST(CZYRStreamsFilterTest, AgreesWithPythonBase64) {
                           bytes, text, dir));
     EXPECT_EQ(decodeHex(text), bytes);
 }
-
-} // namespace
 
 TEST(CZYRStreamsFilterTest, DecodingErrorTextsOutliveTheNextErrorAndTheThread) {
     using A85 = CZYRStreamFilterASCII85Decode;
@@ -503,3 +466,5 @@ TEST(CZYRStreamsFilterTest, ErrorReportingWriteEncodesWhateverTheStatusHolds) {
     EXPECT_EQ(contents(outHex), "4d616e>\r\n");
     EXPECT_STREQ(earlier.getMessage(), "earlier") << "a successful write changes no status";
 }
+
+} // namespace

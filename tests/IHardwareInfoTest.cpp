@@ -39,13 +39,6 @@ template <std::size_t N> void setText(char16_t (&field)[N], const std::u16string
     std::memcpy(field, text.data(), std::min(text.size(), N) * sizeof(char16_t));
 }
 
-std::string narrow(const std::wstring& text) {
-    std::string out;
-    for (wchar_t c : text)
-        out += c < 0x80 ? static_cast<char>(c) : '?';
-    return out;
-}
-
 // A host's view of a small machine under a temporary directory.
 class FakeTree {
 public:
@@ -53,9 +46,6 @@ public:
         const fs::path path = fs::path(dir_.path()) / relative;
         fs::create_directories(path.parent_path());
         zyrtest::writeFile(path.string(), bytes);
-    }
-    void mkdir(const std::string& relative) const {
-        fs::create_directories(fs::path(dir_.path()) / relative);
     }
     void remove(const std::string& relative) const {
         fs::remove_all(fs::path(dir_.path()) / relative);
@@ -154,6 +144,22 @@ void buildMachine(const FakeTree& tree) {
     tree.write("sys/block/dm-0/size", "100\n"); // mapped: no device of its own
 }
 
+// The five reports of the records, and the processor count the system report returns.
+struct Reports {
+    std::wstring memory, system, disks, memPerf, cpuPerf;
+    int processors;
+};
+
+Reports printAll(IHardwareInfo& info, const HardwareInfoRec* rec, const PerformanceRec* perf) {
+    std::wostringstream memory, system, disks, memPerf, cpuPerf;
+    info.printMemoryInfo(rec, memory);
+    const int processors = info.printProcessorAndOSInfo(rec, system);
+    info.printDiskInfo(rec, disks);
+    info.printMemoryPerformance(perf, memPerf);
+    info.printCPUPerformance(perf, cpuPerf);
+    return {memory.str(), system.str(), disks.str(), memPerf.str(), cpuPerf.str(), processors};
+}
+
 std::unique_ptr<IHardwareInfo> infoFor(const FakeTree& tree) {
     std::unique_ptr<IHardwareInfo> info(createHardwareInfo(tree.root().c_str()));
     EXPECT_NE(info, nullptr);
@@ -165,18 +171,13 @@ TEST(IHardwareInfoTest, ZeroFilledRecordsPrintHeadersOnly) {
     const auto perf = zeroed<PerformanceRec>();
     std::unique_ptr<IHardwareInfo> info(createHardwareInfo());
     ASSERT_NE(info, nullptr);
-
-    std::wostringstream memory, system, disks, memPerf, cpuPerf;
-    info->printMemoryInfo(rec.get(), memory);
-    EXPECT_EQ(info->printProcessorAndOSInfo(rec.get(), system), 0);
-    info->printDiskInfo(rec.get(), disks);
-    info->printMemoryPerformance(perf.get(), memPerf);
-    info->printCPUPerformance(perf.get(), cpuPerf);
-    EXPECT_EQ(memory.str(), L"");
-    EXPECT_EQ(system.str(), L"\tOperating System \n\t\tCaption: \n\t\tCSDVersion: \n");
-    EXPECT_EQ(disks.str(), L"");
-    EXPECT_EQ(memPerf.str(), L"\tMemory Performance\n\t\tMEM: 0 bytes of0 bytes = 0 % in use\n");
-    EXPECT_EQ(cpuPerf.str(), L"\tCPU Performance\n\t\tCPU: 0% busy\n");
+    const Reports out = printAll(*info, rec.get(), perf.get());
+    EXPECT_EQ(out.processors, 0);
+    EXPECT_EQ(out.memory, L"");
+    EXPECT_EQ(out.system, L"\tOperating System \n\t\tCaption: \n\t\tCSDVersion: \n");
+    EXPECT_EQ(out.disks, L"");
+    EXPECT_EQ(out.memPerf, L"\tMemory Performance\n\t\tMEM: 0 bytes of0 bytes = 0 % in use\n");
+    EXPECT_EQ(out.cpuPerf, L"\tCPU Performance\n\t\tCPU: 0% busy\n");
 }
 
 TEST(IHardwareInfoTest, FilledRecordsPrintTheirExactTexts) {
@@ -213,27 +214,23 @@ TEST(IHardwareInfoTest, FilledRecordsPrintTheirExactTexts) {
     perf->percentCommittedBytesInUse = 33;
 
     std::unique_ptr<IHardwareInfo> info(createHardwareInfo());
-    std::wostringstream memory, system, disks, memPerf, cpuPerf;
-    info->printMemoryInfo(rec.get(), memory);
-    EXPECT_EQ(info->printProcessorAndOSInfo(rec.get(), system), 1);
-    info->printDiskInfo(rec.get(), disks);
-    info->printMemoryPerformance(perf.get(), memPerf);
-    info->printCPUPerformance(perf.get(), cpuPerf);
-    EXPECT_EQ(memory.str(), L"\tMemory 1\n\t\tCapacity: 8192 MB\n\t\tSpeed: 3200 MHz\n"
-                            L"\tMemory 2\n\t\tCapacity: 0 MB\n\t\tSpeed: 0 MHz\n");
-    EXPECT_EQ(system.str(), L"\tOperating System \n\t\tCaption: Debian 12\n\t\tCSDVersion: 6.1.0\n"
-                            L"\tProcessor 1\n\t\tCaption: x86_64 Family 6 Model 158 Stepping 9\n"
-                            L"\t\tCurrentClockSpeed: 1200 Mhz\n\t\tExtClock: 100 MHz\n"
-                            L"\t\tL2CacheSize: 512 KB\n\t\tL3CacheSize: 8192 KB\n"
-                            L"\t\tManufacturer: GenuineIntel\n\t\tMaxClockSpeed: 4000 MHz\n"
-                            L"\t\tName: Xeon \u00e9 \U0001F600\n\t\tNumberOfCores: 4\n"
-                            L"\t\tNumberOfLogicalProcessors: 8\n");
-    EXPECT_EQ(disks.str(), L"\tDisk 1\n\t\tInterfaceType: SCSI\n\t\tModel: Samsung SSD 860\n"
-                           L"\t\tSize: 931 GB\n");
-    EXPECT_EQ(memPerf.str(), L"\tMemory Performance\n\t\tMEM: 4214091776 bytes of12641974272 "
-                             L"bytes = 33 % in use\n");
-    EXPECT_EQ(cpuPerf.str(), L"\tCPU Performance\n\t\tCPU: 37% busy\n\t\tCore 1 : 12 % busy\n"
-                             L"\t\tCore 2 : 100 % busy\n");
+    const Reports out = printAll(*info, rec.get(), perf.get());
+    EXPECT_EQ(out.processors, 1);
+    EXPECT_EQ(out.memory, L"\tMemory 1\n\t\tCapacity: 8192 MB\n\t\tSpeed: 3200 MHz\n"
+                          L"\tMemory 2\n\t\tCapacity: 0 MB\n\t\tSpeed: 0 MHz\n");
+    EXPECT_EQ(out.system, L"\tOperating System \n\t\tCaption: Debian 12\n\t\tCSDVersion: 6.1.0\n"
+                          L"\tProcessor 1\n\t\tCaption: x86_64 Family 6 Model 158 Stepping 9\n"
+                          L"\t\tCurrentClockSpeed: 1200 Mhz\n\t\tExtClock: 100 MHz\n"
+                          L"\t\tL2CacheSize: 512 KB\n\t\tL3CacheSize: 8192 KB\n"
+                          L"\t\tManufacturer: GenuineIntel\n\t\tMaxClockSpeed: 4000 MHz\n"
+                          L"\t\tName: Xeon \u00e9 \U0001F600\n\t\tNumberOfCores: 4\n"
+                          L"\t\tNumberOfLogicalProcessors: 8\n");
+    EXPECT_EQ(out.disks, L"\tDisk 1\n\t\tInterfaceType: SCSI\n\t\tModel: Samsung SSD 860\n"
+                         L"\t\tSize: 931 GB\n");
+    EXPECT_EQ(out.memPerf, L"\tMemory Performance\n\t\tMEM: 4214091776 bytes of12641974272 "
+                           L"bytes = 33 % in use\n");
+    EXPECT_EQ(out.cpuPerf, L"\tCPU Performance\n\t\tCPU: 37% busy\n\t\tCore 1 : 12 % busy\n"
+                           L"\t\tCore 2 : 100 % busy\n");
 }
 
 TEST(IHardwareInfoTest, NullRecordsAndOverlargeCounts) {
@@ -243,13 +240,9 @@ TEST(IHardwareInfoTest, NullRecordsAndOverlargeCounts) {
     EXPECT_FALSE(info->getDiskInfo(nullptr));
     EXPECT_FALSE(info->getMemoryPerformance(nullptr));
     EXPECT_FALSE(info->getCPUPerformance(nullptr));
-    std::wostringstream out;
-    info->printMemoryInfo(nullptr, out);
-    EXPECT_EQ(info->printProcessorAndOSInfo(nullptr, out), 0);
-    info->printDiskInfo(nullptr, out);
-    info->printMemoryPerformance(nullptr, out);
-    info->printCPUPerformance(nullptr, out);
-    EXPECT_EQ(out.str(), L"");
+    const Reports none = printAll(*info, nullptr, nullptr);
+    EXPECT_EQ(none.processors, 0);
+    EXPECT_EQ(none.memory + none.system + none.disks + none.memPerf + none.cpuPerf, L"");
 
     // A record filled by someone else never makes the printing read past its entries.
     const auto rec = zeroed<HardwareInfoRec>();
@@ -258,16 +251,13 @@ TEST(IHardwareInfoTest, NullRecordsAndOverlargeCounts) {
     rec->numberOfDisks = 1000;
     auto perf = zeroed<PerformanceRec>();
     perf->numberOfCores = 100000;
-    std::wostringstream memory, system, disks, cpuPerf;
-    info->printMemoryInfo(rec.get(), memory);
-    EXPECT_EQ(info->printProcessorAndOSInfo(rec.get(), system), 8);
-    info->printDiskInfo(rec.get(), disks);
-    info->printCPUPerformance(perf.get(), cpuPerf);
-    EXPECT_NE(memory.str().find(L"\tMemory 16\n"), std::wstring::npos);
-    EXPECT_EQ(memory.str().find(L"\tMemory 17\n"), std::wstring::npos);
-    EXPECT_EQ(disks.str().find(L"\tDisk 7\n"), std::wstring::npos);
-    EXPECT_NE(cpuPerf.str().find(L"\t\tCore 128 : 0 % busy\n"), std::wstring::npos);
-    EXPECT_EQ(cpuPerf.str().find(L"\t\tCore 129 "), std::wstring::npos);
+    const Reports out = printAll(*info, rec.get(), perf.get());
+    EXPECT_EQ(out.processors, 8);
+    EXPECT_NE(out.memory.find(L"\tMemory 16\n"), std::wstring::npos);
+    EXPECT_EQ(out.memory.find(L"\tMemory 17\n"), std::wstring::npos);
+    EXPECT_EQ(out.disks.find(L"\tDisk 7\n"), std::wstring::npos);
+    EXPECT_NE(out.cpuPerf.find(L"\t\tCore 128 : 0 % busy\n"), std::wstring::npos);
+    EXPECT_EQ(out.cpuPerf.find(L"\t\tCore 129 "), std::wstring::npos);
 }
 
 TEST(IHardwareInfoTest, CreateReturnsNullWhenAllocationFails) {
@@ -471,7 +461,7 @@ TEST(IHardwareInfoTest, ThisMachineAnswersEveryQuery) {
     EXPECT_LE(perf->totalProcessorUse, 100u);
     std::wostringstream out;
     info->printCPUPerformance(perf.get(), out);
-    EXPECT_EQ(narrow(out.str()).rfind("\tCPU Performance\n\t\tCPU: ", 0), 0u);
+    EXPECT_EQ(out.str().rfind(L"\tCPU Performance\n\t\tCPU: ", 0), 0u);
 }
 
 } // namespace

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cstdint>
 #include <functional>
-#include <map>
 #include <random>
 #include <set>
 #include <stdexcept>
@@ -39,6 +38,8 @@ public:
           pool(sizeof(Entry), entriesPerChunk) {
         hcSetPool(&pool);
     }
+    // Every test's cache is consistent at its end.
+    ~TestCache() { EXPECT_TRUE(checkInvariants()) << "invariants broken"; }
 
     unsigned int hash(void* key) override {
         return static_cast<unsigned int>(*static_cast<uint64_t*>(key));
@@ -71,6 +72,13 @@ public:
         return entry;
     }
     Entry* find(uint64_t key) { return static_cast<Entry*>(hcGetCachedEntry(&key)); }
+    // A pool entry for `key` that is not in the cache.
+    Entry* loose(uint64_t key) {
+        auto* entry = static_cast<Entry*>(pool.Alloc());
+        entry->key = key;
+        entry->value = valueFor(key);
+        return entry;
+    }
     _t_HashHead* head(unsigned int index) { return hcGetTopHashTable() + index; }
     // The keys of a chain, front first.
     std::vector<uint64_t> chain(unsigned int index) {
@@ -104,8 +112,6 @@ void expectAssertion(const std::function<void()>& action, const char* source, in
     }
 }
 
-} // namespace
-
 TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
     struct Case {
         int32_t entries;
@@ -127,7 +133,6 @@ TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
             ASSERT_EQ(h->count + h->touched, 0);
             ASSERT_EQ(h->chainLimit, c.chainLimit);
         }
-        EXPECT_TRUE(cache.checkInvariants());
     }
 
     TestCache widest(42, 42, 42);
@@ -148,38 +153,6 @@ TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
     EXPECT_THROW(unusable.hcGetCachedEntry(&key), CZYRError) << "no table to look in";
     EXPECT_THROW(unusable.hcGetEntry(&key, true), CZYRError);
     EXPECT_EQ(unusable.hcScavenger(5, nullptr), 0);
-}
-
-TEST(ZYRCacheTest, LookupMovesToFrontAndGrowsTheTouchedPrefix) {
-    TestCache cache(100, 4, 4); // 37 heads: keys 0, 37, 74, ... share chain 0
-    for (uint64_t k : {0u, 37u, 74u, 111u})
-        ASSERT_NE(cache.add(k), nullptr);
-    _t_HashHead* h = cache.head(0);
-    EXPECT_EQ(cache.chain(0), (Keys{111, 74, 37, 0}));
-    EXPECT_EQ(h->touched, 4) << "new entries count as used";
-    EXPECT_EQ(cache.CleanupUnTouched(h, nullptr), 0);
-    EXPECT_EQ(h->touched, 0);
-
-    EXPECT_EQ(cache.find(111)->value, valueFor(111)); // first of an untouched chain
-    EXPECT_EQ(h->touched, 1);
-    EXPECT_EQ(cache.chain(0), (Keys{111, 74, 37, 0}));
-    EXPECT_EQ(cache.find(37)->key, 37u); // third, beyond the prefix of 1
-    EXPECT_EQ(cache.chain(0), (Keys{37, 111, 74, 0}));
-    EXPECT_EQ(h->touched, 2);
-    cache.find(111); // second, inside the prefix: moves, the prefix stays
-    EXPECT_EQ(cache.chain(0), (Keys{111, 37, 74, 0}));
-    EXPECT_EQ(h->touched, 2);
-    cache.find(0); // last
-    EXPECT_EQ(cache.chain(0), (Keys{0, 111, 37, 74}));
-    EXPECT_EQ(h->touched, 3);
-
-    _t_HashHead* missHead = nullptr;
-    uint64_t missing = 148;
-    EXPECT_EQ(cache.hcLookup(&missing, &missHead), nullptr);
-    EXPECT_EQ(missHead, h) << "a miss still names the key's chain";
-    EXPECT_EQ(cache.chain(0), (Keys{0, 111, 37, 74}));
-    EXPECT_EQ(h->touched, 3);
-    EXPECT_TRUE(cache.checkInvariants());
 }
 
 TEST(ZYRCacheTest, SweepsGiveUntouchedEntriesOneChance) {
@@ -208,7 +181,14 @@ TEST(ZYRCacheTest, SweepsGiveUntouchedEntriesOneChance) {
     EXPECT_EQ(cache.offered, (Keys{111, 0, 74}));
     EXPECT_EQ(cache.chain(0), (Keys{74}));
     EXPECT_EQ(cache.GetCurrEntries(), 1);
-    EXPECT_TRUE(cache.checkInvariants());
+
+    // Where moving to the front goes is checked against the model in the random run; a miss
+    // still names the key's chain.
+    _t_HashHead* missHead = nullptr;
+    uint64_t missing = 148;
+    EXPECT_EQ(cache.hcLookup(&missing, &missHead), nullptr);
+    EXPECT_EQ(missHead, h);
+    EXPECT_EQ(cache.chain(0), (Keys{74}));
 }
 
 TEST(ZYRCacheTest, AnAllTouchedChainKeepsOnlyLEntries) {
@@ -222,7 +202,6 @@ TEST(ZYRCacheTest, AnAllTouchedChainKeepsOnlyLEntries) {
     EXPECT_EQ(cache.head(0)->touched, 0);
     EXPECT_EQ(cache.reports, (std::vector<void*>{&context})) << "one report per sweep";
     EXPECT_EQ(cache.hcGetToBeCleaned(), cache.hcGetTopHashTable()) << "a full round";
-    EXPECT_TRUE(cache.checkInvariants());
 }
 
 TEST(ZYRCacheTest, ScavengerStopsAtItsQuotaAndGoesOnFromThere) {
@@ -248,7 +227,6 @@ TEST(ZYRCacheTest, ScavengerStopsAtItsQuotaAndGoesOnFromThere) {
     EXPECT_EQ(cache.hcScavenger(100, nullptr), 2); // wraps round to chain 3 again
     EXPECT_EQ(cache.offered, (Keys{5, 3}));
     EXPECT_EQ(cache.GetCurrEntries(), 0);
-    EXPECT_TRUE(cache.checkInvariants());
 }
 
 TEST(ZYRCacheTest, RecycledEntriesWaitForTheReport) {
@@ -268,7 +246,6 @@ TEST(ZYRCacheTest, RecycledEntriesWaitForTheReport) {
     EXPECT_EQ(cache.hcScavenger(1, &context), 1);
     EXPECT_EQ(cache.reports, (std::vector<void*>{&context}));
     EXPECT_EQ(cache.add(4), second) << "the sweep's report empties the recycler";
-    EXPECT_TRUE(cache.checkInvariants());
 }
 
 TEST(ZYRCacheTest, FullCacheSweepsThenSkipsThenRefusesOverlongChains) {
@@ -288,7 +265,6 @@ TEST(ZYRCacheTest, FullCacheSweepsThenSkipsThenRefusesOverlongChains) {
     EXPECT_FALSE(cache.offered.empty()) << "the third sweeps again";
     EXPECT_LT(cache.GetCurrEntries(), 13);
     EXPECT_EQ(cache.GetMaxEntries(), 13);
-    EXPECT_TRUE(cache.checkInvariants());
 
     // 20 entries in one chain that nobody lets go: above 8 L, a request fails unless forced.
     TestCache crowded(20, 1, 1); // 37 heads
@@ -302,7 +278,6 @@ TEST(ZYRCacheTest, FullCacheSweepsThenSkipsThenRefusesOverlongChains) {
     EXPECT_EQ(crowded.GetCurrEntries(), 21);
     EXPECT_NE(crowded.add(23 * 37, true), nullptr);
     EXPECT_EQ(crowded.GetCurrEntries(), 22);
-    EXPECT_TRUE(crowded.checkInvariants());
 
     // Beyond 250 entries in a chain even a forced request fails.
     TestCache nearlyFull(251, 1, 1); // 257 heads
@@ -311,7 +286,6 @@ TEST(ZYRCacheTest, FullCacheSweepsThenSkipsThenRefusesOverlongChains) {
         ASSERT_NE(nearlyFull.add(i * 257), nullptr);
     EXPECT_EQ(nearlyFull.add(251 * 257, true), nullptr);
     EXPECT_EQ(nearlyFull.GetCurrEntries(), 251);
-    EXPECT_TRUE(nearlyFull.checkInvariants());
 }
 
 TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
@@ -355,7 +329,6 @@ TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
         EXPECT_EQ(cache.GetCurrEntries(), 3);
         for (uint64_t k : {4u, 5u, 6u})
             EXPECT_NE(cache.find(k), nullptr) << k;
-        EXPECT_TRUE(cache.checkInvariants());
         host.failAll = false;
     }
     zyrtest::installFront(0);
@@ -433,7 +406,6 @@ TEST(ZYRCacheTest, RemoveReleaseAndTraverse) {
     cache.hcReturnUnlinkedEntry(loose, &context);
     EXPECT_EQ(cache.offered.back(), 99u);
     EXPECT_EQ(cache.GetCurrEntries(), 3);
-    EXPECT_TRUE(cache.checkInvariants());
 }
 
 TEST(ZYRCacheTest, LastEntriesGoOnePerChainPerPass) {
@@ -451,7 +423,6 @@ TEST(ZYRCacheTest, LastEntriesGoOnePerChainPerPass) {
     cache.kept = {74};
     EXPECT_EQ(cache.hcRemoveLastEntries(100, nullptr), 1) << "a pass that drops nothing ends";
     EXPECT_EQ(cache.GetCurrEntries(), 1);
-    EXPECT_TRUE(cache.checkInvariants());
 }
 
 TEST(ZYRCacheTest, FreeControlUpdatesAndBrokenTables) {
@@ -477,7 +448,6 @@ TEST(ZYRCacheTest, FreeControlUpdatesAndBrokenTables) {
     EXPECT_EQ(cache.GetCurrEntries(), 0);
     EXPECT_EQ(cache.hcGetTopHashTable(), nullptr);
     EXPECT_FALSE(cache.ValidateHashCtrl());
-    EXPECT_TRUE(cache.checkInvariants());
 
     const char* header = "source/zyr/std/IZYRCache";
     expectAssertion([&] { (void)cache.hcUpdateCacheSize(1, 1); }, header, 539);
@@ -497,9 +467,7 @@ TEST(ZYRCacheTest, The255thEntryOfAChainIsAnAssertionAfterLinking) {
 
     // Nothing more fits the 8-bit count: refused before linking.
     uint64_t key = 255 * 1031;
-    auto* extra = static_cast<Entry*>(cache.pool.Alloc());
-    extra->key = key;
-    extra->value = valueFor(key);
+    Entry* extra = cache.loose(key);
     expectAssertion([&] { cache.hcInsertEntry(&key, extra); }, header, 533);
     expectAssertion([&] { cache.hcLinkEntry(cache.head(0), extra); }, header, 551);
     EXPECT_EQ(cache.head(0)->count, 255);
@@ -508,9 +476,7 @@ TEST(ZYRCacheTest, The255thEntryOfAChainIsAnAssertionAfterLinking) {
     cache.pool.Free(extra);
 
     uint64_t second = 1;
-    auto* inserted = static_cast<Entry*>(cache.pool.Alloc());
-    inserted->key = second;
-    inserted->value = valueFor(second);
+    Entry* inserted = cache.loose(second);
     cache.hcInsertEntry(&second, inserted);
     EXPECT_EQ(cache.find(1), inserted);
     EXPECT_EQ(cache.GetCurrEntries(), 256);
@@ -523,9 +489,9 @@ TEST(ZYRCacheTest, RelocationKeepsTheChainIntact) {
     for (uint64_t k : {0u, 37u, 74u})
         cache.add(k); // {74, 37, 0}
     Entry moved{};
-    Entry* middle = cache.find(37); // now first: {37, 74, 0}
-    cache.find(74);                 // {74, 37, 0}
-    middle = static_cast<Entry*>(cache.head(0)->next->next);
+    cache.find(37); // {37, 74, 0}
+    cache.find(74); // {74, 37, 0}
+    auto* middle = static_cast<Entry*>(cache.head(0)->next->next);
     ASSERT_EQ(middle->key, 37u);
     IZYRCache::hcRelocateEntry(middle, &moved, sizeof(Entry));
     EXPECT_EQ(cache.head(0)->next->next, &moved);
@@ -549,10 +515,7 @@ TEST(ZYRCacheTest, RelocationKeepsTheChainIntact) {
     IZYRCache::hcRelocateEntry(&front, home, sizeof(Entry));
     IZYRCache::hcRelocateEntry(&moved, middle, sizeof(Entry));
     EXPECT_EQ(cache.chain(0), (Keys{74, 37, 0}));
-    EXPECT_TRUE(cache.checkInvariants());
 }
-
-namespace {
 
 // The cache's rules written out plainly over vectors of keys, front first.
 struct Model {
@@ -682,8 +645,6 @@ struct Model {
     return ::testing::AssertionSuccess();
 }
 
-} // namespace
-
 TEST(ZYRCacheTest, RandomRunMatchesAModel) {
     for (const unsigned int seed : {1u, 2u, 3u}) {
         std::mt19937 random(seed);
@@ -708,9 +669,8 @@ TEST(ZYRCacheTest, RandomRunMatchesAModel) {
                 }
             } else if (action < 70) {
                 what = "insert";
-                if (model.chainOf(key).keys.size() >= 250 ||
-                    std::find(model.chainOf(key).keys.begin(), model.chainOf(key).keys.end(),
-                              key) != model.chainOf(key).keys.end())
+                const auto& keys = model.chainOf(key).keys;
+                if (keys.size() >= 250 || std::count(keys.begin(), keys.end(), key) != 0)
                     continue;
                 const bool force = random() % 8 == 0;
                 const bool expected = model.getEntry(force);
@@ -731,13 +691,9 @@ TEST(ZYRCacheTest, RandomRunMatchesAModel) {
                 ASSERT_EQ(cache.hcRemoveLastEntries(count, nullptr), model.removeLast(count));
             } else if (action < 97) {
                 what = "keep";
-                if (cache.kept.count(key)) {
-                    cache.kept.erase(key);
-                    model.kept.erase(key);
-                } else {
+                if (cache.kept.erase(key) == 0)
                     cache.kept.insert(key);
-                    model.kept.insert(key);
-                }
+                model.kept = cache.kept;
             } else {
                 what = "recycle";
                 cache.recycle = !cache.recycle;
@@ -750,8 +706,6 @@ TEST(ZYRCacheTest, RandomRunMatchesAModel) {
         EXPECT_EQ(cache.hcFreeCacheControl(), kHCSuccess);
     }
 }
-
-namespace {
 
 // A cache's life: build, fill past capacity, look up, remove, tear down.
 void cacheWorkload() {
@@ -768,8 +722,6 @@ void cacheWorkload() {
     }
     (void)cache.hcFreeCacheControl();
 }
-
-} // namespace
 
 TEST(ZYRCacheTest, EveryAllocationMayFail) {
     zyrtest::FailingHost host;
@@ -796,3 +748,5 @@ TEST(ZYRCacheTest, EveryAllocationMayFail) {
     }
     zyrtest::installFront(0);
 }
+
+} // namespace

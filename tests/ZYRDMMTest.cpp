@@ -111,6 +111,11 @@ protected:
     std::vector<FakeClient*> registered_;
 };
 
+// A DMM allocation for client "TEST" at normal severity.
+void* dmmMalloc(unsigned int size, I_FlushableMemoryClient* requester = nullptr) {
+    return ZYRDMMMalloc(size, "TEST", nullptr, nullptr, requester, eFlushMemorySeverityNormal);
+}
+
 size_t count(const std::string& text, const std::string& what) {
     size_t n = 0;
     for (size_t at = text.find(what); at != std::string::npos; at = text.find(what, at + 1))
@@ -180,8 +185,7 @@ TEST_F(ZYRDMMTest, LadderDoublesTheDemandThenTriesOneUrgentFlush) {
     cache.answerFor = [](unsigned int need) { return need < 800; };
     add(cache);
     host_.failAll = true;
-    EXPECT_EQ(ZYRDMMMalloc(100, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
-              nullptr);
+    EXPECT_EQ(dmmMalloc(100), nullptr);
     EXPECT_EQ(cache.requests, (std::vector<unsigned int>{100, 200, 400, 800, 100}));
     EXPECT_EQ(cache.severities.back(), eFlushMemorySeverityUrgent);
 
@@ -205,20 +209,18 @@ TEST_F(ZYRDMMTest, ClientThatLiesCannotKeepTheLadderGoing) {
     FakeClient liar("liar", ~0u, true);
     add(liar);
     host_.failAll = true;
-    EXPECT_EQ(ZYRDMMMalloc(64, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
-              nullptr);
+    EXPECT_EQ(dmmMalloc(64), nullptr);
     EXPECT_LE(liar.requests.size(), 40u);
 }
 
 TEST_F(ZYRDMMTest, SuccessfulFlushLetsTheRetrySucceed) {
-    FakeClient cache("cache", 4096);
-    cache.answerFor = [](unsigned int) { return true; };
+    FakeClient cache("cache", 4096, true);
     cache.onFlush = [this] { host_.failAll = false; };
     add(cache);
     host_.failAll = true;
-    void* p = ZYRDMMMalloc(100, "TEST", nullptr, nullptr, &cache, eFlushMemorySeverityNormal);
+    void* p = dmmMalloc(100, &cache);
     EXPECT_EQ(p, nullptr) << "the requester is the only client and is skipped";
-    void* q = ZYRDMMMalloc(100, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal);
+    void* q = dmmMalloc(100);
     ASSERT_NE(q, nullptr);
     ZYRDMMFree(q, "TEST", nullptr);
     EXPECT_NE(closeLog().find("----  Memory allocation succeed after flushing for Client : <TEST> "
@@ -237,7 +239,7 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
     FakeClient cache("cache", 1 << 30, true);
     add(cache);
     host_.failAll = true;
-    void* p = ZYRDMMMalloc(1000, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal);
+    void* p = dmmMalloc(1000);
     ASSERT_NE(p, nullptr);
     EXPECT_EQ(queue.calls, 1);
     EXPECT_TRUE(cache.requests.empty());
@@ -289,13 +291,11 @@ TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
     add(cache);
     host_.failAll = true;
     std::thread([this] {
-        EXPECT_EQ(ZYRDMMMalloc(10, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
-                  nullptr);
+        EXPECT_EQ(dmmMalloc(10), nullptr);
         host_.failAll = false;
         SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("host", false));
         host_.failAll = true;
-        EXPECT_EQ(ZYRDMMMalloc(10, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
-                  nullptr);
+        EXPECT_EQ(dmmMalloc(10), nullptr);
         EXPECT_FALSE(ZYRFlushMemory(nullptr, 10, eFlushMemorySeverityUrgent));
     }).join();
     EXPECT_EQ(queue.calls, 0);
@@ -304,8 +304,7 @@ TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
 }
 
 TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
-    EXPECT_EQ(ZYRDMMMalloc(0, "TEST", nullptr, nullptr, nullptr, eFlushMemorySeverityNormal),
-              nullptr);
+    EXPECT_EQ(dmmMalloc(0), nullptr);
     static std::vector<unsigned int> oemRequests;
     tOEMFlushCB oem{[](unsigned int need, unsigned int reserved, eFlushMemorySeverity, void* data) {
                         EXPECT_EQ(reserved, 0u);
@@ -388,8 +387,7 @@ TEST_F(ZYRDMMTest, OversizedJovBlockIsRefusedSilently) {
 }
 
 TEST_F(ZYRDMMTest, TumaLadderFlushesThenGivesUp) {
-    FakeClient cache("cache", 1 << 30);
-    cache.answerFor = [](unsigned int) { return true; };
+    FakeClient cache("cache", 1 << 30, true);
     add(cache);
     host_.failAll = true;
     EXPECT_EQ(DMM_TUMAAlloc(nullptr, 64), nullptr);

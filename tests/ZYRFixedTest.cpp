@@ -143,30 +143,22 @@ TEST(ZYRFixedTest, FixedMulDivSignsRoundingAndOverflow) {
         EXPECT_EQ(FixedMulDiv(s[0], s[1], s[2], true), s[3]) << s[0] << " " << s[1] << " " << s[2];
         EXPECT_EQ(FixedMulDiv(s[0], s[1], s[2], false), s[3] - (s[3] > 0 ? 1 : -1));
     }
-    EXPECT_EQ(FixedMulDiv(5, 1, 3, true), 2);
-    EXPECT_EQ(FixedMulDiv(4, 1, 3, true), 1);
-    EXPECT_EQ(FixedMulDiv(0, -5, 3, true), 0);
-    EXPECT_EQ(FixedMulDiv(0, 5, -3, false), 0);
-
-    EXPECT_EQ(FixedMulDiv(1, 1, 0, false), kMax);
-    EXPECT_EQ(FixedMulDiv(-1, 1, 0, true), kMin);
-    EXPECT_EQ(FixedMulDiv(-1, -1, 0, false), kMax);
-    EXPECT_EQ(FixedMulDiv(0, 0, 0, false), kMax);
-
-    EXPECT_EQ(FixedMulDiv(kMax - 1, 1, 1, false), kMax - 1);
-    EXPECT_EQ(FixedMulDiv(kMax, 1, 1, false), kMax);
-    EXPECT_EQ(FixedMulDiv(0x40000000, 2, 1, false), kMax);
-    EXPECT_EQ(FixedMulDiv(kMin + 1, 1, 1, false), kMin + 1);
-    EXPECT_EQ(FixedMulDiv(kMin, 1, 1, false), kMin);
-    EXPECT_EQ(FixedMulDiv(kMin, -1, 1, false), kMax);
-    EXPECT_EQ(FixedMulDiv(kMin, kMin, kMin, false), kMin);
-    // 65535 * 65537 / 2 is 2^31 - 0.5: it fits truncated and overflows once rounded.
-    EXPECT_EQ(FixedMulDiv(65535, 65537, 2, false), kMax);
-    EXPECT_EQ(FixedMulDiv(-65535, 65537, 2, false), kMin + 1);
-    EXPECT_EQ(FixedMulDiv(-65535, 65537, 2, true), kMin);
-    // 641 * 6700417 / 2 is 2^31 + 0.5.
-    EXPECT_EQ(FixedMulDiv(-641, 6700417, 2, false), kMin);
-    EXPECT_EQ(FixedMulDiv(641, 6700417, 2, false), kMax);
+    // Rows of {a, b, c, rounded, expected}: halves and zeros, division by zero, the extremes;
+    // 65535 * 65537 / 2 is 2^31 - 0.5 (fits truncated, overflows once rounded), 641 * 6700417 / 2
+    // is 2^31 + 0.5.
+    // clang-format off
+    const int32_t rows[][5] = {
+        {5, 1, 3, 1, 2}, {4, 1, 3, 1, 1}, {0, -5, 3, 1, 0}, {0, 5, -3, 0, 0},
+        {1, 1, 0, 0, kMax}, {-1, 1, 0, 1, kMin}, {-1, -1, 0, 0, kMax}, {0, 0, 0, 0, kMax},
+        {kMax - 1, 1, 1, 0, kMax - 1}, {kMax, 1, 1, 0, kMax}, {0x40000000, 2, 1, 0, kMax},
+        {kMin + 1, 1, 1, 0, kMin + 1}, {kMin, 1, 1, 0, kMin}, {kMin, -1, 1, 0, kMax},
+        {kMin, kMin, kMin, 0, kMin}, {65535, 65537, 2, 0, kMax}, {-65535, 65537, 2, 0, kMin + 1},
+        {-65535, 65537, 2, 1, kMin}, {-641, 6700417, 2, 0, kMin}, {641, 6700417, 2, 0, kMax},
+    };
+    // clang-format on
+    for (const auto& r : rows)
+        EXPECT_EQ(FixedMulDiv(r[0], r[1], r[2], r[3] != 0), r[4])
+            << r[0] << " * " << r[1] << " / " << r[2] << (r[3] ? " rounded" : "");
 }
 
 TEST(ZYRFixedTest, PFloatToFixedRoundsAndSaturates) {
@@ -175,26 +167,18 @@ TEST(ZYRFixedTest, PFloatToFixedRoundsAndSaturates) {
     const struct {
         float x;
         int32_t want;
-    } cases[] = {{1.5f, 0x00018000},
-                 {-0.5f, static_cast<int32_t>(0xFFFF8000)},
-                 {32768.0f, kMax},
-                 {-32768.0f, kMin},
-                 {1e10f, kMax},
-                 {-1e10f, kMin},
-                 {-0.0f, 0},
-                 {std::nextafter(32768.0f, 0.0f), 0x7FFFFF80},
-                 {std::nextafter(-32768.0f, 0.0f), -0x7FFFFF80},
-                 {std::nextafter(-32768.0f, -inf), kMin},
-                 {half, 1},
-                 {-half, -1},
-                 {std::nextafter(half, 0.0f), 0},
-                 {-std::nextafter(half, 0.0f), 0},
-                 // 2^23 + 1 units is exact and must not round to an even neighbour.
-                 {8388609.0f / 65536, 8388609},
-                 {-8388609.0f / 65536, -8388609},
-                 {inf, kMax},
-                 {-inf, kMin},
-                 {std::numeric_limits<float>::quiet_NaN(), 0}};
+    } cases[] = {
+        // clang-format off
+        {1.5f, 0x00018000}, {-0.5f, static_cast<int32_t>(0xFFFF8000)}, {-0.0f, 0},
+        {32768.0f, kMax}, {-32768.0f, kMin}, {1e10f, kMax}, {-1e10f, kMin},
+        {std::nextafter(32768.0f, 0.0f), 0x7FFFFF80}, {std::nextafter(-32768.0f, 0.0f), -0x7FFFFF80},
+        {std::nextafter(-32768.0f, -inf), kMin}, {half, 1}, {-half, -1},
+        {std::nextafter(half, 0.0f), 0}, {-std::nextafter(half, 0.0f), 0},
+        // 2^23 + 1 units is exact and must not round to an even neighbour.
+        {8388609.0f / 65536, 8388609}, {-8388609.0f / 65536, -8388609},
+        {inf, kMax}, {-inf, kMin}, {std::numeric_limits<float>::quiet_NaN(), 0},
+        // clang-format on
+    };
     for (const auto& c : cases)
         EXPECT_EQ(toFixed(c.x), c.want) << "PFloatToFixed(" << c.x << ")";
 }

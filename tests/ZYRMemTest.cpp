@@ -23,9 +23,10 @@ namespace {
 
 constexpr unsigned long long kMiB = 1024 * 1024;
 
-// Each test starts from a freshly installed front and leaves the C runtime front behind.
+// Each test starts from a freshly installed plain front and leaves the C runtime front behind.
 class ZYRMemTest : public ::testing::Test {
 protected:
+    void SetUp() override { zyrtest::installFront(0); }
     void TearDown() override { zyrtest::installFront(0); }
 };
 
@@ -43,10 +44,7 @@ std::vector<std::string> leakReport() {
     return lines;
 }
 
-} // namespace
-
 TEST_F(ZYRMemTest, PlainFrontEdgeCasesAndAccounting) {
-    zyrtest::installFront(0);
     EXPECT_EQ(ZYRMalloc(0), nullptr);
     EXPECT_EQ(ZYRCalloc(0, 16), nullptr);
     EXPECT_EQ(ZYRMemSize(nullptr), 0u);
@@ -83,7 +81,6 @@ TEST_F(ZYRMemTest, PlainFrontEdgeCasesAndAccounting) {
 }
 
 TEST_F(ZYRMemTest, SureVariantsThrowWithTheirLines) {
-    zyrtest::installFront(0);
     struct Case {
         void* (*call)();
         int line;
@@ -116,7 +113,6 @@ TEST_F(ZYRMemTest, SureVariantsThrowWithTheirLines) {
 }
 
 TEST_F(ZYRMemTest, LimitTestAndNestedDisables) {
-    zyrtest::installFront(0);
     const CZYRErrorStk notices; // the refusal notice goes there; build it before measuring
     ZYRSetMemLimit(400 * kMiB);
     ASSERT_EQ(ZYRGetMemLimit(), 400 * kMiB);
@@ -155,7 +151,6 @@ TEST_F(ZYRMemTest, LimitTestAndNestedDisables) {
 }
 
 TEST_F(ZYRMemTest, RecentFreesAreReusedAndNeverRefuse) {
-    zyrtest::installFront(0);
     const CZYRErrorStk notices;
     ZYRSetMemLimit(400 * kMiB);
     const auto room = static_cast<unsigned int>(400 * kMiB - GetMemUsage());
@@ -183,7 +178,6 @@ TEST_F(ZYRMemTest, RecentFreesAreReusedAndNeverRefuse) {
 }
 
 TEST_F(ZYRMemTest, FreesWhileAThreadEndsAreCounted) {
-    zyrtest::installFront(0);
     const unsigned long long before = GetMemUsage();
     // The thread's only free is its record's, made while the thread is torn down.
     std::thread([] { SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("short", true)); }).join();
@@ -191,7 +185,6 @@ TEST_F(ZYRMemTest, FreesWhileAThreadEndsAreCounted) {
 }
 
 TEST_F(ZYRMemTest, LimitSetterOnlyLowersAndClamps) {
-    zyrtest::installFront(0);
     const unsigned long long machine = ZYRGetMemLimit();
     ASSERT_GT(machine, 1024 * kMiB);
     ZYRSetMemLimit(machine + 1);
@@ -342,7 +335,6 @@ TEST_F(ZYRMemTest, ConcurrentFrontKeepsTheTotalExact) {
 }
 
 TEST_F(ZYRMemTest, ConcurrentAllocationsNeverPassTheLimit) {
-    zyrtest::installFront(0);
     ZYRSetMemLimit(400 * kMiB);
     const unsigned long long used = GetMemUsage();
     // Room for exactly 100 blocks of 1 MiB; four threads race for 50 each.
@@ -380,18 +372,13 @@ TEST_F(ZYRMemTest, MemOperationsCompareAsUnsignedBytes) {
     EXPECT_STREQ(buffer, "aabcdef");
 }
 
-namespace {
-
 std::u16string fetchNotices() {
     CZYRErrorStk stack;
     std::u16string text;
     return stack.getErrorMessage(text) ? text : u"<none>";
 }
 
-} // namespace
-
 TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
-    zyrtest::installFront(0);
     ZYRSetMemLimit(400 * kMiB);
     const unsigned long long used = GetMemUsage();
     DisableMemUsageCheck();
@@ -416,7 +403,6 @@ TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
 }
 
 TEST_F(ZYRMemTest, UsageCountsAnotherThreadsPendingFrees) {
-    zyrtest::installFront(0);
     void* block = ZYRMalloc(1000);
     ASSERT_NE(block, nullptr);
     const unsigned long long held = GetMemUsage();
@@ -498,3 +484,5 @@ TEST_F(ZYRMemTest, DebugStateIsOneConsistentSnapshot) {
     churn.join();
     EXPECT_EQ(torn, 0) << "counters read while an allocation was half recorded";
 }
+
+} // namespace

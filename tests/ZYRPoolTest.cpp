@@ -75,6 +75,19 @@ char* alloc(VariableSizeAllocator& a, unsigned int size) {
     return static_cast<char*>(a.allocate(size, obtained));
 }
 
+// Runs `body`, which must fail for want of memory with `message` from the given line.
+template <class Body> void expectOutOfMemory(Body body, const char* message, int line) {
+    try {
+        body();
+        ADD_FAILURE() << "no error; expected \"" << message << "\"";
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);
+        EXPECT_STREQ(e.getMessage(), message);
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRPool");
+        EXPECT_EQ(e.getSrcLineNumber(), line);
+    }
+}
+
 uint32_t word(const void* at) {
     uint32_t v;
     std::memcpy(&v, at, sizeof v);
@@ -179,7 +192,6 @@ TEST(VariableSizeAllocatorTest, RoundingSplittingAndMerging) {
     Supplier s;
     {
         VariableSizeAllocator a = makeAllocator(s, 0, 1024);
-        EXPECT_EQ(VariableSizeAllocator::kMinBlockSize, 32u) << "the in-place node fits 32 bytes";
         EXPECT_EQ(s.allocCalls, 0u) << "no initial pages";
 
         unsigned int obtained = 99;
@@ -607,30 +619,16 @@ TEST(ZYRFixedSizePoolTest, ChunksFreeListAndFailure) {
     tZYRMemMgr record = host.record();
     zyrtest::installFront(0, &record);
     EXPECT_EQ(pool.Alloc(), nullptr);
-    try {
-        pool.SureAlloc();
-        ADD_FAILURE() << "SureAlloc did not throw";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);
-        EXPECT_STREQ(e.getMessage(), "ZYRFixedSizePool allocation failed");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRPool");
-        EXPECT_EQ(e.getSrcLineNumber(), 102);
-    }
+    expectOutOfMemory([&] { (void)pool.SureAlloc(); }, "ZYRFixedSizePool allocation failed", 102);
     zyrtest::installFront(0);
 }
 
 TEST(ZYRStdAllocatorFixedSizePoolTest, RunsPagesAndFailure) {
     ZYRStdAllocatorFixedSizePool pool(16, 100);
     EXPECT_EQ(pool.Alloc(0), nullptr);
-    try {
-        pool.SureAlloc(1u << 29); // 8 GiB: no page can hold it
-        ADD_FAILURE() << "SureAlloc did not throw";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);
-        EXPECT_STREQ(e.getMessage(), "ZYRStdAllocatorFixedSizePool allocation failed");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRPool");
-        EXPECT_EQ(e.getSrcLineNumber(), 173);
-    }
+    // 8 GiB: no page can hold it.
+    expectOutOfMemory([&] { (void)pool.SureAlloc(1u << 29); },
+                      "ZYRStdAllocatorFixedSizePool allocation failed", 173);
 
     tZYRVirtualMemoryInfo info{};
     VirtualMemStatus(&info);
