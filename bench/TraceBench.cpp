@@ -11,6 +11,7 @@
 #include <unordered_map>
 
 #include "BenchSupport.h"
+#include "ZYRHostKit.h"
 #include "ZYRStd.h"
 
 namespace {
@@ -24,99 +25,14 @@ std::string& benchDir() {
     return dir;
 }
 
-// A job with a progress interface and the given trace configuration.
-template <class Interface> class Counted : public Interface {
-public:
-    void addRef() override { ++count_; }
-    void release() override {
-        if (--count_ == 0)
-            delete this;
-    }
-    bool isShared() const override { return count_ > 1; }
-    unsigned int debugGetRefCount() const override { return count_; }
-    virtual ~Counted() = default;
-
-private:
-    unsigned int count_ = 1;
-};
-
-class Progress : public Counted<ZYRPublic::I_OEMProgressInterface> {
-public:
-    void traceMsg(const ZYRPublic::sZYRTraceMsg*, ZYRPublic::I_Error&) override {}
-    void traceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString*,
-                  ZYRPublic::I_UniString*, const ZYRPublic::sZYRTraceMsg*,
-                  const ZYRPublic::sZYRTraceMsgDetail*, ZYRPublic::I_Error&) override {}
-    void beginTraceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString*,
-                       ZYRPublic::I_UniString*, const ZYRPublic::sZYRTraceMsg*,
-                       const ZYRPublic::sZYRTraceMsgDetail*, ZYRPublic::I_Error&) override {}
-    void endTraceMsg(ZYRPublic::I_Error&) override {}
-};
-
-class Interfaces : public Counted<ZYRPublic::I_OEMInterfaceSet> {
-public:
-    bool getOEMCuttingInfoMgr(ZYRPublic::I_OEMCuttingInfoMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMPDFPreProcessor(ZYRPublic::I_OEMPDFPreProcessor**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMTagEvaluatorInterface(ZYRPublic::I_OEMTagEvaluatorInterface**,
-                                     ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMXObjectResolver(ZYRPublic::I_OEMXObjectResolver**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMXObjMgr(ZYRPublic::I_OEMXObjMgr**, ZYRPublic::I_Error&) override { return false; }
-    bool getOEMDeviceColorAdjustment(ZYRPublic::I_OEMDeviceColorAdjustment**,
-                                     ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMScreenMgr(ZYRPublic::I_OEMScreenMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMFrameMarkerFactory(ZYRPublic::I_OEMFrameMarkerFactory**,
-                                  ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMRasterInterface(ZYRPublic::I_OEMRasterInterface**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMRasterBufferMgr(ZYRPublic::I_OEMRasterBufferMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMProgressInterface(ZYRPublic::I_OEMProgressInterface** out,
-                                 ZYRPublic::I_Error&) override {
-        *out = new Progress;
-        return true;
-    }
-    bool getOEMCalibrationMgr(ZYRPublic::I_OEMCalibrationMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-};
-
-class Job : public Counted<ZYRPublic::I_Job> {
-public:
-    explicit Job(const CZYRDict& params) : params_(params) {}
-    uint64_t getJobID() const override { return 7; }
-    ZYRPublic::I_Dict* getJobDict(ZYRPublic::I_Error&) override {
-        params_.getImpl()->addRef();
-        return params_.getImpl();
-    }
-    ZYRPublic::I_OEMInterfaceSet* getOEMInterfaces(ZYRPublic::I_Error&) override {
-        return new Interfaces;
-    }
-
-private:
-    CZYRDict params_;
-};
-
+// A job of the small host with the given trace configuration; its progress interface
+// drops what it is sent.
 CZYRTraceMsg makeTrace(const CZYRDict& config) {
     CZYRDict params;
     params.set(CZYRUniString("JPJobID"), 7);
     params.set(CZYRUniString("ZYRTraceMsg"), config);
     params.finalize();
-    return CZYRTraceMsg(C_SmartPtr<ZYRPublic::I_Job>(new Job(params), false));
+    return CZYRTraceMsg(ZYRHostKit::makeHostJob(7, params.getImpl()));
 }
 
 void BM_TraceWrite_Ours(benchmark::State& state) {

@@ -3,9 +3,17 @@
 // hosts, tests and zyrstd link this kit to have them.
 #pragma once
 
+#include <atomic>
+#include <cstdint>
+#include <functional>
+
+#include "C_SmartPtr.h"
 #include "IZYRFileName.h"
 #include "IZYRFileSys.h"
+#include "I_Dict.h"
+#include "I_Job.h"
 #include "ZYRPDLFileSysRec.h"
+#include "sZYRTraceMsg.h"
 #include "zyr/std/CZYRString.h"
 #include "zyr/std/ZYRStdInit.h"
 
@@ -52,6 +60,36 @@ ZYRStd::CZYRWString utf8ToUTF16(const char* text);
 
 // The host memory procedures over the C runtime heap (malloc, realloc, free).
 ZYRStd::tZYRMemMgr crtMemMgr();
+
+// The count protocol of the engine's interfaces for a host's own objects; the last release
+// deletes.
+template <class Interface> class Counted : public Interface {
+public:
+    void addRef() override { count_.fetch_add(1, std::memory_order_relaxed); }
+    void release() override {
+        if (count_.fetch_sub(1, std::memory_order_acq_rel) == 1)
+            delete this;
+    }
+    bool isShared() const override { return count_.load(std::memory_order_acquire) > 1; }
+    unsigned int debugGetRefCount() const override {
+        return count_.load(std::memory_order_acquire);
+    }
+    virtual ~Counted() = default;
+
+private:
+    std::atomic<unsigned int> count_{1};
+};
+
+// What the host's progress interface does with each trace message the library sends it.
+using TraceSink = std::function<void(const ZYRPublic::sZYRTraceMsg& message,
+                                     const ZYRPublic::sZYRTraceMsgDetail& detail)>;
+
+// A job as a small host hands it to the library: its identifier, its job dictionary
+// (`params`, shared, e.g. with a trace configuration under "ZYRTraceMsg"), and an interface
+// set whose only interface is a progress interface passing trace messages to `onTrace`
+// (dropped when it is empty).
+ZYRPublic::C_SmartPtr<ZYRPublic::I_Job> makeHostJob(uint64_t jobID, ZYRPublic::I_Dict* params,
+                                                    TraceSink onTrace = {});
 
 // The library as a small host sets it up: the common strings and the dynamic string
 // cache, the POSIX file-name factory and the native file system as the default one; all

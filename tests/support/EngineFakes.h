@@ -2,7 +2,6 @@
 // records what it is sent, and the chain from a surface to its job.
 #pragma once
 
-#include <atomic>
 #include <string>
 #include <utility>
 #include <vector>
@@ -10,6 +9,7 @@
 #include "C_SmartPtr.h"
 #include "I_Job.h"
 #include "I_Surface.h"
+#include "ZYRHostKit.h"
 #include "zyr/std/CZYRDict.h"
 #include "zyr/std/CZYRError.h"
 
@@ -18,22 +18,7 @@ namespace zyrtest {
 using ZYRPublic::C_SmartPtr;
 
 // The count protocol for any interface; the last release deletes.
-template <class Interface> class RefCounted : public Interface {
-public:
-    void addRef() override { count_.fetch_add(1, std::memory_order_relaxed); }
-    void release() override {
-        if (count_.fetch_sub(1, std::memory_order_acq_rel) == 1)
-            delete this;
-    }
-    bool isShared() const override { return count_.load(std::memory_order_acquire) > 1; }
-    unsigned int debugGetRefCount() const override {
-        return count_.load(std::memory_order_acquire);
-    }
-    virtual ~RefCounted() = default;
-
-private:
-    std::atomic<unsigned int> count_{1};
-};
+template <class Interface> using RefCounted = ZYRHostKit::Counted<Interface>;
 
 // A new object with its creator's reference adopted.
 template <class T, class... Args> C_SmartPtr<T> make(Args&&... args) {

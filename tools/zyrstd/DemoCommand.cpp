@@ -14,6 +14,7 @@
 #include "Commands.h"
 #include "I_Job.h"
 #include "I_SurfaceQueue.h"
+#include "ZYRHostKit.h"
 #include "ZYRStd.h"
 
 namespace zyrtool {
@@ -155,97 +156,6 @@ void allocationUnderPressure() {
     std::remove(logPath.c_str());
 }
 
-// The engine side of a traced job: a job whose interface set has only a progress interface,
-// which shows what the library routes to the host.
-template <class Interface> class Counted : public Interface {
-public:
-    void addRef() override { ++count_; }
-    void release() override {
-        if (--count_ == 0)
-            delete this;
-    }
-    bool isShared() const override { return count_ > 1; }
-    unsigned int debugGetRefCount() const override { return count_; }
-    virtual ~Counted() = default;
-
-private:
-    unsigned int count_ = 1;
-};
-
-class HostProgress : public Counted<ZYRPublic::I_OEMProgressInterface> {
-public:
-    void traceMsg(const ZYRPublic::sZYRTraceMsg*, ZYRPublic::I_Error&) override {}
-    void traceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString*,
-                  ZYRPublic::I_UniString*, const ZYRPublic::sZYRTraceMsg* msg,
-                  const ZYRPublic::sZYRTraceMsgDetail* detail, ZYRPublic::I_Error&) override {
-        std::printf("   the host's progress interface receives (level %d): %s\n", detail->level,
-                    msg->text ? msg->text : "(wide text)");
-    }
-    void beginTraceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString*,
-                       ZYRPublic::I_UniString*, const ZYRPublic::sZYRTraceMsg*,
-                       const ZYRPublic::sZYRTraceMsgDetail*, ZYRPublic::I_Error&) override {}
-    void endTraceMsg(ZYRPublic::I_Error&) override {}
-};
-
-class HostInterfaces : public Counted<ZYRPublic::I_OEMInterfaceSet> {
-public:
-    bool getOEMCuttingInfoMgr(ZYRPublic::I_OEMCuttingInfoMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMPDFPreProcessor(ZYRPublic::I_OEMPDFPreProcessor**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMTagEvaluatorInterface(ZYRPublic::I_OEMTagEvaluatorInterface**,
-                                     ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMXObjectResolver(ZYRPublic::I_OEMXObjectResolver**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMXObjMgr(ZYRPublic::I_OEMXObjMgr**, ZYRPublic::I_Error&) override { return false; }
-    bool getOEMDeviceColorAdjustment(ZYRPublic::I_OEMDeviceColorAdjustment**,
-                                     ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMScreenMgr(ZYRPublic::I_OEMScreenMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMFrameMarkerFactory(ZYRPublic::I_OEMFrameMarkerFactory**,
-                                  ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMRasterInterface(ZYRPublic::I_OEMRasterInterface**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMRasterBufferMgr(ZYRPublic::I_OEMRasterBufferMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-    bool getOEMProgressInterface(ZYRPublic::I_OEMProgressInterface** out,
-                                 ZYRPublic::I_Error&) override {
-        *out = new HostProgress;
-        return true;
-    }
-    bool getOEMCalibrationMgr(ZYRPublic::I_OEMCalibrationMgr**, ZYRPublic::I_Error&) override {
-        return false;
-    }
-};
-
-class HostJob : public Counted<ZYRPublic::I_Job> {
-public:
-    explicit HostJob(const CZYRDict& params) : params_(params) {}
-    uint64_t getJobID() const override { return 1; }
-    ZYRPublic::I_Dict* getJobDict(ZYRPublic::I_Error&) override {
-        params_.getImpl()->addRef();
-        return params_.getImpl();
-    }
-    ZYRPublic::I_OEMInterfaceSet* getOEMInterfaces(ZYRPublic::I_Error&) override {
-        return new HostInterfaces;
-    }
-
-private:
-    CZYRDict params_;
-};
-
 CZYRDict areaLevel(const char* key, unsigned int level) {
     CZYRDict area;
     area.set(CZYRUniString(key), level);
@@ -267,7 +177,14 @@ void tracedJob() {
         CZYRDict params;
         params.set(CZYRUniString("JPJobID"), 1);
         params.set(CZYRUniString("ZYRTraceMsg"), config);
-        CZYRTraceMsg trace(C_SmartPtr<ZYRPublic::I_Job>(new HostJob(params), false));
+        // The host's progress interface shows what the library routes to it.
+        CZYRTraceMsg trace(ZYRHostKit::makeHostJob(
+            1, params.getImpl(),
+            [](const ZYRPublic::sZYRTraceMsg& message,
+               const ZYRPublic::sZYRTraceMsgDetail& detail) {
+                std::printf("   the host's progress interface receives (level %d): %s\n",
+                            detail.level, message.text ? message.text : "(wide text)");
+            }));
 
         const CZYRUniString render("Render");
         trace.traceMsg(render, CZYRUniString("Bands"), ZYRPublic::kZYRTraceMsgLevel2,
