@@ -91,17 +91,21 @@ bench: deps-bench
 	@for b in $(BENCH_BUILD)/*Bench; do echo "== $$b"; $$b --benchmark_min_time=0.2 || exit 1; done
 
 # Each libFuzzer target runs for FUZZ_SECONDS from its seed corpus (new finds go to a
-# scratch corpus, so the tree only changes when someone copies a case in).
+# scratch corpus, so the tree only changes when someone copies a case in). A finding fails
+# the target; its input is saved in the build directory and the whole run in <name>.log.
 fuzz: deps-fuzz
 	CC=clang CXX=clang++ cmake -S . -B $(FUZZ_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
 	  -DZYRSTD_SANITIZE=address -DZYRSTD_BUILD_TESTS=OFF -DZYRSTD_BUILD_FUZZ=ON
 	cmake --build $(FUZZ_BUILD)
 	@for f in fuzz/*Fuzz.cpp; do \
 	  name=$$(basename $$f .cpp); scratch=$(FUZZ_BUILD)/corpus/$$name; mkdir -p $$scratch; \
+	  log=$(FUZZ_BUILD)/$$name.log; \
 	  echo "== $$name ($(FUZZ_SECONDS) s)"; \
 	  ASAN_OPTIONS=detect_leaks=1 ./$(FUZZ_BUILD)/$$name -max_total_time=$(FUZZ_SECONDS) \
-	    -print_final_stats=1 $$scratch fuzz/corpus/$$name 2>&1 | \
-	    grep -E 'stat::number_of_executed_units|ERROR|SUMMARY|Done' || exit 1; \
+	    -print_final_stats=1 -artifact_prefix=$(FUZZ_BUILD)/$$name- \
+	    $$scratch fuzz/corpus/$$name >$$log 2>&1; status=$$?; \
+	  grep -E 'stat::number_of_executed_units|ERROR|SUMMARY|Done' $$log; \
+	  if [ $$status -ne 0 ]; then echo "$$name failed (exit $$status): see $$log"; exit 1; fi; \
 	done
 
 soak: deps-test

@@ -12,7 +12,6 @@ namespace ZYRStd {
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/ZYRCache";
-constexpr const char* kHeaderSource = "source/zyr/std/IZYRCache";
 // The source lines that the assertion records of the cache have always carried.
 constexpr int kBadArgumentsLine = 92;
 constexpr int kNoHeadTableLine = 94;

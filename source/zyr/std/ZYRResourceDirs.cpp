@@ -33,7 +33,6 @@ constexpr unsigned int kFirstCacheListNumber = 1001;
 constexpr const char* kResourceDirs[] = {"ZYRFonts/TUMA/10.0/CMaps", "ZYRFonts/Fonts/Reqrd/CMaps",
                                          "ZYRFonts/Fonts"};
 constexpr size_t kResourcePrefixLength = 9;
-constexpr unsigned int kResourceDirCount = std::size(kResourceDirs);
 
 // Process-wide, set at start-up.
 struct ResourceDirs {
