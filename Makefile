@@ -111,7 +111,7 @@ fuzz: deps-fuzz
 soak: deps-test
 	cmake -S . -B $(BUILD)-test $(CMAKE_FLAGS) -DZYRSTD_BUILD_TESTS=ON -DZYRSTD_SANITIZE=
 	cmake --build $(BUILD)-test --target ZYRSoak
-	ZYRSTD_SOAK_SECONDS=$(SOAK_SECONDS) ./$(BUILD)-test/ZYRSoak
+	ZYRSTD_SOAK_SECONDS=$(SOAK_SECONDS) ./$(BUILD)-test/tests/ZYRSoak
 
 # Debian packages of the runtime library with the tool, and of the development files.
 package: deps-package

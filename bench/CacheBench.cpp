@@ -11,8 +11,8 @@
 
 #include "BenchSupport.h"
 #include "ZYRStd.h"
-#include "zyr/std/CZYRMaskCache.h"
-#include "zyr/std/IZYRCache.h"
+#include "zyr/std/caches/CZYRMaskCache.h"
+#include "zyr/std/caches/IZYRCache.h"
 
 namespace {
 

@@ -16,9 +16,9 @@
 #include <vector>
 
 #include "BenchSupport.h"
-#include "zyr/std/CZYRStreamsFilterASCII85.h"
-#include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
-#include "zyr/std/IImpZYRMemStream.h"
+#include "zyr/std/io/CZYRStreamsFilterASCII85.h"
+#include "zyr/std/io/CZYRStreamsFilterASCIIHEX.h"
+#include "zyr/std/io/IImpZYRMemStream.h"
 
 extern char** environ;
 

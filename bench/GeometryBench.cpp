@@ -7,8 +7,8 @@
 #include <vector>
 
 #include "BenchSupport.h"
-#include "zyr/std/CZYRMatrix.h"
-#include "zyr/std/ZYRFixed.h"
+#include "zyr/std/geometry/CZYRMatrix.h"
+#include "zyr/std/geometry/ZYRFixed.h"
 
 namespace {
 

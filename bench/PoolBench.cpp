@@ -11,7 +11,7 @@
 
 #include "BenchSupport.h"
 #include "ZYRStd.h"
-#include "zyr/std/ZYRPool.h"
+#include "zyr/std/memory/ZYRPool.h"
 
 namespace {
 

@@ -1,8 +1,8 @@
 // POSIX file names and their factory.
 #include "ZYRHostKit.h"
 
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRFileSys_helper.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRHostKit {
 

@@ -7,8 +7,8 @@
 #include <unistd.h>
 
 #include "ZYRHostKit.h"
-#include "zyr/std/ZYRFileSys_helper.h"
-#include "zyr/std/ZYRPosixIO.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
+#include "zyr/std/io/posix/ZYRPosixIO.h"
 
 namespace ZYRHostKit {
 

@@ -14,8 +14,8 @@
 #include "I_Job.h"
 #include "ZYRPDLFileSysRec.h"
 #include "sZYRTraceMsg.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/values/CZYRString.h"
 
 namespace ZYRHostKit {
 

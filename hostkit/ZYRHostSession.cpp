@@ -2,9 +2,9 @@
 #include <cstdlib>
 
 #include "ZYRHostKit.h"
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRHostKit {
 

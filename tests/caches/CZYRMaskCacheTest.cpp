@@ -9,11 +9,11 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRErrorStk.h"
-#include "zyr/std/CZYRMaskCache.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/caches/CZYRMaskCache.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
 
 using namespace ZYRStd;
 

@@ -12,9 +12,9 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/IZYRCache.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/caches/IZYRCache.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
 
 using namespace ZYRStd;
 

@@ -12,11 +12,11 @@
 
 #include "TestSupport.h"
 #include "ZYRHostKit.h"
-#include "zyr/std/CZYRBaseStream.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRFileSys.h"
-#include "zyr/std/IImpZYRMemStream.h"
-#include "zyr/std/ZYRConfigParser.h"
+#include "zyr/std/config/ZYRConfigParser.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/CZYRBaseStream.h"
+#include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/io/IImpZYRMemStream.h"
 
 using namespace ZYRStd;
 

@@ -6,11 +6,11 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRResourceDirs.h"
+#include "zyr/std/config/ZYRResourceDirs.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRString.h"
 
 using namespace ZYRStd;
 

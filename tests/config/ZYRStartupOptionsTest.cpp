@@ -13,12 +13,12 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRStartupOptionKeys.h"
-#include "zyr/std/ZYRStartupOptions.h"
-#include "zyr/std/ZYRThread.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/config/internal/ZYRStartupOptionKeys.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
 
 using namespace ZYRStd;
 

@@ -5,9 +5,9 @@
 #include <thread>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRErrorStk.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRThread.h"
 
 using namespace ZYRStd;
 

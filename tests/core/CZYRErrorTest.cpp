@@ -3,8 +3,8 @@
 
 #include <stdexcept>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRErrorBoundary.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;

@@ -6,8 +6,8 @@
 
 #include "C_SmartPtr.h"
 #include "TestSupport.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/core/ZYRMem.h"
 
 using namespace ZYRStd;
 using ZYRPublic::C_SmartPtr;

@@ -11,11 +11,11 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRErrorStk.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRStdInit.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/core/ZYRThread.h"
 
 using namespace ZYRStd;
 

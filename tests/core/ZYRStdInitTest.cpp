@@ -6,9 +6,9 @@
 #include <sstream>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRStdInit.h"
 
 using namespace ZYRStd;
 

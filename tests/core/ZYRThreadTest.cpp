@@ -7,9 +7,9 @@
 #include <thread>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRClientRegistry.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/memory/CZYRClientRegistry.h"
 
 using namespace ZYRStd;
 

@@ -7,7 +7,7 @@
 #include <thread>
 #include <vector>
 
-#include "zyr/std/ZYRUniqueID.h"
+#include "zyr/std/core/ZYRUniqueID.h"
 
 TEST(ZYRUniqueIDTest, DistinctAndIncreasingAcrossThreads) {
     constexpr int kPerThread = 1000;

@@ -6,8 +6,8 @@
 #include <string>
 
 #include "TestSupport.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
 
 using namespace ZYRStd;
 

@@ -5,8 +5,8 @@
 #include <limits>
 
 #include "EngineFakes.h"
-#include "zyr/std/CZYRStrokeParams.h"
-#include "zyr/std/CZYRSurfaceRenderAttributes.h"
+#include "zyr/std/engine/CZYRStrokeParams.h"
+#include "zyr/std/engine/CZYRSurfaceRenderAttributes.h"
 
 using namespace ZYRStd;
 using namespace zyrtest;

@@ -4,7 +4,7 @@
 #include <type_traits>
 
 #include "EngineFakes.h"
-#include "zyr/std/ZYROEMInterfacesInternal.h"
+#include "zyr/std/engine/ZYROEMInterfacesInternal.h"
 
 using namespace ZYRStd;
 using namespace zyrtest;

@@ -6,8 +6,8 @@
 #include <limits>
 #include <random>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRMatrix.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/geometry/CZYRMatrix.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;

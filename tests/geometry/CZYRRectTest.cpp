@@ -3,8 +3,8 @@
 
 #include <limits>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRRect.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/geometry/CZYRRect.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;

@@ -3,8 +3,8 @@
 
 #include <vector>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRSampledFunc.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/geometry/CZYRSampledFunc.h"
 
 using namespace ZYRStd;
 

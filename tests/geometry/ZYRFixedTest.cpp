@@ -7,7 +7,7 @@
 #include <limits>
 #include <random>
 
-#include "zyr/std/ZYRFixed.h"
+#include "zyr/std/geometry/ZYRFixed.h"
 
 using namespace ZYRStd;
 

@@ -20,11 +20,12 @@ prefix="$work/prefix"
 if find "$prefix/include" -name '*.cpp' | grep -q .; then
     echo "sources installed"; exit 1
 fi
-for internal in ZYRMemInternal.h ZYRNoDestructor.h ZYRFileSys_Posix.h ZYRFileSys_helper.h; do
-    if find "$prefix/include" -name "$internal" | grep -q .; then
+source="$(cd "$here/../.." && pwd)"
+while read -r internal; do
+    if find "$prefix/include" -name "$(basename "$internal")" | grep -q .; then
         echo "internal header installed: $internal"; exit 1
     fi
-done
+done < <(find "$source/source" -path '*/internal/*' -o -path '*/posix/*' -name '*.h')
 if grep -rlE '#include <(unicode|boost)/' "$prefix/include"; then
     echo "an installed header needs ICU or Boost"; exit 1
 fi

@@ -3,10 +3,10 @@
 
 #include <optional>
 
-#include "zyr/std/CZYRAnalyticsData.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/IImpZYRAnalyticsManager.h"
-#include "zyr/std/ZYRStartupOptions.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/instrument/CZYRAnalyticsData.h"
+#include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;

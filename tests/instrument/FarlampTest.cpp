@@ -9,11 +9,11 @@
 
 #include "RecordingKelvrin.h"
 #include "TestSupport.h"
-#include "zyr/std/CZYRAnalyticsData.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRErrorStk.h"
-#include "zyr/std/Farlamp.h"
-#include "zyr/std/ZYRStartupOptions.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/instrument/CZYRAnalyticsData.h"
+#include "zyr/std/instrument/Farlamp.h"
+#include "zyr/std/values/CZYRDict.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;

@@ -11,8 +11,8 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/IHardwareInfo.h"
-#include "zyr/std/ZYRHardwareQuerySource.h"
+#include "zyr/std/instrument/IHardwareInfo.h"
+#include "zyr/std/instrument/ZYRHardwareQuerySource.h"
 
 using namespace ZYRStd;
 

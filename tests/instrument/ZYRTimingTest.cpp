@@ -7,7 +7,7 @@
 #include <regex>
 #include <string>
 
-#include "zyr/std/ZYRTimingManager.h"
+#include "zyr/std/instrument/ZYRTimingManager.h"
 
 using namespace ZYRStd;
 

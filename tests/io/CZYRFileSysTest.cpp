@@ -13,10 +13,10 @@
 
 #include "TestSupport.h"
 #include "ZYRHostKit.h"
-#include "zyr/std/CZYRBaseStream.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRFileSys.h"
-#include "zyr/std/ZYRPosixIO.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/CZYRBaseStream.h"
+#include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/io/posix/ZYRPosixIO.h"
 
 namespace {
 

@@ -8,10 +8,10 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRStreamsFilterASCII85.h"
-#include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
-#include "zyr/std/IImpZYRMemStream.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/CZYRStreamsFilterASCII85.h"
+#include "zyr/std/io/CZYRStreamsFilterASCIIHEX.h"
+#include "zyr/std/io/IImpZYRMemStream.h"
 
 namespace {
 

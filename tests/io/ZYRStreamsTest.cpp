@@ -6,10 +6,10 @@
 
 #include "TestSupport.h"
 #include "ZYRHostKit.h"
-#include "zyr/std/CZYRBaseStream.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRFileSys.h"
-#include "zyr/std/IImpZYRMemStream.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/CZYRBaseStream.h"
+#include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/io/IImpZYRMemStream.h"
 
 namespace {
 

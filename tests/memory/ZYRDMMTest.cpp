@@ -12,11 +12,11 @@
 
 #include "I_SurfaceQueue.h"
 #include "TestSupport.h"
-#include "zyr/std/CZYRStdAllocator.h"
-#include "zyr/std/ZYRDMM.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRStdInit.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
+#include "zyr/std/memory/ZYRDMM.h"
 
 using namespace ZYRStd;
 using ZYRPublic::eFlushMemorySeverityNormal;

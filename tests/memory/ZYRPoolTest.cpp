@@ -14,11 +14,11 @@
 #include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRPool.h"
-#include "zyr/std/ZYRVirtualMem.h"
-#include "zyr/std/redblack_tree.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
+#include "zyr/std/memory/ZYRPool.h"
+#include "zyr/std/memory/redblack_tree.h"
 
 using namespace ZYRStd;
 

@@ -10,8 +10,8 @@
 #include "I_Job.h"
 #include "I_Surface.h"
 #include "ZYRHostKit.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/values/CZYRDict.h"
 
 namespace zyrtest {
 

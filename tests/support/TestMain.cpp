@@ -3,7 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "TestSupport.h"
-#include "zyr/std/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);

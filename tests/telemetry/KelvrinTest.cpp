@@ -15,9 +15,9 @@
 
 #include "Kelvrin.h"
 #include "TestSupport.h"
-#include "zyr/std/CZYRAnalyticsData.h"
-#include "zyr/std/IImpZYRAnalyticsManager.h"
-#include "zyr/std/ZYRStartupOptions.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/instrument/CZYRAnalyticsData.h"
+#include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
 
 using namespace ZYRStd;
 using nlohmann::json;

@@ -7,9 +7,9 @@
 
 #include "EngineFakes.h"
 #include "TestSupport.h"
-#include "zyr/std/CZYRTraceMsg.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/trace/CZYRTraceMsg.h"
 
 using namespace ZYRStd;
 using zyrtest::FakeProgress;

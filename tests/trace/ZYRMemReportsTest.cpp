@@ -8,7 +8,7 @@
 #include <functional>
 
 #include "EngineFakes.h"
-#include "zyr/std/ZYRMemReports.h"
+#include "zyr/std/trace/ZYRMemReports.h"
 
 using namespace ZYRStd;
 using zyrtest::FakeProgress;

@@ -3,8 +3,8 @@
 
 #include <string>
 
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 using namespace ZYRStd;
 
@@ -58,7 +58,7 @@ TEST(CZYRCommonUniStringsTest, EveryAccessorAnswersItsOwnRowAndText) {
         ++row;
     };
 #define ZYR_COMMON_STRING(Name) check(table->str_##Name(), #Name);
-#include "zyr/std/CZYRCommonUniStrings.def"
+#include "zyr/std/values/CZYRCommonUniStrings.def"
     EXPECT_EQ(row, kCommonUniStringAccessors);
 }
 

@@ -7,8 +7,8 @@
 #include <thread>
 #include <vector>
 
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/values/CZYRDict.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;

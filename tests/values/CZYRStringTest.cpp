@@ -4,10 +4,10 @@
 #include <cstring>
 #include <sstream>
 
-#include "zyr/std/CZYRDataBuffer.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/values/CZYRDataBuffer.h"
+#include "zyr/std/values/CZYRString.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 using namespace ZYRStd;
 

@@ -9,10 +9,10 @@
 
 #include <unicode/uclean.h>
 
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRString.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 using namespace ZYRStd;
 using ZYRPublic::kZYRErrorBadParam;

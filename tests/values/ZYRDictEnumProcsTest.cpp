@@ -4,9 +4,9 @@
 #include <algorithm>
 #include <sstream>
 
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRInterfaceRegistry.h"
-#include "zyr/std/ZYRDictEnumProcs.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRInterfaceRegistry.h"
+#include "zyr/std/values/ZYRDictEnumProcs.h"
 
 using namespace ZYRStd;
 

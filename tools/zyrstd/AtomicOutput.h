@@ -11,8 +11,8 @@
 #include "IZYRFileSys.h"
 #include "ToolStreams.h"
 #include "ToolSupport.h"
-#include "zyr/std/CZYRFileSys.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace zyrtool {
 

@@ -12,7 +12,7 @@
 #include "Commands.h"
 #include "ZYRHostKit.h"
 #include "ZYRStd.h"
-#include "zyr/std/ZYRStartupOptionKeys.h"
+#include "zyr/std/config/internal/ZYRStartupOptionKeys.h"
 
 namespace zyrtool {
 

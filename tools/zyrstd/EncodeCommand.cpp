@@ -10,8 +10,8 @@
 #include "ToolStreams.h"
 #include "ToolSupport.h"
 #include "ZYRHostKit.h"
-#include "zyr/std/CZYRStreamsFilterASCII85.h"
-#include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
+#include "zyr/std/io/CZYRStreamsFilterASCII85.h"
+#include "zyr/std/io/CZYRStreamsFilterASCIIHEX.h"
 
 namespace zyrtool {
 

@@ -11,7 +11,7 @@
 
 #include "Commands.h"
 #include "ZYRStd.h"
-#include "zyr/std/ZYRPosixIO.h"
+#include "zyr/std/io/posix/ZYRPosixIO.h"
 
 namespace zyrtool {
 

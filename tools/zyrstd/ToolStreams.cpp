@@ -5,8 +5,8 @@
 #include <cstring>
 
 #include "ToolSupport.h"
-#include "zyr/std/CZYRBaseStream.h"
-#include "zyr/std/CZYRFileSys.h"
+#include "zyr/std/io/CZYRBaseStream.h"
+#include "zyr/std/io/CZYRFileSys.h"
 
 namespace zyrtool {
 

@@ -11,10 +11,10 @@
 #include <vector>
 
 #include "IZYRStream.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/ZYRPosixIO.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/io/posix/ZYRPosixIO.h"
 
 namespace zyrtool {
 

@@ -4,7 +4,7 @@
 #include <cstdio>
 #include <string>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace zyrtool {
 

@@ -1,6 +1,6 @@
 // The mask cache: record blocks, storage from a sub-allocator over virtual-memory chunks,
 // the reserved mask, and the conversion of source bitmaps into mask bit order.
-#include "zyr/std/CZYRMaskCache.h"
+#include "zyr/std/caches/CZYRMaskCache.h"
 
 #include <array>
 #include <cstring>
@@ -10,9 +10,9 @@
 #include <immintrin.h>
 #endif
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
 
 namespace ZYRStd {
 

@@ -6,8 +6,8 @@
 #include <memory>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/ZYRPool.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/memory/ZYRPool.h"
 
 namespace ZYRStd {
 

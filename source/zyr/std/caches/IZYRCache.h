@@ -5,9 +5,9 @@
 #include <cstdint>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRPool.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/memory/ZYRPool.h"
 
 namespace ZYRStd {
 

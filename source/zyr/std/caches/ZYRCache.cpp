@@ -1,11 +1,11 @@
 // The generic hash cache: construction, entry life cycle, sweeping and traversal.
-#include "zyr/std/IZYRCache.h"
+#include "zyr/std/caches/IZYRCache.h"
 
 #include <algorithm>
 #include <cstring>
 #include <iterator>
 
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/ZYRMem.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // The setup-file parser and the value readings the option setters share.
-#include "zyr/std/ZYRConfigParser.h"
+#include "zyr/std/config/ZYRConfigParser.h"
 
 #include <algorithm>
 #include <array>
@@ -9,12 +9,12 @@
 #include <cstring>
 #include <limits>
 
-#include "zyr/std/CZYRBaseStream.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRFileSys.h"
-#include "zyr/std/CZYRMemBuffer.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRConfigValues.h"
+#include "zyr/std/config/internal/ZYRConfigValues.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/CZYRBaseStream.h"
+#include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

@@ -1,17 +1,17 @@
 // Resource directories, the font cache list names and the font directory list.
-#include "zyr/std/ZYRResourceDirs.h"
+#include "zyr/std/config/ZYRResourceDirs.h"
 
 #include <atomic>
 #include <cstring>
 #include <limits>
 #include <memory>
 
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRString.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

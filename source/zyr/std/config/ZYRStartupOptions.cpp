@@ -1,5 +1,5 @@
 // The start-up option store: defaults, key setters, typed setters, getters and records.
-#include "zyr/std/ZYRStartupOptions.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
 
 #include <algorithm>
 #include <bit>
@@ -7,12 +7,12 @@
 #include <cstring>
 #include <limits>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRConfigParser.h"
-#include "zyr/std/ZYRConfigValues.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRThread.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/config/ZYRConfigParser.h"
+#include "zyr/std/config/internal/ZYRConfigValues.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
 
 namespace ZYRStd {
 

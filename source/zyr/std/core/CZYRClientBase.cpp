@@ -1,11 +1,11 @@
 // Class-level allocation of library objects through the front.
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 #include <algorithm>
 #include <new>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
 
 namespace ZYRStd {
 

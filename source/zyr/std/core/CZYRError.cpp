@@ -1,5 +1,5 @@
 // Error objects and the bridges between statuses and exceptions.
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 #include <atomic>
 

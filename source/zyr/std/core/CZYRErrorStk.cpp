@@ -1,15 +1,15 @@
 // The error stack: per-thread stacks of messages, fetched and emptied as one text.
-#include "zyr/std/CZYRErrorStk.h"
+#include "zyr/std/core/CZYRErrorStk.h"
 
 #include <cstdlib>
 #include <map>
 #include <memory>
 #include <mutex>
 
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRErrorBoundary.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
 
 namespace ZYRStd {
 

@@ -1,10 +1,10 @@
 // Reference counting on bare words and storage for smart-pointer containers.
-#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
 
 #include <atomic>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
 
 namespace ZYRStd {
 

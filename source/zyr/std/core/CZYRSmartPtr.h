@@ -7,7 +7,7 @@
 #include "CZYRBaseRefCnt.h"
 #include "C_SmartPtr.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // The stack walker's interface and the stub the library ships.
-#include "zyr/std/IStackWalker.h"
+#include "zyr/std/core/IStackWalker.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // The DMM log file and its per-client statistics.
-#include "zyr/std/ZYRDMMLog.h"
+#include "zyr/std/core/internal/ZYRDMMLog.h"
 
 #include <cstdarg>
 #include <cstdio>
@@ -9,7 +9,7 @@
 #include <mutex>
 #include <string>
 
-#include "zyr/std/ZYRNoDestructor.h"
+#include "zyr/std/core/internal/ZYRNoDestructor.h"
 
 namespace ZYRStd::detail {
 

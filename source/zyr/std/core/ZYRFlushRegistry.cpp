@@ -1,7 +1,7 @@
 // The process-wide registry of flushable memory clients.
-#include "zyr/std/ZYRFlushRegistry.h"
+#include "zyr/std/core/internal/ZYRFlushRegistry.h"
 
-#include "zyr/std/ZYRNoDestructor.h"
+#include "zyr/std/core/internal/ZYRNoDestructor.h"
 
 namespace ZYRStd {
 

@@ -1,6 +1,6 @@
 // The allocation front: plain and guarded variants, the memory limit, the tracker and
 // the leak report.
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/ZYRMem.h"
 
 #include <pthread.h>
 
@@ -17,13 +17,13 @@
 #include <mutex>
 #include <string>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRErrorStk.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/IStackWalker.h"
-#include "zyr/std/ZYRMemInternal.h"
-#include "zyr/std/ZYRNoDestructor.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/core/IStackWalker.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/internal/ZYRMemInternal.h"
+#include "zyr/std/core/internal/ZYRNoDestructor.h"
 
 namespace ZYRStd {
 

@@ -1,16 +1,16 @@
 // Start-up hooks, the worker identifier, host procedures and the process-exit routines.
-#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/core/ZYRStdInit.h"
 
 #include <array>
 #include <cstdio>
 #include <cstdlib>
 #include <iostream>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRDMMLog.h"
-#include "zyr/std/ZYRFlushRegistry.h"
-#include "zyr/std/ZYRMemInternal.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
+#include "zyr/std/core/internal/ZYRDMMLog.h"
+#include "zyr/std/core/internal/ZYRFlushRegistry.h"
+#include "zyr/std/core/internal/ZYRMemInternal.h"
 
 namespace ZYRStd {
 

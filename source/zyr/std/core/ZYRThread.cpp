@@ -1,11 +1,11 @@
 // Per-thread records over Boost.Thread's thread-specific storage.
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/core/ZYRThread.h"
 
 #include <boost/thread/tss.hpp>
 #include <sys/syscall.h>
 #include <unistd.h>
 
-#include "zyr/std/ZYRUniqueID.h"
+#include "zyr/std/core/ZYRUniqueID.h"
 
 namespace ZYRStd {
 

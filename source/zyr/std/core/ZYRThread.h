@@ -7,7 +7,7 @@
 #include <mutex>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // Process-wide unique identifiers.
-#include "zyr/std/ZYRUniqueID.h"
+#include "zyr/std/core/ZYRUniqueID.h"
 
 #include <atomic>
 

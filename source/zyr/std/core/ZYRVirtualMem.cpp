@@ -1,6 +1,6 @@
 // Virtual memory over mmap, with the library's own region table, and memory status from
 // /proc, rlimits and the cgroup.
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
 
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -14,10 +14,10 @@
 #include <string>
 #include <vector>
 
-#include "zyr/std/IStackWalker.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRMemInternal.h"
-#include "zyr/std/ZYRNoDestructor.h"
+#include "zyr/std/core/IStackWalker.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/internal/ZYRMemInternal.h"
+#include "zyr/std/core/internal/ZYRNoDestructor.h"
 
 namespace ZYRStd {
 

@@ -1,7 +1,7 @@
 // Raster device attributes and colorant order: defaults, validation and comparison.
-#include "zyr/std/CZYRRasterDeviceAttributes.h"
+#include "zyr/std/engine/CZYRRasterDeviceAttributes.h"
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

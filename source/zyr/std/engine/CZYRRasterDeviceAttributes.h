@@ -7,11 +7,11 @@
 #include <vector>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRRect.h"
-#include "zyr/std/CZYRStdAllocator.h"
-#include "zyr/std/CZYRString.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/geometry/CZYRRect.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRString.h"
 
 namespace ZYRStd {
 

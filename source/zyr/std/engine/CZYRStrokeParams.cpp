@@ -1,11 +1,11 @@
 // Stroke parameters: the setters' rules, the dash storage, copying and comparison.
-#include "zyr/std/CZYRStrokeParams.h"
+#include "zyr/std/engine/CZYRStrokeParams.h"
 
 #include <algorithm>
 #include <cstring>
 #include <vector>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

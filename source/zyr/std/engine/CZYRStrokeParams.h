@@ -4,9 +4,9 @@
 #include <cstdint>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRMatrix.h"
-#include "zyr/std/CZYRMemBuffer.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/geometry/CZYRMatrix.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
 
 namespace ZYRStd {
 

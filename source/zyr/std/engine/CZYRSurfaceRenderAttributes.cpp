@@ -1,5 +1,5 @@
 // Surface render attributes: the constructors' walk to the job and the interface look-ups.
-#include "zyr/std/CZYRSurfaceRenderAttributes.h"
+#include "zyr/std/engine/CZYRSurfaceRenderAttributes.h"
 
 #include <climits>
 #include <cmath>

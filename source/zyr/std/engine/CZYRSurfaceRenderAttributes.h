@@ -8,10 +8,10 @@
 #include "I_Job.h"
 #include "I_Surface.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRInterfaceRegistry.h"
-#include "zyr/std/CZYRRasterDeviceAttributes.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/engine/CZYRRasterDeviceAttributes.h"
+#include "zyr/std/values/CZYRInterfaceRegistry.h"
 
 namespace ZYRStd {
 

@@ -1,7 +1,7 @@
 // The twelve job look-ups share one walk: job, interface set, getter.
-#include "zyr/std/ZYROEMInterfacesInternal.h"
+#include "zyr/std/engine/ZYROEMInterfacesInternal.h"
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

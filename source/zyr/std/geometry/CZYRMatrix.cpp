@@ -1,10 +1,10 @@
 // Matrix products, rotations and inversion.
-#include "zyr/std/CZYRMatrix.h"
+#include "zyr/std/geometry/CZYRMatrix.h"
 
 #include <cmath>
 #include <limits>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

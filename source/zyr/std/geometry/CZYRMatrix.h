@@ -6,7 +6,7 @@
 #include "ZYRStdExport.h"
 #include "sZYRMatrix.h"
 #include "sZYRRect.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 namespace ZYRStd {
 

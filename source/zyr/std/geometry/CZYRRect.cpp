@@ -1,7 +1,7 @@
 // The out-of-line parts of CZYRRect: its key function and the throwing setter.
-#include "zyr/std/CZYRRect.h"
+#include "zyr/std/geometry/CZYRRect.h"
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

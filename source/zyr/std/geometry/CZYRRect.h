@@ -5,7 +5,7 @@
 
 #include "ZYRStdExport.h"
 #include "sZYRRect.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // Resampling of sampled functions to 8-bit outputs.
-#include "zyr/std/CZYRSampledFunc.h"
+#include "zyr/std/geometry/CZYRSampledFunc.h"
 
 namespace ZYRStd {
 

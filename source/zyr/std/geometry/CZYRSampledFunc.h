@@ -5,8 +5,8 @@
 #include <cstring>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRMemBuffer.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
 
 namespace ZYRStd {
 

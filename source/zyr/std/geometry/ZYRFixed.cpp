@@ -1,6 +1,6 @@
 // The library's exported copies of the inline fixed-point functions.
 #include "ZYRStdExport.h"
-#include "zyr/std/ZYRFixedDetail.h"
+#include "zyr/std/geometry/ZYRFixedDetail.h"
 
 // ZYRFixed.h is not included: its inline-only definitions and these out-of-line ones may
 // not meet in one translation unit (clang refuses the pair). The declarations agree.

@@ -4,7 +4,7 @@
 #include <cstdint>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/ZYRFixedDetail.h"
+#include "zyr/std/geometry/ZYRFixedDetail.h"
 
 namespace ZYRStd {
 // Every result saturates to 0x80000000 or 0x7FFFFFFF instead of wrapping, and every

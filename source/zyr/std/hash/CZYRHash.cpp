@@ -1,5 +1,5 @@
 // MD5 (RFC 1321) and the unique-identifier counter.
-#include "zyr/std/CZYRHash.h"
+#include "zyr/std/hash/CZYRHash.h"
 
 #include <algorithm>
 #include <atomic>
@@ -9,7 +9,7 @@
 #include <cstring>
 #include <new>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

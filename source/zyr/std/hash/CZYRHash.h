@@ -4,7 +4,7 @@
 #include <array>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 namespace ZYRStd {
 

@@ -1,15 +1,15 @@
 // Analytics records: a dictionary of facts that goes to the analytics manager when finalized,
 // or nowhere when analytics were inactive at creation.
-#include "zyr/std/CZYRAnalyticsData.h"
+#include "zyr/std/instrument/CZYRAnalyticsData.h"
 
 #include <type_traits>
 
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/IImpZYRAnalyticsManager.h"
-#include "zyr/std/ZYRErrorBoundary.h"
-#include "zyr/std/ZYRStartupOptions.h"
-#include "zyr/std/ZYRUniqueID.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRUniqueID.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
+#include "zyr/std/values/CZYRDict.h"
 
 namespace ZYRStd {
 

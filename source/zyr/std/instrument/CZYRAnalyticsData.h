@@ -6,8 +6,8 @@
 #include "C_SmartPtr.h"
 #include "I_AnalyticsData.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRPublicObject.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/values/CZYRPublicObject.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

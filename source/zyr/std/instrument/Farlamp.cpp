@@ -1,6 +1,6 @@
 // Farlamp: turns analytics records, document facts, errors, feature counters and surfaces
 // into data groups and events of the telemetry library's session.
-#include "zyr/std/Farlamp.h"
+#include "zyr/std/instrument/Farlamp.h"
 
 #include <dlfcn.h>
 
@@ -15,12 +15,12 @@
 #include <utility>
 
 #include "Kelvrin.h"
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRErrorStk.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRFileSys_helper.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

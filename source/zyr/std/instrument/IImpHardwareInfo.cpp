@@ -1,6 +1,6 @@
 // IHardwareInfo over the Linux query source: queries fill the caller's records, prints write
 // them as indented lines.
-#include "zyr/std/IHardwareInfo.h"
+#include "zyr/std/instrument/IHardwareInfo.h"
 
 #include <algorithm>
 #include <cstring>
@@ -10,9 +10,9 @@
 #include <string>
 #include <vector>
 
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRHardwareQuerySource.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/instrument/ZYRHardwareQuerySource.h"
 
 namespace ZYRStd {
 

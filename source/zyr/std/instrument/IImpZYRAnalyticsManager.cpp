@@ -1,6 +1,6 @@
 // The analytics manager: a FIFO of finalized records that one Boost thread hands, in order,
 // to the telemetry session logger, so that no producer waits for logging.
-#include "zyr/std/IImpZYRAnalyticsManager.h"
+#include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
 
 #include <boost/thread/thread.hpp>
 
@@ -8,11 +8,11 @@
 #include <deque>
 #include <utility>
 
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/Farlamp.h"
-#include "zyr/std/ZYRStartupOptions.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/instrument/Farlamp.h"
 
 namespace ZYRStd {
 

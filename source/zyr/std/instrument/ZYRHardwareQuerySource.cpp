@@ -1,5 +1,5 @@
 // The hardware classes over Linux's own descriptions of the machine.
-#include "zyr/std/ZYRHardwareQuerySource.h"
+#include "zyr/std/instrument/ZYRHardwareQuerySource.h"
 
 #include <sys/utsname.h>
 

@@ -1,5 +1,5 @@
 // Timing: the tick source, its calibration, accumulators and stop watches.
-#include "zyr/std/ZYRTimingManager.h"
+#include "zyr/std/instrument/ZYRTimingManager.h"
 
 #include <algorithm>
 #include <chrono>
@@ -21,7 +21,7 @@
 #define ZYR_TIMING_X86 1
 #endif
 
-#include "zyr/std/ZYRMemInternal.h"
+#include "zyr/std/core/internal/ZYRMemInternal.h"
 
 namespace ZYRStd {
 

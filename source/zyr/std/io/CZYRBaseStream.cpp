@@ -1,8 +1,8 @@
 // Value wrappers over the stream interfaces.
-#include "zyr/std/CZYRBaseStream.h"
+#include "zyr/std/io/CZYRBaseStream.h"
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRFileSys.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/CZYRFileSys.h"
 
 namespace ZYRStd {
 

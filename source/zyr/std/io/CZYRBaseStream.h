@@ -3,8 +3,8 @@
 
 #include "IZYRStream.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
 
 namespace ZYRStd {
 

@@ -1,8 +1,8 @@
 // The installed file system as static calls, and the file-name value class.
-#include "zyr/std/CZYRFileSys.h"
+#include "zyr/std/io/CZYRFileSys.h"
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRStdInit.h"
 
 namespace ZYRStd {
 

@@ -1,9 +1,9 @@
 // ASCII85 encoder and decoder over streams.
-#include "zyr/std/CZYRStreamsFilterASCII85.h"
+#include "zyr/std/io/CZYRStreamsFilterASCII85.h"
 
 #include <cstring>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

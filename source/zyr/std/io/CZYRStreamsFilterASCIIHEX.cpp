@@ -1,5 +1,5 @@
 // ASCIIHex encoder and decoder over streams.
-#include "zyr/std/CZYRStreamsFilterASCIIHEX.h"
+#include "zyr/std/io/CZYRStreamsFilterASCIIHEX.h"
 
 #include <array>
 #if defined(__SSE2__)
@@ -7,7 +7,7 @@
 #endif
 #include <cstring>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

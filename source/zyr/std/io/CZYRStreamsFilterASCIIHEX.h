@@ -5,9 +5,9 @@
 #include "IZYRStream.h"
 #include "I_Error.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/ZYRStreamsFilterCommon.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/io/ZYRStreamsFilterCommon.h"
 
 namespace ZYRStd {
 

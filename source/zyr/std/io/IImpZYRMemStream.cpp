@@ -1,10 +1,10 @@
 // The memory stream.
-#include "zyr/std/IImpZYRMemStream.h"
+#include "zyr/std/io/IImpZYRMemStream.h"
 
 #include <cstring>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRFileSys_helper.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 
 namespace ZYRFileSys {
 

@@ -3,9 +3,9 @@
 
 #include "IZYRStream.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRMemBuffer.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
 
 namespace ZYRFileSys {
 

@@ -1,10 +1,10 @@
 // A file through the host's procedure record.
-#include "zyr/std/ZYRFileSys_OEM.h"
+#include "zyr/std/io/internal/ZYRFileSys_OEM.h"
 
 #include <cstring>
 #include <memory>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYROEMFileSys {
 

@@ -11,9 +11,9 @@
 
 #include "IZYRStream.h"
 #include "I_Error.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRMemBuffer.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
 
 namespace ZYRStd::StreamsFilterCommon {
 

@@ -1,10 +1,10 @@
 // Client identifiers and notification bookkeeping.
-#include "zyr/std/CZYRClientRegistry.h"
+#include "zyr/std/memory/CZYRClientRegistry.h"
 
 #include <algorithm>
 #include <atomic>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

@@ -5,8 +5,8 @@
 #include <map>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRStdAllocator.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
 
 namespace ZYRStd {
 

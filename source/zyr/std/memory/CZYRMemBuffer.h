@@ -3,9 +3,9 @@
 
 #include <type_traits>
 
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRDMM.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/memory/ZYRDMM.h"
 
 namespace ZYRStd {
 

@@ -4,8 +4,8 @@
 #include <algorithm>
 #include <cstddef>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRDMM.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/memory/ZYRDMM.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // The dynamic memory manager: the recovery ladder, flushing, and client accounting.
-#include "zyr/std/ZYRDMM.h"
+#include "zyr/std/memory/ZYRDMM.h"
 
 #include <algorithm>
 #include <array>
@@ -8,16 +8,16 @@
 #include <mutex>
 
 #include "I_SurfaceQueue.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/I_VariableSizeAllocator.h"
-#include "zyr/std/ZYRDMMLog.h"
-#include "zyr/std/ZYRFlushRegistry.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRMemInternal.h"
-#include "zyr/std/ZYRNoDestructor.h"
-#include "zyr/std/ZYRStdInit.h"
-#include "zyr/std/ZYRThread.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
+#include "zyr/std/core/internal/ZYRDMMLog.h"
+#include "zyr/std/core/internal/ZYRFlushRegistry.h"
+#include "zyr/std/core/internal/ZYRMemInternal.h"
+#include "zyr/std/core/internal/ZYRNoDestructor.h"
+#include "zyr/std/memory/I_VariableSizeAllocator.h"
 
 namespace ZYRStd {
 

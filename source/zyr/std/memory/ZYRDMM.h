@@ -4,7 +4,7 @@
 
 #include "ZYRStdExport.h"
 #include "eFlushMemorySeverity.h"
-#include "zyr/std/I_FlushableMemoryClient.h"
+#include "zyr/std/core/I_FlushableMemoryClient.h"
 
 namespace ZYRStd {
 

@@ -1,14 +1,14 @@
 // Sub-allocators and pools.
-#include "zyr/std/ZYRPool.h"
+#include "zyr/std/memory/ZYRPool.h"
 
 #include <algorithm>
 #include <cstdlib>
 #include <new>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRDMM.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
+#include "zyr/std/memory/ZYRDMM.h"
 
 #if defined(__SANITIZE_ADDRESS__)
 #include <sanitizer/asan_interface.h>

@@ -9,9 +9,9 @@
 #endif
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/I_VariableSizeAllocator.h"
-#include "zyr/std/redblack_tree.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/memory/I_VariableSizeAllocator.h"
+#include "zyr/std/memory/redblack_tree.h"
 
 namespace ZYRStd {
 

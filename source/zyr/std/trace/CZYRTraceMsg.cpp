@@ -1,20 +1,20 @@
 // Trace messages: configuration, level rules, routing, and the trace log with its layout.
-#include "zyr/std/CZYRTraceMsg.h"
+#include "zyr/std/trace/CZYRTraceMsg.h"
 
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <string_view>
 
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/ZYRErrorBoundary.h"
-#include "zyr/std/ZYRMemInternal.h"
-#include "zyr/std/ZYRNoDestructor.h"
-#include "zyr/std/ZYROEMInterfacesInternal.h"
-#include "zyr/std/ZYRResourceDirs.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/config/ZYRResourceDirs.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/core/internal/ZYRMemInternal.h"
+#include "zyr/std/core/internal/ZYRNoDestructor.h"
+#include "zyr/std/engine/ZYROEMInterfacesInternal.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRString.h"
 
 namespace ZYRStd {
 

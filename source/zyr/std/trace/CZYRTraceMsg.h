@@ -12,9 +12,9 @@
 #include "I_Surface.h"
 #include "ZYRStdExport.h"
 #include "sZYRTraceMsg.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

@@ -1,5 +1,5 @@
 // Memory reports over /proc: the address-space map and the usage snapshots.
-#include "zyr/std/ZYRMemReports.h"
+#include "zyr/std/trace/ZYRMemReports.h"
 
 #include <dirent.h>
 
@@ -13,10 +13,10 @@
 #include <sstream>
 #include <string>
 
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/ZYRDMM.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRVirtualMem.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRVirtualMem.h"
+#include "zyr/std/memory/ZYRDMM.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
 
 namespace ZYRStd {
 

@@ -13,7 +13,7 @@
 
 #include "ZYRStdExport.h"
 #include "sZYRTraceMsg.h"
-#include "zyr/std/CZYRTraceMsg.h"
+#include "zyr/std/trace/CZYRTraceMsg.h"
 
 namespace ZYRStd {
 

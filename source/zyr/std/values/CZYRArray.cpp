@@ -1,13 +1,13 @@
 // Arrays of typed values, and their value wrapper.
-#include "zyr/std/CZYRArray.h"
+#include "zyr/std/values/CZYRArray.h"
 
 #include <utility>
 #include <vector>
 
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/CZYRStdAllocator.h"
-#include "zyr/std/CZYRValue.h"
-#include "zyr/std/ZYRErrorBoundary.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
+#include "zyr/std/values/internal/CZYRValue.h"
 
 namespace ZYRStd {
 

@@ -6,9 +6,9 @@
 #include "C_SmartPtr.h"
 #include "I_Dict.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRDataBuffer.h"
-#include "zyr/std/CZYRPublicObject.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/values/CZYRDataBuffer.h"
+#include "zyr/std/values/CZYRPublicObject.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

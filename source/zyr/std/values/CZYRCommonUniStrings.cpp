@@ -1,5 +1,5 @@
 // The common strings table and the dynamic string cache.
-#include "zyr/std/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
 
 #include <array>
 #include <list>
@@ -8,8 +8,8 @@
 #include <utility>
 #include <vector>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 
@@ -20,14 +20,14 @@ constexpr const char* kSource = "source/zyr/std/CZYRCommonUniStrings";
 constexpr std::array<const char*, kCommonUniStringRows> kRowTexts{{
 #define ZYR_COMMON_STRING(Name) #Name,
 #define ZYR_COMMON_STRING_TEXT(Text) Text,
-#include "zyr/std/CZYRCommonUniStrings.def"
+#include "zyr/std/values/CZYRCommonUniStrings.def"
 }};
 
 // An array with too few initialisers would quietly end in null rows.
 constexpr unsigned int kListedRows = 0
 #define ZYR_COMMON_STRING(Name) +1
 #define ZYR_COMMON_STRING_TEXT(Text) +1
-#include "zyr/std/CZYRCommonUniStrings.def"
+#include "zyr/std/values/CZYRCommonUniStrings.def"
     ;
 static_assert(kListedRows == kCommonUniStringRows, "CZYRCommonUniStrings.def lists every row");
 

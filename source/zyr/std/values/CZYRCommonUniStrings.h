@@ -4,7 +4,7 @@
 #include "C_SmartPtr.h"
 #include "I_UniString.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
+#include "zyr/std/core/CZYRClientBase.h"
 
 namespace ZYRStd {
 
@@ -14,7 +14,7 @@ using ZYRPublic::I_UniString;
 // The row of each named common string: kCommonUniStringRow_a is 0, and so on.
 enum eZYRCommonUniStringRow : unsigned int {
 #define ZYR_COMMON_STRING(Name) kCommonUniStringRow_##Name,
-#include "zyr/std/CZYRCommonUniStrings.def"
+#include "zyr/std/values/CZYRCommonUniStrings.def"
     kCommonUniStringNamedRows
 };
 
@@ -40,7 +40,7 @@ public:
     virtual C_SmartPtr<I_UniString> str_##Name() const {                                           \
         return GetCachedCommonUniString(kCommonUniStringRow_##Name);                               \
     }
-#include "zyr/std/CZYRCommonUniStrings.def"
+#include "zyr/std/values/CZYRCommonUniStrings.def"
 };
 
 // The host builds the table and the cache at start-up and releases them at shutdown.

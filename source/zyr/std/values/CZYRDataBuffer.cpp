@@ -1,13 +1,13 @@
 // Immutable byte buffers.
-#include "zyr/std/CZYRDataBuffer.h"
+#include "zyr/std/values/CZYRDataBuffer.h"
 
 #include <utility>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/ZYRUniqueID.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/ZYRErrorBoundary.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRUniqueID.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
 
 namespace ZYRStd {
 

@@ -5,7 +5,7 @@
 #include "I_DataBuffer.h"
 #include "I_Error.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRPublicObject.h"
+#include "zyr/std/values/CZYRPublicObject.h"
 
 namespace ZYRStd {
 

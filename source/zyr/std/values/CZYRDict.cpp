@@ -1,16 +1,16 @@
 // Dictionaries: chained hash tables keyed by string text, and their value wrapper.
-#include "zyr/std/CZYRDict.h"
+#include "zyr/std/values/CZYRDict.h"
 
 #include <algorithm>
 #include <utility>
 #include <vector>
 
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/CZYRStdAllocator.h"
-#include "zyr/std/CZYRValue.h"
-#include "zyr/std/IImpDictEnumProcs.h"
-#include "zyr/std/ZYRErrorBoundary.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
+#include "zyr/std/values/internal/CZYRValue.h"
+#include "zyr/std/values/internal/IImpDictEnumProcs.h"
 
 namespace ZYRStd {
 

@@ -1,8 +1,8 @@
 // The interface registry.
-#include "zyr/std/CZYRInterfaceRegistry.h"
+#include "zyr/std/values/CZYRInterfaceRegistry.h"
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRStdAllocator.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
 
 namespace ZYRStd {
 

@@ -4,8 +4,8 @@
 #include <map>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
 
 namespace ZYRStd {
 

@@ -6,8 +6,8 @@
 #include <utility>
 
 #include "C_SmartPtr.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRSmartPtr.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
 
 namespace ZYRStd {
 

@@ -1,12 +1,12 @@
 // Narrow and 16-bit strings.
-#include "zyr/std/CZYRString.h"
+#include "zyr/std/values/CZYRString.h"
 
 #include <cctype>
 #include <cstring>
 #include <memory>
 
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRMem.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

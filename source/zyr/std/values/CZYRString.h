@@ -7,8 +7,8 @@
 #include <string>
 
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRStdAllocator.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/memory/CZYRStdAllocator.h"
 
 namespace ZYRStd {
 

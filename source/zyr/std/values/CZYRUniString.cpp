@@ -1,5 +1,5 @@
 // Unicode strings on ICU: construction, conversion, comparison, interning and path forms.
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 #include <atomic>
 #include <unicode/ucnv.h>
@@ -13,13 +13,13 @@
 #include <memory>
 #include <utility>
 
-#include "zyr/std/CZYRCommonUniStrings.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/ZYRErrorBoundary.h"
-#include "zyr/std/ZYRMem.h"
-#include "zyr/std/ZYRUniqueID.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRUniqueID.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRString.h"
 
 namespace ZYRStd {
 

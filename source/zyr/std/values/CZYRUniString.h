@@ -8,8 +8,8 @@
 #include "I_Error.h"
 #include "I_UniString.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRMemBuffer.h"
-#include "zyr/std/CZYRPublicObject.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
+#include "zyr/std/values/CZYRPublicObject.h"
 
 namespace ZYRStd {
 

@@ -1,9 +1,9 @@
 // Dictionary printing and copying callbacks.
-#include "zyr/std/ZYRDictEnumProcs.h"
+#include "zyr/std/values/ZYRDictEnumProcs.h"
 
 #include <iomanip>
 
-#include "zyr/std/CZYRString.h"
+#include "zyr/std/values/CZYRString.h"
 
 namespace ZYRStd {
 

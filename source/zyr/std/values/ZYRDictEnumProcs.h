@@ -5,7 +5,7 @@
 
 #include "I_Dict.h"
 #include "ZYRStdExport.h"
-#include "zyr/std/CZYRDict.h"
+#include "zyr/std/values/CZYRDict.h"
 
 namespace ZYRStd {
 

@@ -6,9 +6,9 @@
 #include <cstring>
 #include <string>
 
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRStartupOptions.h"
-#include "zyr/std/ZYRThread.h"
+#include "zyr/std/config/ZYRStartupOptions.h"
+#include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
 

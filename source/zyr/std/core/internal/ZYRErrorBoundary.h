@@ -3,7 +3,7 @@
 
 #include <utility>
 
-#include "zyr/std/CZYRError.h"
+#include "zyr/std/core/CZYRError.h"
 
 namespace ZYRStd {
 

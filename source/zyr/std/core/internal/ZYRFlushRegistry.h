@@ -4,7 +4,7 @@
 #include <mutex>
 #include <vector>
 
-#include "zyr/std/I_FlushableMemoryClient.h"
+#include "zyr/std/core/I_FlushableMemoryClient.h"
 
 namespace ZYRStd::detail {
 

@@ -4,7 +4,7 @@
 #include <cstdint>
 
 #include "sZYRTraceMsg.h"
-#include "zyr/std/ZYRStdInit.h"
+#include "zyr/std/core/ZYRStdInit.h"
 
 namespace ZYRStd {
 class IStackWalker;

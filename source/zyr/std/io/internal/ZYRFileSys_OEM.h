@@ -5,8 +5,8 @@
 
 #include "IZYRFileSys.h"
 #include "ZYRPDLFileSysRec.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYROEMFileSys {
 

@@ -6,9 +6,9 @@
 
 #include "IZYRFileName.h"
 #include "I_Error.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/CZYRUniString.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/values/CZYRString.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRFileSys {
 

@@ -1,5 +1,5 @@
 // The library's file system on POSIX.
-#include "zyr/std/ZYRPosixSupport.h"
+#include "zyr/std/io/posix/ZYRPosixSupport.h"
 
 namespace ZYRPosixFileSys {
 

@@ -9,11 +9,11 @@
 #include "IZYRFileSys.h"
 #include "IZYRStream.h"
 #include "ZYRPDLFileSysRec.h"
-#include "zyr/std/CZYRClientBase.h"
-#include "zyr/std/CZYRSmartPtr.h"
-#include "zyr/std/CZYRString.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/IImpZYRMemStream.h"
+#include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/CZYRSmartPtr.h"
+#include "zyr/std/io/IImpZYRMemStream.h"
+#include "zyr/std/values/CZYRString.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRPosixFileSys {
 

@@ -1,5 +1,5 @@
 // File streams on POSIX.
-#include "zyr/std/ZYRPosixSupport.h"
+#include "zyr/std/io/posix/ZYRPosixSupport.h"
 
 namespace ZYRPosixFileSys {
 

@@ -1,5 +1,5 @@
 // Files on POSIX: a descriptor with the access rules of the library's files.
-#include "zyr/std/ZYRPosixSupport.h"
+#include "zyr/std/io/posix/ZYRPosixSupport.h"
 
 namespace ZYRPosixFileSys {
 

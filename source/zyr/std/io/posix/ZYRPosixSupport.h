@@ -13,12 +13,12 @@
 #include <unistd.h>
 #include <utility>
 
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRMemBuffer.h"
-#include "zyr/std/ZYRFileSys_OEM.h"
-#include "zyr/std/ZYRFileSys_Posix.h"
-#include "zyr/std/ZYRFileSys_helper.h"
-#include "zyr/std/ZYRPosixIO.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/internal/ZYRFileSys_OEM.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
+#include "zyr/std/io/posix/ZYRFileSys_Posix.h"
+#include "zyr/std/io/posix/ZYRPosixIO.h"
+#include "zyr/std/memory/CZYRMemBuffer.h"
 
 namespace ZYRPosixFileSys {
 

@@ -9,12 +9,12 @@
 #include <utility>
 
 #include "I_Dict.h"
-#include "zyr/std/CZYRDataBuffer.h"
-#include "zyr/std/CZYRDict.h"
-#include "zyr/std/CZYRError.h"
-#include "zyr/std/CZYRPublicObject.h"
-#include "zyr/std/CZYRUniString.h"
-#include "zyr/std/ZYRUniqueID.h"
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRUniqueID.h"
+#include "zyr/std/values/CZYRDataBuffer.h"
+#include "zyr/std/values/CZYRDict.h"
+#include "zyr/std/values/CZYRPublicObject.h"
+#include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd::value_detail {
 

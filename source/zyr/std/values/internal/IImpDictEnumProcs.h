@@ -2,8 +2,8 @@
 // CZYRDictEnumProcs. Internal to the dictionary sources.
 #pragma once
 
-#include "zyr/std/CZYRValue.h"
-#include "zyr/std/ZYRErrorBoundary.h"
+#include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/values/internal/CZYRValue.h"
 
 namespace ZYRStd::value_detail {
 
