@@ -1,10 +1,13 @@
 // Surface render attributes, raster device attributes, colorant order and stroke parameters.
 #include <gtest/gtest.h>
 
+#include <climits>
 #include <cmath>
-#include <limits>
+#include <functional>
+#include <tuple>
 
 #include "EngineFakes.h"
+#include "TestSupport.h"
 #include "zyr/std/engine/CZYRStrokeParams.h"
 #include "zyr/std/engine/CZYRSurfaceRenderAttributes.h"
 
@@ -14,158 +17,191 @@ using namespace zyrtest;
 namespace {
 
 CZYRColorantOrderArray colorants(int n) {
+    static const char* const names[] = {"Cyan", "Magenta", "Yellow", "Black"};
     CZYRColorantOrderArray order;
-    const char* names[] = {"Cyan", "Magenta", "Yellow", "Black"};
     for (int i = 0; i < n; ++i)
         order.add(names[i], i);
     return order;
 }
 
-CZYRRasterDeviceAttributes device(unsigned int components, const CZYRColorantOrderArray& order,
-                                  bool thirdFlag = false, CZYRRect rect = {0, 0, 10, 20},
-                                  double xRes = 72.0, double yRes = 144.0) {
-    return CZYRRasterDeviceAttributes(components, 8, xRes, yRes, rect, 1, {2, 1, 512, 0}, false,
-                                      order, 1, 1, false, thirdFlag, CZYRArray());
-}
+// The device constructor's arguments, so that a case can change one of them. With the
+// third flag set, the component count need not match the colorants.
+struct Device {
+    unsigned int components = 3, first = 8, fourth = 1, second = 1, third = 1;
+    double xRes = 72.0, yRes = 144.0;
+    CZYRRect rect{0, 0, 10, 20};
+    sZYRDeviceValueBlock block{2, 1, 512, 0};
+    bool firstFlag = false, secondFlag = false, thirdFlag = true;
+    CZYRColorantOrderArray order = colorants(3);
+    CZYRArray array;
+    CZYRRasterDeviceAttributes make() const {
+        return {components, first, xRes,   yRes,  rect,       fourth,    block,
+                firstFlag,  order, second, third, secondFlag, thirdFlag, array};
+    }
+};
+
+using Raster = FakeOEM<ZYRPublic::I_OEMRasterInterface>;
 
 template <class I> void registerItem(CZYRInterfaceRegistry& registry, int id, I* value) {
     registry.registerInterface(new CZYRCRegisterItem<I*>(id, value),
                                ZYRRegisterInterfaceDefaultDeleteProc, true);
 }
 
+// A registry of the raster and progress interfaces given (null ones are left out).
+struct Registry {
+    CZYRInterfaceRegistry registry;
+    Registry(Raster* raster, FakeProgress* progress) {
+        if (raster)
+            registerItem<ZYRPublic::I_OEMRasterInterface>(registry, kZYRRasterInterfaceID, raster);
+        if (progress)
+            registerItem<ZYRPublic::I_OEMProgressInterface>(registry, kZYRProgressInterfaceID,
+                                                            progress);
+    }
+};
+
 } // namespace
 
-TEST(CZYRSurfaceRenderAttributesTest, DeviceExtents) {
-    const CZYRSurfaceRenderAttributes defaults;
-    EXPECT_EQ(defaults.getWidth(), 183600);
-    EXPECT_EQ(defaults.getHeight(), 237600);
+TEST(CZYRSurfaceRenderAttributesTest, DeviceValidationAndEquality) {
+    Device d;
+    d.thirdFlag = false;
+    d.components = 4;
+    EXPECT_EQ(thrown([&] { d.make(); }),
+              describe(ZYRPublic::kZYRErrorBadParam, "invalid num components in colorant array",
+                       "source/zyr/std/CZYRRasterDeviceAttributes", 113));
+    d.order = colorants(4);
+    EXPECT_STREQ(d.make().getColorantOrder().getEntry(3).name.c_str(), "Black");
+    EXPECT_THROW(d.make().getColorantOrder().getEntry(4), CZYRError);
 
-    const auto narrow = device(0, colorants(0), false, CZYRRect(0, 0, 1.001, 2.0), 1.0, 1.0);
-    // Only the surface constructor takes a device; go through it with a full chain.
-    auto job = makeJob(CZYRDict());
-    CZYRInterfaceRegistry registry;
-    auto raster = make<FakeOEM<ZYRPublic::I_OEMRasterInterface>>();
-    auto progress = make<FakeProgress>();
-    registerItem<ZYRPublic::I_OEMRasterInterface>(registry, kZYRRasterInterfaceID, raster.get());
-    registerItem<ZYRPublic::I_OEMProgressInterface>(registry, kZYRProgressInterfaceID,
-                                                    progress.get());
-    const CZYRSurfaceRenderAttributes one(narrow, makeSurface(9, job), 0, 0, registry, 5);
-    EXPECT_EQ(one.getWidth(), 2) << "1.001 pixels round up";
-    EXPECT_EQ(one.getHeight(), 2);
-
-    const auto huge = device(0, colorants(0), false, CZYRRect(0, 0, 10, 10), 1e300, std::nan(""));
-    const CZYRSurfaceRenderAttributes big(huge, makeSurface(9, job), 0, 0, registry, 5);
-    EXPECT_EQ(big.getWidth(), std::numeric_limits<int>::max());
-    EXPECT_EQ(big.getHeight(), 0);
-}
-
-TEST(CZYRSurfaceRenderAttributesTest, DeviceValidationAndComparison) {
-    EXPECT_NO_THROW(device(4, colorants(4)));
-    try {
-        device(4, colorants(3));
-        FAIL() << "4 components, 3 colorants";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorBadParam);
-        EXPECT_STREQ(e.getMessage(), "invalid num components in colorant array");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRRasterDeviceAttributes");
-        EXPECT_EQ(e.getSrcLineNumber(), 113);
-    }
-    EXPECT_NO_THROW(device(4, colorants(3), true)) << "the third flag allows it";
-
-    const auto base = device(3, colorants(3));
-    EXPECT_TRUE(base == device(3, colorants(3)));
-    EXPECT_FALSE(base == device(3, colorants(3), false, CZYRRect(0, 0, 10, 21)));
-    CZYRColorantOrderArray renamed = colorants(2);
-    renamed.add("Other", 2);
-    EXPECT_FALSE(base == device(3, renamed));
-    CZYRColorantOrderArray extra = colorants(3);
-    extra.setValue(1);
-    EXPECT_FALSE(base == device(3, extra));
-    EXPECT_FALSE(device(4, colorants(3), true) == device(3, colorants(3), true))
-        << "component counts differ";
-    CZYRArray longer;
-    longer.set(0, 1u);
-    EXPECT_FALSE(base == CZYRRasterDeviceAttributes(3, 8, 72.0, 144.0, {0, 0, 10, 20}, 1,
-                                                    {2, 1, 512, 0}, false, colorants(3), 1, 1,
-                                                    false, false, longer));
-    EXPECT_FALSE(base == CZYRRasterDeviceAttributes(3, 8, 72.0, 144.0, {0, 0, 10, 20}, 1,
-                                                    {2, 1, 513, 0}, false, colorants(3), 1, 1,
-                                                    false, false, CZYRArray()));
-    EXPECT_THROW(base.getColorantOrder().getEntry(3), CZYRError);
-    EXPECT_STREQ(base.getColorantOrder().getEntry(1).name.c_str(), "Magenta");
-}
-
-TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksAndLooksUp) {
-    FakeProgress* jobHost = nullptr;
-    auto job = makeJob(CZYRDict(), &jobHost);
-    auto raster = make<FakeOEM<ZYRPublic::I_OEMRasterInterface>>();
-    auto progress = make<FakeProgress>();
-    CZYRInterfaceRegistry registry;
-    registerItem<ZYRPublic::I_OEMRasterInterface>(registry, kZYRRasterInterfaceID, raster.get());
-
-    auto expectError = [](auto&& build, const char* message, int line) {
-        try {
-            build();
-            ADD_FAILURE() << message;
-        } catch (const CZYRError& e) {
-            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInvalidData);
-            EXPECT_STREQ(e.getMessage(), message);
-            EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRSurfaceRenderAttributes");
-            EXPECT_EQ(e.getSrcLineNumber(), line);
-        }
+    // Each argument takes part in the comparison on its own.
+    const std::function<void(Device&)> changes[] = {
+        [](Device& d) { d.components = 4; },
+        [](Device& d) { d.first = 9; },
+        [](Device& d) { d.xRes = 73; },
+        [](Device& d) { d.yRes = 145; },
+        [](Device& d) { d.rect = CZYRRect(0, 0, 10, 21); },
+        [](Device& d) { d.fourth = 2; },
+        [](Device& d) { d.block.value[2] = 513; },
+        [](Device& d) { d.firstFlag = true; },
+        [](Device& d) { d.second = 2; },
+        [](Device& d) { d.third = 2; },
+        [](Device& d) { d.secondFlag = true; },
+        [](Device& d) { d.thirdFlag = false; },
+        [](Device& d) { d.order.setValue(1); },
+        [](Device& d) { d.order = colorants(4); },
+        [](Device& d) { (d.order = colorants(2)).add("Other", 2); },
+        [](Device& d) { (d.order = colorants(2)).add("Yellow", 3); },
+        [](Device& d) { (d.array = CZYRArray()).set(0, 1u); },
     };
-    const auto dev = device(1, colorants(1));
-    expectError([&] { CZYRSurfaceRenderAttributes(dev, makeSurface(3, job), 0, 0, registry, 1); },
-                "missing interface", 65);
-    registerItem<ZYRPublic::I_OEMProgressInterface>(registry, kZYRProgressInterfaceID,
-                                                    progress.get());
-    expectError(
-        [&] {
-            CZYRSurfaceRenderAttributes(dev, makeSurface(3, C_SmartPtr<ZYRPublic::I_Job>()), 0, 0,
-                                        registry, 1);
-        },
-        "miss job", 46);
-    expectError(
-        [&] {
-            CZYRSurfaceRenderAttributes(dev, C_SmartPtr<ZYRPublic::I_Surface>(), 0, 0, registry, 1);
-        },
-        "miss job", 46);
-    CZYRInterfaceRegistry noRaster;
-    expectError([&] { CZYRSurfaceRenderAttributes(dev, makeSurface(3, job), 0, 0, noRaster, 1); },
-                "missing interface", 57);
+    const CZYRRasterDeviceAttributes base = Device().make();
+    EXPECT_TRUE(base == Device().make());
+    for (size_t i = 0; i < std::size(changes); ++i) {
+        Device changed;
+        changes[i](changed);
+        EXPECT_TRUE(!(base == changed.make()) && !(changed.make() == base)) << "change " << i;
+        EXPECT_TRUE(changed.make() == changed.make()) << "change " << i;
+    }
+}
+
+TEST(CZYRSurfaceRenderAttributesTest, DeviceExtentsRoundUpAndSaturate) {
+    EXPECT_EQ(CZYRSurfaceRenderAttributes().getWidth(), 183600) << "612 by 792 at 300";
+    EXPECT_EQ(CZYRSurfaceRenderAttributes().getHeight(), 237600);
+    const auto raster = make<Raster>();
+    const auto progress = make<FakeProgress>();
+    const Registry r(raster.get(), progress.get());
+    const auto surface = makeSurface(9, makeJob(CZYRDict()));
+    const struct {
+        CZYRRect rect;
+        double xRes, yRes;
+        int width, height;
+    } cases[] = {
+        {{0, 0, 1.001, 2.0}, 1.0, 1.0, 2, 2},
+        {{0, 0, 10, 10}, 1e300, std::nan(""), INT_MAX, 0},
+        {{0, 0, -10, -10}, 1e300, 0.5, INT_MIN, -5},
+    };
+    for (const auto& c : cases) {
+        Device d;
+        std::tie(d.rect, d.xRes, d.yRes) = std::tie(c.rect, c.xRes, c.yRes);
+        const CZYRSurfaceRenderAttributes attrs(d.make(), surface, 0, 0, r.registry, 5);
+        EXPECT_EQ(attrs.getWidth(), c.width) << c.xRes;
+        EXPECT_EQ(attrs.getHeight(), c.height) << c.yRes;
+    }
+}
+
+TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares) {
+    const auto job = makeJob(CZYRDict());
+    const auto dev = Device().make();
+    const auto raster = make<Raster>(), raster2 = make<Raster>();
+    const auto progress = make<FakeProgress>(), progress2 = make<FakeProgress>();
+    const Registry full(raster.get(), progress.get()), noRaster(nullptr, progress.get()),
+        noProgress(raster.get(), nullptr), otherRaster(raster2.get(), progress.get()),
+        otherProgress(raster.get(), progress2.get());
+    const auto attempt = [&](const C_SmartPtr<ZYRPublic::I_Surface>& surface, const Registry& r) {
+        return thrown([&] { CZYRSurfaceRenderAttributes(dev, surface, 0, 0, r.registry, 1); });
+    };
+    const auto invalid = [](const char* message, int line) {
+        return describe(ZYRPublic::kZYRErrorInvalidData, message,
+                        "source/zyr/std/CZYRSurfaceRenderAttributes", line);
+    };
+    EXPECT_EQ(attempt(makeSurface(3, job), noProgress), invalid("missing interface", 65));
+    EXPECT_EQ(attempt(makeSurface(3, job), noRaster), invalid("missing interface", 57));
+    EXPECT_EQ(attempt(makeSurface(3, C_SmartPtr<ZYRPublic::I_Job>()), full),
+              invalid("miss job", 46));
+    EXPECT_EQ(attempt(C_SmartPtr<ZYRPublic::I_Surface>(), full), invalid("miss job", 46));
+    // An error recorded by any step of the walk is thrown.
+    for (int step = 0; step < 3; ++step) {
+        auto surface = makeSurface(3, job);
+        (step == 0   ? surface->failWith
+         : step == 1 ? surface->owner->failWith
+                     : surface->owner->parent->failWith) = ZYRPublic::kZYRErrorTypeCheck;
+        EXPECT_EQ(attempt(surface, full), "14: getter failed (fake:1)") << "step " << step;
+    }
 
     const auto surface = makeSurface(77, job);
-    CZYRSurfaceRenderAttributes attrs(dev, surface, kZYRFirstSurface | kZYRFrontSurface,
-                                      kZYRTrapInEmulatedColorSpace, registry, 12);
+    const unsigned int flags = kZYRFirstSurface | kZYRFrontSurface;
+    const auto withSame = [&](const Registry& r, unsigned int surfaceFlags,
+                              unsigned int renderFlags, unsigned long long jobID) {
+        return CZYRSurfaceRenderAttributes(dev, surface, surfaceFlags, renderFlags, r.registry,
+                                           jobID);
+    };
+    const CZYRSurfaceRenderAttributes attrs =
+        withSame(full, flags, kZYRTrapInEmulatedColorSpace, 12);
     EXPECT_EQ(attrs.getJob().get(), job.get());
     EXPECT_EQ(attrs.getJobID(), 12u);
     EXPECT_EQ(attrs.getSurfaceID(), 77u);
     EXPECT_EQ(attrs.getOEMRasterInterface().get(), raster.get());
     EXPECT_EQ(attrs.getOEMProgessInterface().get(), progress.get());
-    EXPECT_TRUE(attrs.isFirstSurface());
-    EXPECT_TRUE(attrs.isFrontSurface());
-    EXPECT_FALSE(attrs.isLastSurface());
-    EXPECT_FALSE(attrs.useDocumentTransfers());
-    EXPECT_TRUE(attrs.trapInEmulatedColorSpace());
-    EXPECT_EQ(attrs.getResourceHolder().getNumInterfaces(), 0);
-    EXPECT_EQ(attrs.getRasterDeviceAttributes(), dev);
+    EXPECT_TRUE(attrs.isFirstSurface() && attrs.isFrontSurface() && !attrs.isLastSurface());
+    EXPECT_TRUE(!attrs.useDocumentTransfers() && attrs.trapInEmulatedColorSpace());
+    EXPECT_TRUE(attrs.getRasterDeviceAttributes() == dev);
 
     // Copies compare equal and hold their own references; the resource holder is ignored.
+    const unsigned int before = raster->debugGetRefCount();
     CZYRSurfaceRenderAttributes copy(attrs);
-    EXPECT_TRUE(copy == attrs);
+    EXPECT_EQ(raster->debugGetRefCount(), before + 1);
     registerItem<ZYRPublic::I_OEMRasterInterface>(copy.getResourceHolder(), 5, raster.get());
     EXPECT_TRUE(copy == attrs);
-    const unsigned int before = raster->debugGetRefCount();
-    {
-        CZYRSurfaceRenderAttributes third = attrs;
-        EXPECT_EQ(raster->debugGetRefCount(), before + 1);
-    }
-    EXPECT_EQ(raster->debugGetRefCount(), before);
-    const CZYRSurfaceRenderAttributes other(dev, surface, kZYRFirstSurface, 0, registry, 12);
-    EXPECT_FALSE(other == attrs);
-    EXPECT_FALSE(CZYRSurfaceRenderAttributes(dev, makeSurface(77, job), kZYRFirstSurface, 0,
-                                             registry, 12) == other)
-        << "another surface object";
+    // Each compared value on its own makes a difference.
+    Device other;
+    other.xRes = 1;
+    const CZYRSurfaceRenderAttributes variants[] = {
+        withSame(full, flags, 0, 12),
+        withSame(full, kZYRFirstSurface, kZYRTrapInEmulatedColorSpace, 12),
+        withSame(full, flags, kZYRTrapInEmulatedColorSpace, 13),
+        withSame(otherRaster, flags, kZYRTrapInEmulatedColorSpace, 12),
+        withSame(otherProgress, flags, kZYRTrapInEmulatedColorSpace, 12),
+        CZYRSurfaceRenderAttributes(other.make(), surface, flags, kZYRTrapInEmulatedColorSpace,
+                                    full.registry, 12),
+        CZYRSurfaceRenderAttributes(dev, makeSurface(77, job), flags, kZYRTrapInEmulatedColorSpace,
+                                    full.registry, 12),
+    };
+    for (size_t i = 0; i < std::size(variants); ++i)
+        EXPECT_FALSE(variants[i] == attrs) << "variant " << i;
+    // The same surface object with another identifier, then with another job.
+    surface->id = 78;
+    EXPECT_FALSE(withSame(full, flags, kZYRTrapInEmulatedColorSpace, 12) == attrs);
+    surface->id = 77;
+    surface->owner->parent->job = makeJob(CZYRDict());
+    EXPECT_FALSE(withSame(full, flags, kZYRTrapInEmulatedColorSpace, 12) == attrs);
 }
 
 TEST(CZYRSurfaceRenderAttributesTest, EndOfJob) {
@@ -174,81 +210,79 @@ TEST(CZYRSurfaceRenderAttributesTest, EndOfJob) {
     auto progress = make<FakeProgress>();
     C_Error err;
     err.setError(ZYRPublic::kZYRErrorUnknown, "why", "here", 3);
-    const CZYRSurfaceRenderAttributes end(C_SmartPtr<ZYRPublic::I_Job>(job),
-                                          C_SmartPtr<ZYRPublic::I_OEMProgressInterface>(progress),
-                                          err);
-    EXPECT_TRUE(end.endOfJob());
-    EXPECT_TRUE(end.isLastSurface());
-    EXPECT_FALSE(end.isFirstSurface());
+    const CZYRSurfaceRenderAttributes end(C_SmartPtr<ZYRPublic::I_Job>(job), progress, err);
+    EXPECT_TRUE(end.endOfJob() && end.isLastSurface() && !end.isFirstSurface());
     EXPECT_EQ(end.getJobID(), 4242u);
     EXPECT_EQ(end.getSurfaceID(), 4242u);
     EXPECT_FALSE(end.getOEMRasterInterface());
     EXPECT_EQ(end.getOEMProgessInterface().get(), progress.get());
-    EXPECT_STREQ(end.getError().getMessage(), "why");
+    EXPECT_EQ(describe(end.getError()), "1: why (here:3)");
     EXPECT_EQ(end.getWidth(), 183600);
+    EXPECT_EQ(CZYRSurfaceRenderAttributes(C_SmartPtr<ZYRPublic::I_Job>(), progress, err).getJobID(),
+              0u);
 }
 
 TEST(CZYRSurfaceRenderAttributesTest, StrokeParams) {
     CZYRStrokeParams p;
     const sStrokeParams& s = p.getStrokeParams();
-    EXPECT_EQ(s.lineWidth, 1.0f);
-    EXPECT_EQ(s.miterLimit, 10.0f);
-    EXPECT_EQ(s.dashArray, nullptr);
-    EXPECT_EQ(s.lineCap, 2);
-    EXPECT_EQ(s.lineJoin, 0);
-    p.setLineWidth(-1);
-    EXPECT_EQ(s.lineWidth, 0.0f);
-    p.setLineWidth(std::nanf(""));
-    EXPECT_EQ(s.lineWidth, 0.0f);
-    p.setLineWidth(2.5f);
-    EXPECT_EQ(s.lineWidth, 2.5f);
-    p.setMiterLimit(0.5f);
-    EXPECT_EQ(s.miterLimit, 1.0f);
-    p.setMiterLimit(4);
-    EXPECT_EQ(s.miterLimit, 4.0f);
+    EXPECT_TRUE(s.lineWidth == 1 && s.miterLimit == 10 && !s.dashArray && s.lineCap == 2 &&
+                s.lineJoin == 0);
+    for (const auto& [given, width, limit] : {std::tuple{-1.0f, 0.0f, 1.0f},
+                                              {std::nanf(""), 0.0f, 1.0f},
+                                              {0.5f, 0.5f, 1.0f},
+                                              {2.5f, 2.5f, 2.5f}}) {
+        p.setLineWidth(given);
+        p.setMiterLimit(given);
+        EXPECT_TRUE(s.lineWidth == width && s.miterLimit == limit) << given;
+    }
 
-    const float dashes[] = {3, 1, 2};
+    const float dashes[] = {3, 1, 2}, other[] = {3, 1, 5};
     p.setDashedArray(dashes, 3);
-    ASSERT_NE(s.dashArray, dashes);
-    EXPECT_EQ(s.dashArray[2], 2.0f);
     float* const storage = s.dashArray;
+    ASSERT_NE(storage, dashes);
+    p.setDashedArray(other, 3);
+    EXPECT_TRUE(s.dashArray == storage && s.dashArray[2] == 5) << "as many values, same storage";
     p.setDashedArray(dashes + 1, 1);
     EXPECT_EQ(s.dashArray, storage) << "the storage never shrinks";
     p.setDashedArray(s.dashArray, 1);
     EXPECT_EQ(s.dashArray[0], 1.0f);
     p.setDashedArray(nullptr, 0);
-    EXPECT_EQ(s.dashCount, 0);
-    EXPECT_EQ(s.dashArray, storage);
+    EXPECT_TRUE(s.dashCount == 0 && s.dashArray == storage);
     EXPECT_THROW(p.setDashedArray(dashes, -1), CZYRError);
     EXPECT_THROW(p.setDashedArray(nullptr, 2), CZYRError);
 
-    // Same values in different storage are equal; so are counts of 0.
+    // Each compared value on its own makes a difference.
+    CZYRStrokeParams base;
+    base.setDashedArray(dashes, 3);
+    const std::function<void(CZYRStrokeParams&)> changes[] = {
+        [](CZYRStrokeParams& c) { c.setLineWidth(2); },
+        [](CZYRStrokeParams& c) { c.setMiterLimit(3); },
+        [](CZYRStrokeParams& c) { c.setDashedOffset(1); },
+        [](CZYRStrokeParams& c) { c.setStrokeAdjust(true); },
+        [&](CZYRStrokeParams& c) { c.setDashedArray(dashes, 2); },
+        [&](CZYRStrokeParams& c) { c.setDashedArray(other, 3); },
+        [](CZYRStrokeParams& c) { c.setLineCap(static_cast<eZYRLineCapType>(1)); },
+        [](CZYRStrokeParams& c) { c.setLineJoin(static_cast<eZYRLineJoinType>(1)); },
+    };
+    for (size_t i = 0; i < std::size(changes); ++i) {
+        CZYRStrokeParams changed(base);
+        EXPECT_TRUE(changed == base);
+        changes[i](changed);
+        EXPECT_FALSE(changed == base) << "change " << i;
+    }
     CZYRStrokeParams a, b;
-    a.setDashedArray(dashes, 3);
-    b.setDashedArray(dashes, 3);
-    EXPECT_TRUE(a == b);
-    const float other[] = {3, 1, 5};
-    b.setDashedArray(other, 3);
-    EXPECT_FALSE(a == b);
     a.setDashedArray(dashes, 0);
     b.setDashedArray(other, 0);
-    EXPECT_TRUE(a == b);
-    b.setLineCap(static_cast<eZYRLineCapType>(1));
-    EXPECT_FALSE(a == b);
+    EXPECT_TRUE(a == b) << "no dashes, nothing to compare";
 
-    // A copy owns its dashes.
-    CZYRStrokeParams original;
-    original.setDashedArray(dashes, 3);
-    original.setStrokeAdjust(true);
-    CZYRStrokeParams copy(original);
-    EXPECT_NE(copy.getStrokeParams().dashArray, original.getStrokeParams().dashArray);
-    EXPECT_TRUE(copy == original);
-    CZYRStrokeParams assigned;
-    assigned = original;
-    original.setDashedArray(other, 3);
+    // Copies own their dashes.
+    base.setStrokeAdjust(true);
+    CZYRStrokeParams copy(base), assigned;
+    assigned = base;
+    EXPECT_NE(copy.getStrokeParams().dashArray, base.getStrokeParams().dashArray);
+    EXPECT_TRUE(copy == base && assigned == base);
+    base.setDashedArray(other, 3);
     EXPECT_EQ(assigned.getStrokeParams().dashArray[2], 2.0f);
-    EXPECT_TRUE(assigned.getStrokeParams().strokeAdjust);
     assigned = CZYRStrokeParams();
-    EXPECT_EQ(assigned.getStrokeParams().dashArray, nullptr);
-    EXPECT_EQ(assigned.getStrokeParams().dashCount, 0);
+    EXPECT_TRUE(!assigned.getStrokeParams().dashArray && assigned.getStrokeParams().dashCount == 0);
 }

@@ -16,6 +16,8 @@
 namespace zyrtest {
 
 using ZYRPublic::C_SmartPtr;
+using ZYRPublic::eZYRErrorType;
+using ZYRPublic::I_Error;
 
 // The count protocol for any interface; the last release deletes.
 template <class Interface> using RefCounted = ZYRHostKit::Counted<Interface>;
@@ -27,60 +29,67 @@ template <class T, class... Args> C_SmartPtr<T> make(Args&&... args) {
 
 template <class Interface> class FakeOEM : public RefCounted<Interface> {};
 
+// An object that hands out others; `failWith` makes its getters record that error (and
+// still hand out what they hold).
+template <class Interface> class FakeHolder : public RefCounted<Interface> {
+public:
+    eZYRErrorType failWith = ZYRPublic::kZYRErrorNoError;
+
+protected:
+    template <class I> I* share(const C_SmartPtr<I>& held, I_Error& err) {
+        if (failWith != ZYRPublic::kZYRErrorNoError)
+            err.setError(failWith, "getter failed", "fake", 1);
+        if (held)
+            held->addRef();
+        return held.get();
+    }
+};
+
+// The tests' texts are ASCII; a null string is empty.
 inline std::string utf8(ZYRPublic::I_UniString* s) {
-    if (!s)
-        return "<null>";
     unsigned int bytes = 0;
-    const char* buffer = s->getUTF16LEBuffer(&bytes);
+    const char* buffer = s ? s->getUTF16LEBuffer(&bytes) : nullptr;
     std::string out;
     for (unsigned int i = 0; i + 1 < bytes; i += 2)
-        out += buffer[i]; // the tests' texts are ASCII
+        out += buffer[i];
     return out;
 }
 
-// Records every call; `failWith` makes each call record that error.
+// Records each call as one line: "whole Area/Category L3: text", "begin ...", "text: ..."
+// or "end". `failWith` makes each call record that error; `throwForeign` throws an int.
 class FakeProgress : public RefCounted<ZYRPublic::I_OEMProgressInterface> {
 public:
-    struct Call {
-        std::string kind; // "whole", "begin", "text", "end"
-        std::string area;
-        std::string category;
-        std::string text;
-        int32_t level = -1;
-    };
+    using Msg = ZYRPublic::sZYRTraceMsg;
+    using Detail = ZYRPublic::sZYRTraceMsgDetail;
+    using Text = ZYRPublic::I_UniString;
 
-    void traceMsg(const ZYRPublic::sZYRTraceMsg* msg, ZYRPublic::I_Error& err) override {
-        record({"text", "", "", textOf(msg), -1}, err);
+    void traceMsg(const Msg* msg, I_Error& err) override { record("text: " + textOf(msg), err); }
+    void traceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, Text* area, Text* category,
+                  const Msg* msg, const Detail* detail, I_Error& err) override {
+        record("whole " + head(area, category, detail) + textOf(msg), err);
     }
-    void traceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString* area,
-                  ZYRPublic::I_UniString* category, const ZYRPublic::sZYRTraceMsg* msg,
-                  const ZYRPublic::sZYRTraceMsgDetail* detail, ZYRPublic::I_Error& err) override {
-        record({"whole", utf8(area), utf8(category), textOf(msg), detail->level}, err);
+    void beginTraceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, Text* area, Text* category,
+                       const Msg* msg, const Detail* detail, I_Error& err) override {
+        record("begin " + head(area, category, detail) + textOf(msg), err);
     }
-    void beginTraceMsg(ZYRPublic::I_Job*, ZYRPublic::I_Surface*, ZYRPublic::I_UniString* area,
-                       ZYRPublic::I_UniString* category, const ZYRPublic::sZYRTraceMsg* msg,
-                       const ZYRPublic::sZYRTraceMsgDetail* detail,
-                       ZYRPublic::I_Error& err) override {
-        record({"begin", utf8(area), utf8(category), textOf(msg), detail->level}, err);
-    }
-    void endTraceMsg(ZYRPublic::I_Error& err) override { record({"end", "", "", "", -1}, err); }
+    void endTraceMsg(I_Error& err) override { record("end", err); }
+    std::string lastText() const { return calls.back().substr(calls.back().find(": ") + 2); }
 
-    std::vector<Call> calls;
-    ZYRPublic::eZYRErrorType failWith = ZYRPublic::kZYRErrorNoError;
+    std::vector<std::string> calls;
+    eZYRErrorType failWith = ZYRPublic::kZYRErrorNoError;
     bool throwForeign = false;
 
 private:
-    static std::string textOf(const ZYRPublic::sZYRTraceMsg* msg) {
-        if (!msg)
-            return "<null>";
-        if (msg->text)
-            return msg->text;
-        std::string out;
-        for (const char16_t* p = msg->wtext; p && *p; ++p)
+    static std::string head(Text* area, Text* category, const Detail* detail) {
+        return utf8(area) + "/" + utf8(category) + " L" + std::to_string(detail->level) + ": ";
+    }
+    static std::string textOf(const Msg* msg) {
+        std::string out = msg && msg->text ? msg->text : "";
+        for (const char16_t* p = msg ? msg->wtext : nullptr; p && *p; ++p)
             out += static_cast<char>(*p);
         return out;
     }
-    void record(Call call, ZYRPublic::I_Error& err) {
+    void record(std::string call, I_Error& err) {
         if (throwForeign)
             throw 42;
         calls.push_back(std::move(call));
@@ -89,68 +98,29 @@ private:
     }
 };
 
-// Every getter hands out what its member holds; a null member means "not there".
+// Each getter hands out what its member holds; a null member means "not there".
 class FakeInterfaceSet : public RefCounted<ZYRPublic::I_OEMInterfaceSet> {
 public:
-    C_SmartPtr<ZYRPublic::I_OEMCuttingInfoMgr> cutting;
-    C_SmartPtr<ZYRPublic::I_OEMPDFPreProcessor> preProcessor;
-    C_SmartPtr<ZYRPublic::I_OEMTagEvaluatorInterface> tagEvaluator;
-    C_SmartPtr<ZYRPublic::I_OEMXObjectResolver> xobjectResolver;
-    C_SmartPtr<ZYRPublic::I_OEMXObjMgr> xobjMgr;
-    C_SmartPtr<ZYRPublic::I_OEMDeviceColorAdjustment> colorAdjustment;
-    C_SmartPtr<ZYRPublic::I_OEMScreenMgr> screenMgr;
-    C_SmartPtr<ZYRPublic::I_OEMFrameMarkerFactory> frameMarker;
-    C_SmartPtr<ZYRPublic::I_OEMRasterInterface> raster;
-    C_SmartPtr<ZYRPublic::I_OEMRasterBufferMgr> rasterBuffer;
-    C_SmartPtr<ZYRPublic::I_OEMProgressInterface> progress;
-    C_SmartPtr<ZYRPublic::I_OEMCalibrationMgr> calibration;
-    // A getter that answers "found" but hands out nothing.
-    bool claimFound = false;
-
-    bool getOEMCuttingInfoMgr(ZYRPublic::I_OEMCuttingInfoMgr** out, ZYRPublic::I_Error&) override {
-        return give(cutting, out);
+    // One member and its getter for each interface of the set.
+#define ZYRTEST_SLOT(Name, member)                                                                 \
+    C_SmartPtr<ZYRPublic::I_OEM##Name> member;                                                     \
+    bool getOEM##Name(ZYRPublic::I_OEM##Name** o, I_Error&) override {                             \
+        return give(member, o);                                                                    \
     }
-    bool getOEMPDFPreProcessor(ZYRPublic::I_OEMPDFPreProcessor** out,
-                               ZYRPublic::I_Error&) override {
-        return give(preProcessor, out);
-    }
-    bool getOEMTagEvaluatorInterface(ZYRPublic::I_OEMTagEvaluatorInterface** out,
-                                     ZYRPublic::I_Error&) override {
-        return give(tagEvaluator, out);
-    }
-    bool getOEMXObjectResolver(ZYRPublic::I_OEMXObjectResolver** out,
-                               ZYRPublic::I_Error&) override {
-        return give(xobjectResolver, out);
-    }
-    bool getOEMXObjMgr(ZYRPublic::I_OEMXObjMgr** out, ZYRPublic::I_Error&) override {
-        return give(xobjMgr, out);
-    }
-    bool getOEMDeviceColorAdjustment(ZYRPublic::I_OEMDeviceColorAdjustment** out,
-                                     ZYRPublic::I_Error&) override {
-        return give(colorAdjustment, out);
-    }
-    bool getOEMScreenMgr(ZYRPublic::I_OEMScreenMgr** out, ZYRPublic::I_Error&) override {
-        return give(screenMgr, out);
-    }
-    bool getOEMFrameMarkerFactory(ZYRPublic::I_OEMFrameMarkerFactory** out,
-                                  ZYRPublic::I_Error&) override {
-        return give(frameMarker, out);
-    }
-    bool getOEMRasterInterface(ZYRPublic::I_OEMRasterInterface** out,
-                               ZYRPublic::I_Error&) override {
-        return give(raster, out);
-    }
-    bool getOEMRasterBufferMgr(ZYRPublic::I_OEMRasterBufferMgr** out,
-                               ZYRPublic::I_Error&) override {
-        return give(rasterBuffer, out);
-    }
-    bool getOEMProgressInterface(ZYRPublic::I_OEMProgressInterface** out,
-                                 ZYRPublic::I_Error&) override {
-        return give(progress, out);
-    }
-    bool getOEMCalibrationMgr(ZYRPublic::I_OEMCalibrationMgr** out, ZYRPublic::I_Error&) override {
-        return give(calibration, out);
-    }
+    ZYRTEST_SLOT(CuttingInfoMgr, cutting)
+    ZYRTEST_SLOT(PDFPreProcessor, preProcessor)
+    ZYRTEST_SLOT(TagEvaluatorInterface, tagEvaluator)
+    ZYRTEST_SLOT(XObjectResolver, xobjectResolver)
+    ZYRTEST_SLOT(XObjMgr, xobjMgr)
+    ZYRTEST_SLOT(DeviceColorAdjustment, colorAdjustment)
+    ZYRTEST_SLOT(ScreenMgr, screenMgr)
+    ZYRTEST_SLOT(FrameMarkerFactory, frameMarker)
+    ZYRTEST_SLOT(RasterInterface, raster)
+    ZYRTEST_SLOT(RasterBufferMgr, rasterBuffer)
+    ZYRTEST_SLOT(ProgressInterface, progress)
+    ZYRTEST_SLOT(CalibrationMgr, calibration)
+#undef ZYRTEST_SLOT
+    bool claimFound = false; // getters answer "found" even when they hand out nothing
 
 private:
     template <class I> bool give(const C_SmartPtr<I>& held, I** out) {
@@ -161,55 +131,41 @@ private:
     }
 };
 
-class FakeJob : public RefCounted<ZYRPublic::I_Job> {
+class FakeJob : public FakeHolder<ZYRPublic::I_Job> {
 public:
     uint64_t id = 1;
     C_SmartPtr<ZYRPublic::I_Dict> dict;
     C_SmartPtr<ZYRPublic::I_OEMInterfaceSet> interfaces;
 
     uint64_t getJobID() const override { return id; }
-    ZYRPublic::I_Dict* getJobDict(ZYRPublic::I_Error&) override { return share(dict); }
-    ZYRPublic::I_OEMInterfaceSet* getOEMInterfaces(ZYRPublic::I_Error&) override {
-        return share(interfaces);
-    }
-
-private:
-    template <class I> static I* share(const C_SmartPtr<I>& p) {
-        if (p)
-            p->addRef();
-        return p.get();
+    ZYRPublic::I_Dict* getJobDict(I_Error& err) override { return share(dict, err); }
+    ZYRPublic::I_OEMInterfaceSet* getOEMInterfaces(I_Error&) override {
+        ZYRStd::C_Error ignored; // only the parameters' getter fails
+        return share(interfaces, ignored);
     }
 };
 
-class FakeParent : public RefCounted<ZYRPublic::I_SurfaceOwnerParent> {
+class FakeParent : public FakeHolder<ZYRPublic::I_SurfaceOwnerParent> {
 public:
     C_SmartPtr<ZYRPublic::I_Job> job;
-    ZYRPublic::I_Job* getJob(ZYRPublic::I_Error&) override {
-        if (job)
-            job->addRef();
-        return job.get();
-    }
+    ZYRPublic::I_Job* getJob(I_Error& err) override { return share(job, err); }
 };
 
-class FakeOwner : public RefCounted<ZYRPublic::I_SurfaceOwner> {
+class FakeOwner : public FakeHolder<ZYRPublic::I_SurfaceOwner> {
 public:
-    C_SmartPtr<ZYRPublic::I_SurfaceOwnerParent> parent;
-    ZYRPublic::I_SurfaceOwnerParent* getOwner(ZYRPublic::I_Error&) override {
-        if (parent)
-            parent->addRef();
-        return parent.get();
+    C_SmartPtr<FakeParent> parent;
+    ZYRPublic::I_SurfaceOwnerParent* getOwner(I_Error& err) override {
+        return share(C_SmartPtr<ZYRPublic::I_SurfaceOwnerParent>(parent), err);
     }
 };
 
-class FakeSurface : public RefCounted<ZYRPublic::I_Surface> {
+class FakeSurface : public FakeHolder<ZYRPublic::I_Surface> {
 public:
     uint64_t id = 0;
-    C_SmartPtr<ZYRPublic::I_SurfaceOwner> owner;
+    C_SmartPtr<FakeOwner> owner;
     uint64_t getSurfaceID() const override { return id; }
-    ZYRPublic::I_SurfaceOwner* getOwner(ZYRPublic::I_Error&) override {
-        if (owner)
-            owner->addRef();
-        return owner.get();
+    ZYRPublic::I_SurfaceOwner* getOwner(I_Error& err) override {
+        return share(C_SmartPtr<ZYRPublic::I_SurfaceOwner>(owner), err);
     }
 };
 
@@ -219,25 +175,22 @@ inline C_SmartPtr<ZYRPublic::I_Job> makeJob(const ZYRStd::CZYRDict& params,
     auto set = make<FakeInterfaceSet>();
     auto host = make<FakeProgress>();
     if (progress)
-        *progress = static_cast<FakeProgress*>(host.get());
-    static_cast<FakeInterfaceSet*>(set.get())->progress = host;
+        *progress = host.get();
+    set->progress = host;
     auto job = make<FakeJob>();
-    auto* fake = static_cast<FakeJob*>(job.get());
-    fake->dict = params;
-    fake->interfaces = set;
+    job->dict = params;
+    job->interfaces = set;
     return job;
 }
 
 // A surface whose owner, parent and job are all there; `job` may be null to break the walk.
-inline C_SmartPtr<ZYRPublic::I_Surface> makeSurface(uint64_t id,
-                                                    const C_SmartPtr<ZYRPublic::I_Job>& job) {
-    auto parent = make<FakeParent>();
-    static_cast<FakeParent*>(parent.get())->job = job;
-    auto owner = make<FakeOwner>();
-    static_cast<FakeOwner*>(owner.get())->parent = parent;
+// (C_SmartPtr converts to any pointer type: name the interface where overloads differ.)
+inline C_SmartPtr<FakeSurface> makeSurface(uint64_t id, const C_SmartPtr<ZYRPublic::I_Job>& job) {
     auto surface = make<FakeSurface>();
-    static_cast<FakeSurface*>(surface.get())->id = id;
-    static_cast<FakeSurface*>(surface.get())->owner = owner;
+    surface->id = id;
+    surface->owner = make<FakeOwner>();
+    surface->owner->parent = make<FakeParent>();
+    surface->owner->parent->job = job;
     return surface;
 }
 

@@ -61,6 +61,12 @@ TempDir::~TempDir() {
     std::filesystem::remove_all(path_, ignored);
 }
 
+std::string describe(int type, const char* message, const char* file, int line) {
+    const auto text = [](const char* s) { return std::string(s ? s : "<null>"); };
+    return std::to_string(type) + ": " + text(message) + " (" + text(file) + ":" +
+           std::to_string(line) + ")";
+}
+
 std::string readFile(const std::string& path) {
     std::ifstream in(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};

@@ -24,6 +24,24 @@ struct FailingHost {
 // generous limit; restores "ZYR_MEMORY_STAT" afterwards.
 void installFront(int statLevel, ZYRStd::tZYRMemMgr* host = nullptr);
 
+// An error as "type: message (file:line)", so that one check compares all four.
+std::string describe(int type, const char* message, const char* file, int line);
+template <class Error> std::string describe(const Error& e) {
+    return describe(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
+}
+// The CZYRError that `call` throws, described; "no error" when it returns.
+template <class Call> std::string thrown(Call&& call) {
+    try {
+        call();
+    } catch (const ZYRStd::CZYRError& e) {
+        return describe(e);
+    }
+    return "no error";
+}
+inline bool startsWith(const std::string& s, const std::string& prefix) {
+    return s.compare(0, prefix.size(), prefix) == 0;
+}
+
 std::string readFile(const std::string& path);
 void writeFile(const std::string& path, const std::string& bytes);
 

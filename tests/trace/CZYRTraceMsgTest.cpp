@@ -25,6 +25,7 @@ protected:
         closeTraceLogPath();
         ZYRTracingDict::getInstance().setTracingDict(CZYRDict(nullptr, false));
     }
+    std::string log() const { return zyrtest::readFile(dir.file("t.log")); }
 
     zyrtest::TempDir dir;
 };
@@ -58,34 +59,16 @@ std::vector<std::string> lines(const std::string& text) {
     return out;
 }
 
-bool startsWith(const std::string& s, const std::string& prefix) {
-    return s.compare(0, prefix.size(), prefix) == 0;
-}
-
-constexpr const char* kSource = "source/zyr/std/CZYRTraceMsg";
-
-// Runs `call`, which must throw a CZYRError of `type` and of the `message`, `file` and `line`
-// that are given.
-template <class Call>
-void expectError(Call call, ZYRPublic::eZYRErrorType type, const char* message = nullptr,
-                 const char* file = nullptr, int line = 0) {
-    try {
-        call();
-        ADD_FAILURE() << "no error";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), type);
-        // Only what is given is checked.
-        EXPECT_STREQ(e.getMessage(), message ? message : e.getMessage());
-        EXPECT_STREQ(e.getSrcFileName(), file ? file : e.getSrcFileName());
-        EXPECT_EQ(e.getSrcLineNumber(), line ? line : e.getSrcLineNumber());
-    }
-}
+using zyrtest::startsWith;
+using zyrtest::thrown;
+using Calls = std::vector<std::string>;
 
 // Built on use: the string tables exist only once main() has run.
 CZYRUniString render() {
     return CZYRUniString("Render");
 }
-const char16_t* const kNoWide = nullptr;
+constexpr auto kL0 = ZYRPublic::kZYRTraceMsgLevel0;
+constexpr auto kL1 = ZYRPublic::kZYRTraceMsgLevel1;
 
 } // namespace
 
@@ -106,12 +89,10 @@ TEST_F(CZYRTraceMsgTest, HeadLayoutOfTheWriter) {
     writer.beginTraceMsg(7, nullptr, nullptr, render(), render(), nullptr, &detail, err);
     writer.traceMsg(&none, err);
     EXPECT_FALSE(err.errorOccurred());
-
-    EXPECT_EQ(zyrtest::readFile(dir.file("t.log")),
-              "<ZYRTrace> Job 7 L2 [1.50000000 sec] [C:Render/Bands] [F:band/12] \n"
-              "band done\n"
-              "<ZYRTrace> Job -3 L0 [0.00000000 sec] [C:Render] [Th:worker/5] \n"
-              "band done\n");
+    EXPECT_EQ(log(), "<ZYRTrace> Job 7 L2 [1.50000000 sec] [C:Render/Bands] [F:band/12] \n"
+                     "band done\n"
+                     "<ZYRTrace> Job -3 L0 [0.00000000 sec] [C:Render] [Th:worker/5] \n"
+                     "band done\n");
 }
 
 TEST_F(CZYRTraceMsgTest, BeginContinuationEndLayoutAndWideTexts) {
@@ -126,30 +107,39 @@ TEST_F(CZYRTraceMsgTest, BeginContinuationEndLayoutAndWideTexts) {
     trace.traceMsg("second");
     trace.traceMsg(u"\\\\server\\share\\a.pdf");
     trace.traceMsg(u"C:\\dir\\f\u00e9");
+    trace.traceMsg(u"d:x \u20ac\U0001F600\xD800x\xDC00");
     trace.endTraceMsg();
     trace.endTraceMsg();
     trace.traceMsg("after the end");
 
-    const auto got = lines(zyrtest::readFile(dir.file("t.log")));
-    ASSERT_EQ(got.size(), 7u);
+    const auto got = lines(log());
+    ASSERT_EQ(got.size(), 8u);
     EXPECT_TRUE(startsWith(got[0], "<ZYRTrace> Job 12 L3 [")) << got[0];
     EXPECT_NE(got[0].find(" sec] [C:Render/Bands] [F:src.cpp/40] "), std::string::npos);
     EXPECT_EQ(got[0].back(), ' ');
-    EXPECT_EQ(got[1], "first");
-    EXPECT_EQ(got[2], "<<");
-    EXPECT_EQ(got[3], "second");
-    EXPECT_EQ(got[4], "server/share/a.pdf");
-    EXPECT_EQ(got[5], "/C:/dir/f\xc3\xa9");
-    EXPECT_EQ(got[6], ">>");
+    const std::vector<std::string> rest = {
+        "first",
+        "<<",
+        "second",
+        "server/share/a.pdf",
+        "/C:/dir/f\xc3\xa9",
+        "/d:x \xe2\x82\xac\xf0\x9f\x98\x80\xef\xbf\xbdx\xef\xbf\xbd",
+        ">>"};
+    EXPECT_EQ(std::vector<std::string>(got.begin() + 1, got.end()), rest);
 }
 
 TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
-    EXPECT_EQ(mapToTraceMsgLevel(9), 8);
-    EXPECT_EQ(mapToTraceMsgLevel(531308012), 531308012);
-    EXPECT_EQ(mapToTraceMsgLevel(531308009), 8);
-    EXPECT_EQ(mapToTraceMsgLevel(531308015), 8);
-    EXPECT_EQ(mapToTraceMsgLevel(-5), 0);
-    EXPECT_EQ(mapToTraceMsgLevel(8), 8);
+    // The kept levels are 0x1FAB1DEA to 0x1FAB1DEE.
+    for (const auto& [value, level] : {std::pair{9, 8},
+                                       {8, 8},
+                                       {0, 0},
+                                       {-1, 0},
+                                       {-5, 0},
+                                       {531308010, 531308010},
+                                       {531308014, 531308014},
+                                       {531308009, 8},
+                                       {531308015, 8}})
+        EXPECT_EQ(mapToTraceMsgLevel(value), level) << value;
 
     CZYRDict config = withPath("stdout");
     config.set(CZYRUniString("Default"), 5u);
@@ -172,8 +162,7 @@ TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Nine"), cat), 8) << "All wins and maps";
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Kept"), cat), 531308012);
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Negative"), cat), 0);
-        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), cat), 5)
-            << "configuration Default";
+        EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), cat), 5) << "config Default";
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Known"), CZYRUniString("Other")), 2);
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("Unknown"), cat), 0);
         EXPECT_EQ(trace.getTraceMsgLevel(CZYRUniString("NotADict"), cat), 0);
@@ -183,61 +172,42 @@ TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
     }
 }
 
-// "stdout" opens no file and sends everything to the host.
-TEST_F(CZYRTraceMsgTest, AllOverridesAreasAndLevelZeroPasses) {
+// "stdout" opens no file and sends everything to the host; otherwise two areas still go
+// to the host and the rest to the log.
+TEST_F(CZYRTraceMsgTest, LevelsAndRoutingToTheHost) {
     FakeProgress* host = nullptr;
     CZYRDict config = withPath("stdout", levels({{"All", 3}}));
     config.set(render(), levels({{"All", 8}}));
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config), &host));
     ASSERT_TRUE(trace.isSendToHost());
     EXPECT_EQ(ZYRGetTraceLogPath(), "");
-
     trace.traceMsg(render(), CZYRUniString("X"), ZYRPublic::kZYRTraceMsgLevel3, "three");
     trace.traceMsg(render(), CZYRUniString("X"), ZYRPublic::kZYRTraceMsgLevel4, "four");
-    trace.traceMsg(CZYRUniString("Elsewhere"), CZYRUniString(), ZYRPublic::kZYRTraceMsgLevel0,
-                   "zero");
+    trace.traceMsg(CZYRUniString("Elsewhere"), CZYRUniString(), kL0, "zero");
     trace.traceMsg(CZYRUniString("Elsewhere"), CZYRUniString(), ZYRPublic::kZYRTraceMsgLevel8,
                    "forced", true);
-    trace.beginTraceMsg(render(), CZYRUniString("B"), ZYRPublic::kZYRTraceMsgLevel1, u"wide");
+    trace.beginTraceMsg(render(), CZYRUniString("B"), kL1, u"wide");
     trace.traceMsg(u"part");
     trace.endTraceMsg();
-    ASSERT_EQ(host->calls.size(), 6u);
-    EXPECT_EQ(host->calls[0].text, "three");
-    EXPECT_EQ(host->calls[0].level, 3);
-    EXPECT_EQ(host->calls[1].text, "zero");
-    EXPECT_EQ(host->calls[2].text, "forced");
-    EXPECT_EQ(host->calls[3].text, "wide");
-    EXPECT_EQ(host->calls[4].text, "part");
-    EXPECT_EQ(host->calls[5].kind, "end");
+    EXPECT_EQ(host->calls, (Calls{"whole Render/X L3: three", "whole Elsewhere/ L0: zero",
+                                  "whole Elsewhere/ L8: forced", "begin Render/B L1: wide",
+                                  "text: part", "end"}));
     EXPECT_EQ(trace.getTraceMsgLevel(render(), CZYRUniString("X")), 3);
-}
 
-TEST_F(CZYRTraceMsgTest, RoutingToTheHost) {
-    FakeProgress* host = nullptr;
-    CZYRTraceMsg trace(
-        zyrtest::makeJob(jobParams(withPath(dir.file("t.log"), levels({{"All", 8}}))), &host));
-    EXPECT_FALSE(trace.isSendToHost());
-
+    FakeProgress* other = nullptr;
+    CZYRTraceMsg toLog(
+        zyrtest::makeJob(jobParams(withPath(dir.file("t.log"), levels({{"All", 8}}))), &other));
+    EXPECT_FALSE(toLog.isSendToHost());
     const CZYRUniString fontMgr("FontMgr");
-    trace.beginTraceMsg(CZYRUniString("DLCacheOEMInfo"), CZYRUniString("Any"),
-                        ZYRPublic::kZYRTraceMsgLevel1, "dl");
-    trace.traceMsg("dl more");
-    trace.endTraceMsg();
-    trace.traceMsg(fontMgr, CZYRUniString("EmulatedFontInfo"), ZYRPublic::kZYRTraceMsgLevel1,
-                   u"emulated");
-    trace.traceMsg(fontMgr, CZYRUniString("Other"), ZYRPublic::kZYRTraceMsgLevel1, "to log");
-
-    ASSERT_EQ(host->calls.size(), 4u);
-    EXPECT_EQ(host->calls[0].kind, "begin");
-    EXPECT_EQ(host->calls[0].area, "DLCacheOEMInfo");
-    EXPECT_EQ(host->calls[1].kind, "text");
-    EXPECT_EQ(host->calls[1].text, "dl more");
-    EXPECT_EQ(host->calls[2].kind, "end");
-    EXPECT_EQ(host->calls[3].kind, "whole");
-    EXPECT_EQ(host->calls[3].text, "emulated");
-    const std::string log = zyrtest::readFile(dir.file("t.log"));
-    EXPECT_EQ(log.find("dl"), std::string::npos);
-    EXPECT_NE(log.find("[C:FontMgr/Other] \nto log\n"), std::string::npos) << log;
+    toLog.beginTraceMsg(CZYRUniString("DLCacheOEMInfo"), CZYRUniString("Any"), kL1, "dl");
+    toLog.traceMsg("dl more");
+    toLog.endTraceMsg();
+    toLog.traceMsg(fontMgr, CZYRUniString("EmulatedFontInfo"), kL1, u"emulated");
+    toLog.traceMsg(fontMgr, CZYRUniString("Other"), kL1, "to log");
+    EXPECT_EQ(other->calls, (Calls{"begin DLCacheOEMInfo/Any L1: dl", "text: dl more", "end",
+                                   "whole FontMgr/EmulatedFontInfo L1: emulated"}));
+    EXPECT_EQ(log().find("dl"), std::string::npos);
+    EXPECT_NE(log().find("[C:FontMgr/Other] \nto log\n"), std::string::npos) << log();
 
     // A later "stdout" configuration keeps the open log and does not send to the host.
     CZYRTraceMsg later(zyrtest::makeJob(jobParams(withPath("stdout"))));
@@ -252,7 +222,7 @@ TEST_F(CZYRTraceMsgTest, WithoutConfigurationOnlyAlwaysTraceReachesStandardOutpu
     CZYRTraceMsg trace(zyrtest::makeJob(params, &host));
     EXPECT_EQ(trace.getTraceMsgLevel(render(), render()), 0);
     ::testing::internal::CaptureStdout();
-    trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, "dropped");
+    trace.traceMsg(render(), render(), kL0, "dropped");
     trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel5, u"C:\\kept", true);
     const std::string out = ::testing::internal::GetCapturedStdout();
     EXPECT_TRUE(startsWith(out, "<ZYRTrace> Job 3 L5 [")) << out;
@@ -272,7 +242,7 @@ TEST_F(CZYRTraceMsgTest, OpenFailureWarnsAndFallsBackToStandardOutput) {
     ::testing::internal::CaptureStdout();
     CZYRTraceMsg trace(
         zyrtest::makeJob(jobParams(withPath(dir.file("missing/dir/t.log"), levels({{"All", 8}})))));
-    trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel1, "shown");
+    trace.traceMsg(render(), render(), kL1, "shown");
     const std::string out = ::testing::internal::GetCapturedStdout();
     EXPECT_TRUE(startsWith(out, "TRACE WARNING: File open failed for trace log file. Trace logs "
                                 "will be shown in standard output\n<ZYRTrace> Job 7 L1 ["))
@@ -290,10 +260,8 @@ TEST_F(CZYRTraceMsgTest, DefaultLogIsInTheTemporaryDirectory) {
         ::setenv("TMPDIR", savedText.c_str(), 1);
     else
         ::unsetenv("TMPDIR");
-    if (ZYRGetTempDirectory().empty())
-        EXPECT_EQ(ZYRGetTraceLogPath(), dir.file("traceLog.log"));
-    else
-        EXPECT_EQ(ZYRGetTraceLogPath(), ZYRGetTempDirectory() + "/traceLog.log");
+    const std::string tempDir = ZYRGetTempDirectory();
+    EXPECT_EQ(ZYRGetTraceLogPath(), (tempDir.empty() ? dir.path() : tempDir) + "/traceLog.log");
 }
 
 TEST_F(CZYRTraceMsgTest, ProcessWideDictionaryMerges) {
@@ -334,14 +302,14 @@ TEST_F(CZYRTraceMsgTest, TwoThreadsNeverMixHeadsAndTexts) {
         CZYRTraceMsg trace(job);
         const CZYRUniString a(area);
         for (int i = 0; i < kMessages; ++i)
-            trace.traceMsg(a, CZYRUniString(), ZYRPublic::kZYRTraceMsgLevel1, text);
+            trace.traceMsg(a, CZYRUniString(), kL1, text);
     };
     std::thread first(writer, "AreaA", "text of A");
     std::thread second(writer, "AreaB", "text of B");
     first.join();
     second.join();
 
-    const auto got = lines(zyrtest::readFile(dir.file("t.log")));
+    const auto got = lines(log());
     ASSERT_EQ(got.size(), 4u * kMessages);
     for (size_t i = 0; i < got.size(); i += 2) {
         ASSERT_TRUE(startsWith(got[i], "<ZYRTrace> Job 7 L1 [")) << got[i];
@@ -350,40 +318,50 @@ TEST_F(CZYRTraceMsgTest, TwoThreadsNeverMixHeadsAndTexts) {
     }
 }
 
-TEST_F(CZYRTraceMsgTest, ConstructionFailures) {
+TEST_F(CZYRTraceMsgTest, ConstructionAndHostFailures) {
     auto job = zyrtest::make<zyrtest::FakeJob>();
     job->interfaces = zyrtest::make<zyrtest::FakeInterfaceSet>();
     const auto build = [&] { CZYRTraceMsg trace{C_SmartPtr<ZYRPublic::I_Job>(job)}; };
-    expectError(build, ZYRPublic::kZYRErrorBadParam, "Required OEM interface not found", nullptr,
-                42);
+    EXPECT_EQ(thrown(build), "6: Required OEM interface not found "
+                             "(source/zyr/std/ZYROEMInterfacesInternal:42)");
     job->interfaces.reset();
-    expectError(build, ZYRPublic::kZYRErrorInitFailed, "Error getting OEM Interface");
-    // A surface whose walk breaks.
-    expectError([] { CZYRTraceMsg trace(zyrtest::makeSurface(4, C_SmartPtr<ZYRPublic::I_Job>())); },
-                ZYRPublic::kZYRErrorInvalidData, "miss job", kSource);
-    EXPECT_THROW(CZYRTraceMsg(C_SmartPtr<ZYRPublic::I_Surface>()), CZYRError);
-
-    // A complete surface chain finds the job.
+    EXPECT_EQ(thrown(build),
+              "4: Error getting OEM Interface (source/zyr/std/ZYROEMInterfacesInternal:37)");
     FakeProgress* host = nullptr;
-    CZYRTraceMsg fromSurface(
-        zyrtest::makeSurface(4, zyrtest::makeJob(jobParams(withPath("stdout")), &host)));
-    fromSurface.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, "ok");
-    EXPECT_EQ(host->calls.size(), 1u);
-}
+    const auto failing = zyrtest::makeJob(jobParams(withPath("stdout")), &host);
+    static_cast<zyrtest::FakeJob&>(*failing).failWith = ZYRPublic::kZYRErrorTypeCheck;
+    EXPECT_EQ(thrown([&] { CZYRTraceMsg trace(failing); }), "14: getter failed (fake:1)");
+    // A surface whose walk meets a null step; one whose steps record errors still finds its
+    // job, since the walk's own errors are not reported.
+    const auto fromSurface = [](const C_SmartPtr<ZYRPublic::I_Surface>& surface) {
+        return thrown([&] { CZYRTraceMsg(surface).traceMsg(render(), render(), kL0, "ok"); });
+    };
+    EXPECT_TRUE(startsWith(fromSurface(zyrtest::makeSurface(4, C_SmartPtr<ZYRPublic::I_Job>())),
+                           "25: miss job (source/zyr/std/CZYRTraceMsg:"));
+    EXPECT_TRUE(startsWith(fromSurface(C_SmartPtr<ZYRPublic::I_Surface>()), "25: miss job"));
+    const auto surface =
+        zyrtest::makeSurface(4, zyrtest::makeJob(jobParams(withPath("stdout")), &host));
+    surface->failWith = surface->owner->failWith = surface->owner->parent->failWith =
+        ZYRPublic::kZYRErrorTypeCheck;
+    EXPECT_EQ(fromSurface(surface), "no error");
+    EXPECT_EQ(host->calls, Calls{"whole Render/Render L0: ok"});
 
-TEST_F(CZYRTraceMsgTest, HostFailuresAreThrown) {
-    FakeProgress* host = nullptr;
+    // The host's errors are thrown; anything else it throws becomes the unknown error.
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(withPath("stdout")), &host));
     host->failWith = ZYRPublic::kZYRErrorTypeCheck;
-    expectError(
-        [&] { trace.beginTraceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, "x"); },
-        ZYRPublic::kZYRErrorTypeCheck);
-    EXPECT_THROW(trace.traceMsg("more"), CZYRError) << "the begun message is open";
+    const std::string failed = "14: host failed (fake:1)";
+    EXPECT_EQ(thrown([&] { trace.beginTraceMsg(render(), render(), kL0, "x"); }), failed);
+    EXPECT_EQ(thrown([&] { trace.traceMsg("more"); }), failed) << "the begun message is open";
+    EXPECT_EQ(thrown([&] { trace.endTraceMsg(); }), failed);
     host->failWith = ZYRPublic::kZYRErrorNoError;
+    trace.traceMsg("after");
+    EXPECT_EQ(host->calls, (Calls{"begin Render/Render L0: x", "text: more", "end"}))
+        << "a failed end still closes the message";
     host->throwForeign = true;
-    expectError([&] { trace.traceMsg(render(), render(), ZYRPublic::kZYRTraceMsgLevel0, kNoWide); },
-                ZYRPublic::kZYRErrorUnknown, "Unknown exception in CZYRTraceMsg::traceMsg",
-                kSource);
+    const char16_t* const noText = nullptr;
+    EXPECT_TRUE(startsWith(thrown([&] { trace.traceMsg(render(), render(), kL0, noText); }),
+                           "1: Unknown exception in CZYRTraceMsg::traceMsg "
+                           "(source/zyr/std/CZYRTraceMsg:"));
 }
 
 TEST_F(CZYRTraceMsgTest, CallbackWritesLevelFourTextsAndTakesTheLeakReport) {
@@ -392,19 +370,19 @@ TEST_F(CZYRTraceMsgTest, CallbackWritesLevelFourTextsAndTakesTheLeakReport) {
     sZYRTraceMsg msg{"four ", nullptr};
     sZYRTraceMsgDetail detail{4, nullptr, 0, nullptr, 0, 0};
     ZYRTraceMsgCallbackInternal(&msg, &detail, nullptr);
+    ZYRTraceMsgCallbackInternal(&msg, nullptr, nullptr);
     detail.level = 3;
     ZYRTraceMsgCallbackInternal(&msg, &detail, nullptr);
     ZYRTraceMsgCallbackInternal(nullptr, &detail, nullptr);
     detail.level = 4;
     sZYRTraceMsg wide{nullptr, u"\\\\a\\b|"};
     ZYRTraceMsgCallbackInternal(&wide, &detail, nullptr);
-    EXPECT_EQ(zyrtest::readFile(dir.file("t.log")), "four a/b|");
+    EXPECT_EQ(log(), "four a/b|");
 
     // The front's leak report: only its level-4 peak line reaches the log.
     zyrtest::installFront(1);
     ZYRStdInit_ZYRMemMgrDumpMemList(ZYRTraceMsgCallbackInternal, nullptr);
     zyrtest::installFront(0);
-    const std::string log = zyrtest::readFile(dir.file("t.log"));
-    EXPECT_NE(log.find("ZYRMem: Peak memory consumption: "), std::string::npos) << log;
-    EXPECT_EQ(log.find("Total Leaked"), std::string::npos) << log;
+    EXPECT_NE(log().find("ZYRMem: Peak memory consumption: "), std::string::npos) << log();
+    EXPECT_EQ(log().find("Total Leaked"), std::string::npos) << log();
 }

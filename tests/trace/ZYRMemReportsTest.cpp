@@ -1,13 +1,13 @@
 // Memory reports: the address-space map, the usage snapshots, their counters and the
-// surface step. The counters live for the process, so their first values are checked in
-// fresh processes (death-test children re-run this program).
+// surface step. The counters live for the process, so their first values are checked in a
+// fresh process (death-test children re-run this program).
 #include <gtest/gtest.h>
 
 #include <cstdlib>
 #include <cstring>
-#include <functional>
 
 #include "EngineFakes.h"
+#include "TestSupport.h"
 #include "zyr/std/trace/ZYRMemReports.h"
 
 using namespace ZYRStd;
@@ -21,6 +21,12 @@ struct HostTrace {
     CZYRTraceMsg trace;
     explicit HostTrace(uint32_t all) : trace(makeJob(all)) {}
 
+    std::string report(ReportMemoryUsageType type, const char* label = nullptr) {
+        const size_t before = host->calls.size();
+        ReportMemoryUsage(trace, type, label, ZYRPublic::kZYRTraceMsgLevel2);
+        return host->calls.size() == before ? "<none>" : host->lastText();
+    }
+
 private:
     C_SmartPtr<ZYRPublic::I_Job> makeJob(uint32_t all) {
         closeTraceLogPath();
@@ -33,21 +39,9 @@ private:
     }
 };
 
-std::string report(HostTrace& t, ReportMemoryUsageType type, const char* label = nullptr) {
-    const size_t before = t.host->calls.size();
-    ReportMemoryUsage(t.trace, type, label, ZYRPublic::kZYRTraceMsgLevel2);
-    return t.host->calls.size() == before ? "<none>" : t.host->calls.back().text;
-}
+using zyrtest::startsWith;
 
-bool startsWith(const std::string& s, const std::string& prefix) {
-    return s.compare(0, prefix.size(), prefix) == 0;
-}
-
-// Runs `check` in a fresh process; it prints what went wrong and returns false to fail.
-void inFreshProcess(const std::function<bool()>& check) {
-    EXPECT_EXIT(std::exit(check() ? 0 : 1), ::testing::ExitedWithCode(0), "");
-}
-
+// In the fresh process: reports what went wrong and fails.
 bool expectPrefix(const std::string& got, const std::string& prefix) {
     if (startsWith(got, prefix))
         return true;
@@ -55,104 +49,104 @@ bool expectPrefix(const std::string& got, const std::string& prefix) {
     return false;
 }
 
-} // namespace
-
-TEST(ZYRMemReportsTest, CountersStartAtTheirFirstValues) {
-    inFreshProcess([] {
-        ::unsetenv("ZYR_MEMORY_SURFACE_COUNT_STEP");
-        HostTrace t(2);
-        return expectPrefix(report(t, kReportMemoryUsageAfterJob),
-                            "After Job 0 Current Memory: ") &&
-               expectPrefix(report(t, kReportMemoryUsageAfterJob, "end"), "end After Job 1 ") &&
-               expectPrefix(report(t, kReportMemoryUsageAfterSurface),
-                            "After interpreting Surface 1 Current Memory: ") &&
-               expectPrefix(report(t, kReportMemoryUsageAfterSurface),
-                            "After interpreting Surface 2 ") &&
-               expectPrefix(report(t, kReportMemoryUsageAfterPlacedObject),
-                            "After interpreting PlacedObject 1 ") &&
-               expectPrefix(report(t, static_cast<ReportMemoryUsageType>(0)), "Current Memory: ");
-    });
+bool countersFromTheirFirstValues() {
+    ::setenv("ZYR_MEMORY_SURFACE_COUNT_STEP", "2", 1);
+    HostTrace t(2);
+    const auto surface = kReportMemoryUsageAfterSurface;
+    const bool ok =
+        expectPrefix(t.report(kReportMemoryUsageAfterJob), "After Job 0 Current Memory: ") &&
+        expectPrefix(t.report(kReportMemoryUsageAfterJob, "end"), "end After Job 1 ") &&
+        expectPrefix(t.report(surface), "<none>") &&
+        expectPrefix(t.report(surface), "After interpreting Surface 2 Current Memory: ") &&
+        expectPrefix(t.report(kReportMemoryUsageAfterPlacedObject),
+                     "After interpreting PlacedObject 1 ") &&
+        expectPrefix(t.report(kReportMemoryUsageAfterPlacedObject),
+                     "After interpreting PlacedObject 2 ") &&
+        expectPrefix(t.report(static_cast<ReportMemoryUsageType>(0)), "Current Memory: ");
+    // The step was read once: changing it later has no effect.
+    ::setenv("ZYR_MEMORY_SURFACE_COUNT_STEP", "1", 1);
+    return ok && expectPrefix(t.report(surface), "<none>") &&
+           expectPrefix(t.report(surface), "After interpreting Surface 4 ");
 }
 
-TEST(ZYRMemReportsTest, SurfaceStepReportsEveryNthSurface) {
-    inFreshProcess([] {
-        ::setenv("ZYR_MEMORY_SURFACE_COUNT_STEP", "10", 1);
-        HostTrace t(2);
-        for (int i = 1; i < 10; ++i)
-            if (report(t, kReportMemoryUsageAfterSurface) != "<none>")
-                return expectPrefix("surface " + std::to_string(i), "<none>");
-        if (!expectPrefix(report(t, kReportMemoryUsageAfterSurface),
-                          "After interpreting Surface 10 "))
-            return false;
-        // The step was read once: changing it later has no effect.
-        ::setenv("ZYR_MEMORY_SURFACE_COUNT_STEP", "1", 1);
-        return report(t, kReportMemoryUsageAfterSurface) == "<none>";
-    });
+} // namespace
+
+TEST(ZYRMemReportsTest, CountersAndSurfaceStepInAFreshProcess) {
+    EXPECT_EXIT(std::exit(countersFromTheirFirstValues() ? 0 : 1), ::testing::ExitedWithCode(0),
+                "");
 }
 
 TEST(ZYRMemReportsTest, UsageReportLevelsAndLayout) {
-    {
-        HostTrace quiet(1);
-        EXPECT_EQ(report(quiet, static_cast<ReportMemoryUsageType>(9)), "<none>")
-            << "configured level 1 stops level 2";
-    }
+    EXPECT_EQ(HostTrace(1).report(static_cast<ReportMemoryUsageType>(9)), "<none>")
+        << "configured level 1 stops level 2";
     HostTrace brief(3);
-    const std::string one = report(brief, static_cast<ReportMemoryUsageType>(9), "L");
-    EXPECT_TRUE(startsWith(one, "L Current Memory: ")) << one;
-    for (const char* part : {" bytes TUMA(All): ", " bytes TUMA(Interp): ", " bytes JOV(All): ",
-                             " bytes JOV(Interp): "})
-        EXPECT_NE(one.find(part), std::string::npos) << part;
-    EXPECT_EQ(one.back(), '\n');
+    const std::string one = brief.report(static_cast<ReportMemoryUsageType>(9), "L");
+    unsigned long long current = 0, tuma = 0, tumaInterp = 0, jov = 0, jovInterp = 0;
+    EXPECT_EQ(std::sscanf(one.c_str(),
+                          "L Current Memory: %llu bytes TUMA(All): %llu bytes TUMA(Interp): %llu "
+                          "bytes JOV(All): %llu bytes JOV(Interp): %llu bytes\n",
+                          &current, &tuma, &tumaInterp, &jov, &jovInterp),
+              5)
+        << one;
+    EXPECT_GT(current, 0u);
     EXPECT_EQ(one.find('\n'), one.size() - 1) << "no process figures below level 4";
-    EXPECT_EQ(brief.host->calls.back().area, "Memory");
-    EXPECT_EQ(brief.host->calls.back().category, "General");
-    EXPECT_EQ(brief.host->calls.back().level, 2);
+    EXPECT_TRUE(startsWith(brief.host->calls.back(), "whole Memory/General L2: L Current "));
 
     HostTrace detailed(4);
-    const std::string four = report(detailed, static_cast<ReportMemoryUsageType>(9));
-    EXPECT_NE(four.find("\nCommit: "), std::string::npos) << four;
-    EXPECT_NE(four.find(" WorkingSet: "), std::string::npos);
-    EXPECT_NE(four.find("\nTotalVir "), std::string::npos);
-    EXPECT_NE(four.find(" AvailPhy "), std::string::npos);
-    EXPECT_NE(four.find("\nHandleCount: "), std::string::npos);
-    EXPECT_NE(four.find(" Other: 0\n"), std::string::npos) << four;
+    const std::string four = detailed.report(static_cast<ReportMemoryUsageType>(9));
+    const size_t figures = four.find("\nCommit: ");
+    ASSERT_NE(figures, std::string::npos) << four;
+    unsigned long long commit = 0, set = 0, file = 0, faults = 0, total = 0, availVir = 0,
+                       availPhy = 0, handles = 0, read = 0, written = 0;
+    EXPECT_EQ(std::sscanf(four.c_str() + figures,
+                          "\nCommit: %llu WorkingSet: %llu PageFile: %llu PageFault: %llu\n"
+                          "TotalVir %llu AvailVir %llu AvailPhy %llu\n"
+                          "HandleCount: %llu Read: %llu Write: %llu Other: 0\n",
+                          &commit, &set, &file, &faults, &total, &availVir, &availPhy, &handles,
+                          &read, &written),
+              10)
+        << four;
+    EXPECT_TRUE(commit > 0 && commit == file && set > 0 && faults > 0) << four;
+    EXPECT_TRUE(total > availVir && availPhy > 0) << four;
+    EXPECT_GE(handles, 3u) << "at least the three standard streams";
+    EXPECT_GT(read, 0u);
+    EXPECT_EQ(four.substr(four.size() - 10), " Other: 0\n");
 }
 
 TEST(ZYRMemReportsTest, AddressSpaceMap) {
-    {
-        HostTrace low(3);
-        DumpVMStatistics(low.trace);
-        EXPECT_TRUE(low.host->calls.empty());
-    }
+    HostTrace low(3);
+    DumpVMStatistics(low.trace);
+    EXPECT_TRUE(low.host->calls.empty());
     HostTrace totals(4);
     DumpVMStatistics(totals.trace);
-    ASSERT_EQ(totals.host->calls.size(), 5u);
-    EXPECT_EQ(totals.host->calls[0].kind, "begin");
-    EXPECT_EQ(totals.host->calls[0].text, "Virtual Memory Statistics");
-    EXPECT_EQ(totals.host->calls[0].level, 4);
-    EXPECT_TRUE(startsWith(totals.host->calls[1].text, "Totals: Commit "));
-    EXPECT_TRUE(startsWith(totals.host->calls[2].text, "Free block: Largest: "));
-    EXPECT_TRUE(startsWith(totals.host->calls[3].text, "Working Set: Peak "));
-    EXPECT_EQ(totals.host->calls[4].kind, "end");
+    const auto& four = totals.host->calls;
+    ASSERT_EQ(four.size(), 5u);
+    EXPECT_EQ(four[0], "begin Memory/Performance L4: Virtual Memory Statistics");
+    EXPECT_TRUE(startsWith(four[1], "text: Totals: Commit "));
+    EXPECT_EQ(four[4], "end");
 
     HostTrace full(5);
     DumpVMStatistics(full.trace);
-    const auto& calls = full.host->calls;
+    std::vector<std::string> calls; // the texts of the message's parts
+    for (const std::string& call : full.host->calls)
+        calls.push_back(call.substr(call.find(": ") + 2));
     ASSERT_GT(calls.size(), 6u);
-    EXPECT_EQ(calls[1].text, "Address\tState\tType\tProtect\tSize\tBase");
+    EXPECT_EQ(calls[1], "Address\tState\tType\tProtect\tSize\tBase");
     // Regions follow one another without gaps up to the top of user space.
-    unsigned long long expected = 0;
+    unsigned long long expected = 0, free = 0, committed = 0;
     bool sawImage = false, sawFree = false, sawPrivate = false;
     size_t i = 2;
-    for (; i < calls.size() && startsWith(calls[i].text, "0x"); ++i) {
-        const std::string& line = calls[i].text;
+    for (; i < calls.size() && startsWith(calls[i], "0x"); ++i) {
+        const std::string& line = calls[i];
         ASSERT_EQ(line.find('\n'), std::string::npos);
-        ASSERT_EQ(line.size() > 18 && line[18] == '\t', true) << line;
+        ASSERT_TRUE(line.size() > 18 && line[18] == '\t') << line;
         const unsigned long long base = std::strtoull(line.c_str() + 2, nullptr, 16);
         EXPECT_EQ(base, expected) << line;
         const size_t sizeAt = line.rfind('\t', line.rfind('\t') - 1) + 1;
-        expected = base + std::strtoull(line.c_str() + sizeAt, nullptr, 10);
-        EXPECT_EQ(line.substr(line.rfind('\t') + 1, 2), "0x");
+        const unsigned long long size = std::strtoull(line.c_str() + sizeAt, nullptr, 10);
+        expected = base + size;
+        EXPECT_EQ(std::strtoull(line.c_str() + line.rfind('\t') + 1, nullptr, 16), base) << line;
+        (line.find("\tFREE\t\t\t") != std::string::npos ? free : committed) += size;
         sawImage |= line.find("\tCOMMIT\tIMAGE\tEXECUTE_READ\t") != std::string::npos;
         sawFree |= line.find("\tFREE\t\t\t") != std::string::npos;
         sawPrivate |= line.find("\tCOMMIT\tPRIV\tREADWRITE\t") != std::string::npos;
@@ -160,13 +154,26 @@ TEST(ZYRMemReportsTest, AddressSpaceMap) {
     EXPECT_EQ(expected, 0x00007FFFFFFFF000ull);
     EXPECT_TRUE(sawImage && sawFree && sawPrivate);
     ASSERT_EQ(calls.size(), i + 4);
-    EXPECT_TRUE(startsWith(calls[i].text, "Totals: Commit "));
+    unsigned long long commit = 0, image = 0, mapped = 0, priv = 0, reserved = 0;
+    ASSERT_EQ(std::sscanf(calls[i].c_str(),
+                          "Totals: Commit %llu (Image %llu Mapped %llu Private %llu) Reserved %llu",
+                          &commit, &image, &mapped, &priv, &reserved),
+              5);
+    EXPECT_EQ(commit, image + mapped + priv);
+    EXPECT_EQ(commit + reserved, committed) << "every region not free is committed or reserved";
     unsigned long long largest = 0, big = 0, middle = 0, small = 0, units = 0;
-    ASSERT_EQ(std::sscanf(calls[i + 1].text.c_str(),
+    ASSERT_EQ(std::sscanf(calls[i + 1].c_str(),
                           "Free block: Largest: %llu #blks >=8MB: %llu >=4MB: %llu <4MB: %llu "
                           "#8MB %llu",
                           &largest, &big, &middle, &small, &units),
               5);
     EXPECT_GE(big, 1u);
     EXPECT_GE(units, largest / 8388608);
+    EXPECT_LE(units * 8388608, free);
+    unsigned long long peak = 0, current = 0, peakFile = 0, faults = 0;
+    ASSERT_EQ(std::sscanf(calls[i + 2].c_str(),
+                          "Working Set: Peak %llu Current %llu Peak Pagefile %llu PageFault %llu",
+                          &peak, &current, &peakFile, &faults),
+              4);
+    EXPECT_TRUE(peak >= current && current > 0 && peakFile >= peak && faults > 0);
 }
