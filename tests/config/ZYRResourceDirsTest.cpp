@@ -7,22 +7,18 @@
 
 #include "TestSupport.h"
 #include "zyr/std/config/ZYRResourceDirs.h"
-#include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/values/CZYRDict.h"
 #include "zyr/std/values/CZYRString.h"
 
 using namespace ZYRStd;
+using Texts = std::vector<std::u16string>;
 
 namespace {
 
-const std::u16string kNull = u"<null>";
-
 std::u16string text(const unsigned short* path) {
-    if (!path)
-        return kNull;
-    std::u16string out;
-    for (; *path; ++path)
+    std::u16string out = path ? u"" : u"<null>";
+    for (; path && *path; ++path)
         out += static_cast<char16_t>(*path);
     return out;
 }
@@ -33,11 +29,9 @@ std::u16string text(const CZYRUniString& s) {
 }
 
 // The first `count` entries as texts; frees the list and its entries.
-std::vector<std::u16string> takeList(unsigned short** list, unsigned int count) {
-    std::vector<std::u16string> out;
-    if (!list)
-        return out;
-    for (unsigned int i = 0; i < count; ++i) {
+Texts take(unsigned short** list, unsigned int count) {
+    Texts out;
+    for (unsigned int i = 0; list && i < count; ++i) {
         out.push_back(text(list[i]));
         ZYRFree(list[i]);
     }
@@ -45,10 +39,25 @@ std::vector<std::u16string> takeList(unsigned short** list, unsigned int count) 
     return out;
 }
 
-std::u16string takeText(unsigned short* path) {
+std::u16string take(unsigned short* path) {
     std::u16string out = text(path);
     ZYRFree(path);
     return out;
+}
+
+// Through the first form: the list (with `count` as it grew from `start`) and the cache file.
+struct Listed {
+    Texts dirs;
+    std::u16string cacheFile;
+    unsigned int count;
+};
+Listed list(const CZYRDict& options, unsigned int start = 0) {
+    unsigned short** dirs = nullptr;
+    unsigned short* cacheFile = nullptr;
+    unsigned int count = start;
+    ZYRSetDirListAndCacheFileList(options, dirs, cacheFile, count);
+    EXPECT_EQ(ZYRMemSize(dirs), (count - start) * sizeof(unsigned short*)) << "n + 3 slots";
+    return {take(dirs, count - start), take(cacheFile), count};
 }
 
 CZYRDict withReferences() {
@@ -63,10 +72,14 @@ CZYRDict withReferences() {
     return options;
 }
 
-const std::vector<std::u16string> kRelative = {u"ZYRFonts/TUMA/10.0/CMaps",
-                                               u"ZYRFonts/Fonts/Reqrd/CMaps", u"ZYRFonts/Fonts"};
-const std::vector<std::u16string> kUnderR = {u"C:/R/TUMA/10.0/CMaps", u"C:/R/Fonts/Reqrd/CMaps",
-                                             u"C:/R/Fonts"};
+const Texts kRelative = {u"ZYRFonts/TUMA/10.0/CMaps", u"ZYRFonts/Fonts/Reqrd/CMaps",
+                         u"ZYRFonts/Fonts"};
+const Texts kUnderR = {u"C:/R/TUMA/10.0/CMaps", u"C:/R/Fonts/Reqrd/CMaps", u"C:/R/Fonts"};
+
+std::u16string numbered(int n) {
+    const std::string digits = std::to_string(n);
+    return u"/cache/OrmunFnt14_VELT_" + std::u16string(digits.begin(), digits.end()) + u".lst";
+}
 
 } // namespace
 
@@ -74,77 +87,53 @@ const std::vector<std::u16string> kUnderR = {u"C:/R/TUMA/10.0/CMaps", u"C:/R/Fon
 TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     EXPECT_FALSE(ZYRFontCacheDirExist());
     EXPECT_EQ(text(ZYRGetFontCacheDir()), u"");
-
     // Without fonts and cache directories: the relative directories, no cache file.
-    unsigned short** list = nullptr;
-    auto* const untouched = reinterpret_cast<unsigned short*>(0x1);
-    unsigned short* cacheFile = untouched;
-    unsigned int count = 5;
-    ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
-    EXPECT_EQ(count, 8u) << "count grows by the entries stored";
-    EXPECT_EQ(cacheFile, untouched);
-    EXPECT_EQ(ZYRMemSize(list), 3 * sizeof(unsigned short*));
-    EXPECT_EQ(takeList(list, 3), kRelative) << "entries start at dirList[0]";
-
+    const Listed plain = list(CZYRDict(), 5);
+    EXPECT_EQ(plain.count, 8u) << "count grows by the entries stored";
+    EXPECT_EQ(plain.dirs, kRelative) << "entries start at dirList[0]";
+    EXPECT_EQ(plain.cacheFile, u"<null>");
     ZYRSetZYRFontsDir(u"C:/R/");
-    count = 0;
-    ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
-    ASSERT_EQ(count, 3u);
-    EXPECT_EQ(takeList(list, count), kUnderR);
+    EXPECT_EQ(list(CZYRDict()).dirs, kUnderR);
 
     // Reference directories: paths and file URLs, a null slot for a non-string, and what
-    // the URL conversion makes of an empty text (an empty path); n + 3 slots.
+    // the URL conversion makes of an empty text (an empty path).
     ZYRSetFontCacheDir(u"/cache");
     EXPECT_TRUE(ZYRFontCacheDirExist());
     EXPECT_EQ(text(ZYRGetFontCacheDir()), u"/cache");
-    count = 0;
-    ZYRSetDirListAndCacheFileList(withReferences(), list, cacheFile, count);
-    ASSERT_EQ(count, 8u);
-    EXPECT_EQ(ZYRMemSize(list), 8 * sizeof(unsigned short*));
-    std::vector<std::u16string> expected = kUnderR;
-    expected.insert(expected.end(), {u"/usr/share/fonts", kNull, u"/tmp/a b", u"", u"C:/Fonts"});
-    EXPECT_EQ(takeList(list, count), expected);
-    // The numbering is process-wide, and other tests may have drawn names already: the
-    // first names of a process are checked in a fresh one below.
-    const std::u16string first = takeText(cacheFile);
-    ASSERT_EQ(first.rfind(u"/cache/OrmunFnt14_VELT_", 0), 0u);
-    const int firstNumber = std::stoi(std::string(first.begin() + 23, first.end() - 4));
-    EXPECT_GE(firstNumber, 1001);
-    auto nthName = [&](int n) {
-        const std::string digits = std::to_string(firstNumber + n);
-        return u"/cache/OrmunFnt14_VELT_" + std::u16string(digits.begin(), digits.end()) + u".lst";
-    };
-    count = 0;
-    ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
-    takeList(list, count);
-    EXPECT_EQ(takeText(cacheFile), nthName(1));
-
+    Texts expected = kUnderR;
+    expected.insert(expected.end(),
+                    {u"/usr/share/fonts", u"<null>", u"/tmp/a b", u"", u"C:/Fonts"});
+    const Listed references = list(withReferences());
+    EXPECT_EQ(references.dirs, expected);
+    // The numbering is process-wide and other tests may have drawn names already: the first
+    // names of a process are checked in a fresh one below.
+    ASSERT_TRUE(
+        zyrtest::startsWith(std::string(references.cacheFile.begin(), references.cacheFile.end()),
+                            "/cache/OrmunFnt14_VELT_"));
+    const int first =
+        std::stoi(std::string(references.cacheFile.begin() + 23, references.cacheFile.end() - 4));
+    EXPECT_EQ(references.cacheFile, numbered(first));
+    EXPECT_EQ(list(CZYRDict()).cacheFile, numbered(first + 1));
     EXPECT_EQ(text(ZYRGetSystemCacheFile()), u"/cache/OrmunFnt14_sys.lst");
     EXPECT_EQ(text(ZYRGetCommonCacheFile()), u"/cache/OrmunFnt14_com.lst");
     EXPECT_EQ(text(ZYRGetCmapCacheFile()), u"/cache/OrmunFnt14_Cmap.lst");
 
     // The interface form: the count as its result, and four list names.
+    unsigned short** dirs = nullptr;
     unsigned short** names = nullptr;
-    const C_SmartPtr<I_Dict> options = withReferences();
-    ASSERT_EQ(ZYRSetDirListAndCacheFileList(options, list, names), 8);
-    EXPECT_EQ(takeList(list, 8), expected);
-    ASSERT_NE(names, nullptr);
-    EXPECT_EQ(names[4], nullptr);
-    EXPECT_EQ(
-        takeList(names, 4),
-        (std::vector<std::u16string>{nthName(2), u"/cache/OrmunFnt14_sys.lst",
+    ASSERT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(withReferences()), dirs, names), 8);
+    EXPECT_EQ(take(dirs, 8), expected);
+    ASSERT_TRUE(names && !names[4]);
+    EXPECT_EQ(take(names, 4), (Texts{numbered(first + 2), u"/cache/OrmunFnt14_sys.lst",
                                      u"/cache/OrmunFnt14_com.lst", u"/cache/OrmunFnt14_Cmap.lst"}));
-    ASSERT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(), list, names), 3);
-    takeList(list, 3);
-    takeList(names, 4);
 
     // Null or empty texts unset the directories again.
     ZYRSetZYRFontsDir(u"");
     ZYRSetFontCacheDir(nullptr);
     EXPECT_FALSE(ZYRFontCacheDirExist());
     names = nullptr;
-    ASSERT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(), list, names), 3);
-    EXPECT_EQ(takeList(list, 3), kRelative);
+    ASSERT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(), dirs, names), 3);
+    EXPECT_EQ(take(dirs, 3), kRelative);
     EXPECT_EQ(names, nullptr) << "no cache directory, no names";
 
     // The ICC directory is the caller's text; the temporary directory is a copy.
@@ -161,17 +150,8 @@ TEST(ZYRResourceDirsTest, FirstCacheNamesOfAProcessAre1001And1002) {
     EXPECT_EXIT(
         {
             ZYRSetFontCacheDir(u"/cache");
-            unsigned short** list = nullptr;
-            unsigned short* cacheFile = nullptr;
-            unsigned int count = 0;
-            ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
-            takeList(list, count);
-            const bool first = takeText(cacheFile) == u"/cache/OrmunFnt14_VELT_1001.lst";
-            count = 0;
-            ZYRSetDirListAndCacheFileList(CZYRDict(), list, cacheFile, count);
-            takeList(list, count);
-            const bool second = takeText(cacheFile) == u"/cache/OrmunFnt14_VELT_1002.lst";
-            std::exit(first && second ? 0 : 1);
+            const bool first = list(CZYRDict()).cacheFile == numbered(1001);
+            std::exit(first && list(CZYRDict()).cacheFile == numbered(1002) ? 0 : 1);
         },
         ::testing::ExitedWithCode(0), "");
 }
@@ -186,21 +166,23 @@ TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
     ZYRSetFontCacheDir(u"/cache");
     {
         const CZYRDict options = withReferences();
+        unsigned int own = 0;
         const auto run = [&] {
-            unsigned short** list = nullptr;
+            unsigned short** dirs = nullptr;
             unsigned short* cacheFile = nullptr;
             unsigned int count = 0;
-            try {
-                ZYRSetDirListAndCacheFileList(options, list, cacheFile, count);
-            } catch (const CZYRError& e) {
-                EXPECT_EQ(list, nullptr) << "a failed call hands nothing out";
-                EXPECT_EQ(cacheFile, nullptr);
-                EXPECT_EQ(count, 0u);
-                return false;
+            const std::string error = zyrtest::thrown(
+                [&] { ZYRSetDirListAndCacheFileList(options, dirs, cacheFile, count); });
+            if (error != "no error") {
+                // Ours, or the error of an allocation it asked for.
+                EXPECT_TRUE(zyrtest::startsWith(error, "7: ")) << error;
+                own += error == "7: ZYRSetDirListAndCacheFileList out of memory "
+                                "(source/zyr/std/ZYRStartupOptions:970)";
+                EXPECT_TRUE(!dirs && !cacheFile && count == 0) << "a failed call hands nothing out";
             }
-            takeList(list, count);
+            take(dirs, count);
             ZYRFree(cacheFile);
-            return true;
+            return error == "no error";
         };
         run();
         const unsigned long long baseline = GetMemUsage();
@@ -216,24 +198,21 @@ TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
             host.failAt = 0;
             ASSERT_EQ(GetMemUsage(), baseline) << "allocation " << failing << " failed";
         }
-        EXPECT_GT(failures, 0u);
+        EXPECT_GT(own, 0u);
+        EXPECT_GT(failures, own);
 
         // The interface form reports the same failures as -1.
         const C_SmartPtr<I_Dict> dict = options;
         for (unsigned int failing = 1; failing <= calls + 6; ++failing) {
-            unsigned short** list = nullptr;
+            unsigned short** dirs = nullptr;
             unsigned short** names = nullptr;
             host.calls = 0;
             host.failAt = failing;
-            const int32_t stored = ZYRSetDirListAndCacheFileList(dict, list, names);
+            const int32_t stored = ZYRSetDirListAndCacheFileList(dict, dirs, names);
             host.failAt = 0;
-            if (stored < 0) {
-                EXPECT_EQ(list, nullptr);
-                EXPECT_EQ(names, nullptr);
-            } else {
-                takeList(list, static_cast<unsigned int>(stored));
-                takeList(names, 4);
-            }
+            EXPECT_TRUE(stored >= 0 || (!dirs && !names)) << "allocation " << failing;
+            take(dirs, stored < 0 ? 0 : static_cast<unsigned int>(stored));
+            take(names, names ? 4 : 0);
             ASSERT_EQ(GetMemUsage(), baseline) << "allocation " << failing << " failed";
         }
     }
