@@ -1,14 +1,21 @@
-// Tests of the memory stream and the stream wrappers.
+// Tests of the memory stream, the stream wrappers, and the ASCII85 and ASCIIHex encoders and
+// decoders over memory streams.
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <memory>
+#include <random>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include "TestSupport.h"
 #include "ZYRHostKit.h"
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/io/CZYRBaseStream.h"
 #include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/io/CZYRStreamsFilterASCII85.h"
+#include "zyr/std/io/CZYRStreamsFilterASCIIHEX.h"
 #include "zyr/std/io/IImpZYRMemStream.h"
 
 namespace {
@@ -17,6 +24,11 @@ using namespace ZYRStreams;
 using ZYRFileSys::IImpZYRMemStream;
 using ZYRStd::CZYRError;
 using ZYRStd::CZYRSmartZYRRefPtr;
+using ZYRStd::CZYRStreamFilterASCII85;
+using ZYRStd::CZYRStreamFilterASCII85Decode;
+using ZYRStd::CZYRStreamFilterASCIIHEX;
+using ZYRStd::CZYRStreamFilterASCIIHEXDecode;
+using namespace std::string_literals;
 
 // Runs `body`, which must raise a CZYRError of `type` with `message`.
 template <class Body>
@@ -41,122 +53,95 @@ CZYRSmartZYRRefPtr<IImpZYRMemStream> memStream(unsigned int mode, unsigned int c
     return CZYRSmartZYRRefPtr<IImpZYRMemStream>(new IImpZYRMemStream(mode, capacity, buffer));
 }
 
+const char* const kPastEnd = "write past end of stream";
+
 TEST(ZYRStreamsTest, MemoryStreamReadsAndWritesWithinCapacity) {
     auto s = memStream(kZYRStreamRead | kZYRStreamWrite, 8);
-    EXPECT_EQ(s->getCapacity(), 8u);
-    EXPECT_EQ(s->getEOF(), 0u);
     EXPECT_EQ(s->write("abcdef", 2, 3), 6u) << "a byte count, not an item count";
     EXPECT_EQ(s->getPos(), 6u);
-    EXPECT_EQ(s->getEOF(), 6u);
     EXPECT_EQ(s->getSize(), 6u);
-
-    expectError([&] { s->write("xyz", 1, 3); }, ZYRPublic::kZYRErrorInvalidData,
-                "write past end of stream");
+    expectError([&] { s->write("xyz", 1, 3); }, ZYRPublic::kZYRErrorInvalidData, kPastEnd);
     EXPECT_EQ(s->getPos(), 6u) << "a failed write changes nothing";
     EXPECT_EQ(s->getEOF(), 6u);
+    EXPECT_EQ(s->write("gh", 1, 2), 2u) << "up to the capacity exactly";
 
     EXPECT_EQ(s->setPos(2), 2u);
     char out[8] = {};
-    EXPECT_EQ(s->read(out, 2, 3), 4u) << "up to the EOF, counted in bytes";
-    EXPECT_EQ(std::string(out, 4), "cdef");
+    EXPECT_EQ(s->read(out, 2, 3), 6u) << "up to the EOF, counted in bytes";
+    EXPECT_EQ(std::string(out, 6), "cdefgh");
     EXPECT_EQ(s->read(out, 1, 1), 0u);
-
     s->setPos(1);
     EXPECT_EQ(s->write("Z", 1, 1), 1u);
-    EXPECT_EQ(s->getEOF(), 6u) << "writing inside the data keeps the EOF";
+    EXPECT_EQ(s->getEOF(), 8u) << "writing inside the data keeps the EOF";
     s->setPos(0);
-    EXPECT_EQ(s->read(out, 1, 8), 6u);
-    EXPECT_EQ(std::string(out, 6), "aZcdef");
+    EXPECT_EQ(s->read(out, 1, 8), 8u);
+    EXPECT_EQ(std::string(out, 8), "aZcdefgh");
     s->setPos(0);
     s->setEOF();
-    EXPECT_EQ(s->getPos(), 6u);
+    EXPECT_EQ(s->getPos(), 8u);
 
     // The 32-bit product and sum of a huge write must not slip past the capacity check.
     s->setPos(4);
     expectError([&] { s->write("", 0x10000, 0x10000 - 1); }, ZYRPublic::kZYRErrorInvalidData,
-                "write past end of stream");
-}
-
-TEST(ZYRStreamsTest, MemoryStreamPositionAndCapacityLimits) {
-    auto s = memStream(kZYRStreamRead | kZYRStreamWrite, 10);
-    s->write("abc", 1, 3);
-    EXPECT_EQ(s->setPos(10), 10u) << "the capacity, not the EOF, is the limit";
-    expectError([&] { s->setPos(11); }, ZYRPublic::kZYRErrorLimitCheck,
+                kPastEnd);
+    EXPECT_EQ(s->setPos(8), 8u) << "the capacity, not the EOF, is the limit";
+    expectError([&] { s->setPos(9); }, ZYRPublic::kZYRErrorLimitCheck,
                 "Attempt to setPos beyond Mem Stream size");
-    EXPECT_EQ(s->getPos(), 10u);
-    char out[4];
-    expectError([&] { s->read(out, 1, 1); }, ZYRPublic::kZYRErrorInvalidData,
-                "attempt to read negative bytes");
 
+    auto gap = memStream(kZYRStreamRead | kZYRStreamWrite, 10);
+    gap->setPos(3);
+    expectError([&] { gap->read(out, 1, 1); }, ZYRPublic::kZYRErrorInvalidData,
+                "attempt to read negative bytes");
     auto none = memStream(kZYRStreamRead | kZYRStreamWrite, 0);
     EXPECT_EQ(none->write("", 1, 0), 0u);
-    expectError([&] { none->write("a", 1, 1); }, ZYRPublic::kZYRErrorInvalidData,
-                "write past end of stream");
+    expectError([&] { none->write("a", 1, 1); }, ZYRPublic::kZYRErrorInvalidData, kPastEnd);
     EXPECT_EQ(none->read(out, 1, 1), 0u);
 }
 
-TEST(ZYRStreamsTest, MemoryStreamOverCallerBuffer) {
+TEST(ZYRStreamsTest, MemoryStreamModesOverCallerBuffer) {
     char bytes[10];
     std::memcpy(bytes, "0123456789", 10);
     auto reader = memStream(kZYRStreamRead, sizeof bytes, bytes);
-    EXPECT_EQ(reader->getEOF(), 10u);
-    EXPECT_EQ(reader->getSize(), 10u);
     char out[12] = {};
-    EXPECT_EQ(reader->read(out, 3, 4), 10u);
+    EXPECT_EQ(reader->read(out, 3, 4), 10u) << "a readable buffer is all content";
     EXPECT_EQ(std::string(out, 10), "0123456789");
-    EXPECT_EQ(reader->read(out, 3, 4), 0u);
     expectError([&] { reader->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
                 "stream is not writable");
-
-    auto truncated = memStream(kZYRStreamRead | kZYRStreamTruncate, sizeof bytes, bytes);
-    EXPECT_EQ(truncated->getEOF(), 0u);
-    EXPECT_EQ(truncated->read(out, 1, 4), 0u);
-
+    EXPECT_EQ(memStream(kZYRStreamRead | kZYRStreamTruncate, 10, bytes)->getEOF(), 0u);
     auto appender = memStream(kZYRStreamRead | kZYRStreamAppend, sizeof bytes, bytes);
     EXPECT_EQ(appender->getPos(), 10u);
-    expectError([&] { appender->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidData,
-                "write past end of stream");
+    expectError([&] { appender->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidData, kPastEnd);
 
     // Writes go into the caller's bytes, and the caller's buffer outlives the stream.
     auto writer = memStream(kZYRStreamWrite, sizeof bytes, bytes);
     EXPECT_EQ(writer->getEOF(), 0u);
     writer->write("ab", 1, 2);
-    writer.reset();
-    EXPECT_EQ(std::string(bytes, 3), "ab2");
-}
-
-TEST(ZYRStreamsTest, MemoryStreamAccessChecksAndErrorReporting) {
-    auto writeOnly = memStream(kZYRStreamWrite, 4);
-    char out[4];
-    expectError([&] { writeOnly->read(out, 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+    expectError([&] { writer->read(out, 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
                 "stream is not readable");
     ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(writeOnly->read(out, 1, 1, err), 0u);
+    EXPECT_EQ(writer->read(out, 1, 1, err), 0u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidFuncCall);
-
     err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(writeOnly->write("abcde", 1, 5, err), 0u);
+    EXPECT_EQ(writer->write("abcdefghijk", 1, 11, err), 0u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidData);
     err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(writeOnly->write("ab", 1, 2, err), 2u);
+    EXPECT_EQ(writer->write("c", 1, 1, err), 1u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorNoError) << "success leaves the status alone";
+    writer.reset();
+    EXPECT_EQ(std::string(bytes, 4), "abc3");
+    EXPECT_EQ(memStream(kZYRStreamAppend, 4)->write("a", 1, 1), 1u) << "append implies writing";
 
-    auto appendOnly = memStream(kZYRStreamAppend, 4);
-    EXPECT_EQ(appendOnly->write("a", 1, 1), 1u) << "append implies writing";
-}
-
-TEST(ZYRStreamsTest, MemoryStreamReOpen) {
+    // reOpen: without append the content goes; append keeps it and starts at its end.
     auto s = memStream(kZYRStreamRead | kZYRStreamWrite, 8);
     s->write("hello", 1, 5);
     s->reOpen(kZYRStreamRead);
-    EXPECT_EQ(s->getEOF(), 0u) << "without append the content goes";
+    EXPECT_EQ(s->getEOF(), 0u);
     EXPECT_EQ(s->getPos(), 0u);
     EXPECT_EQ(s->getAccessMode(), kZYRStreamRead);
-
     s->reOpen(kZYRStreamWrite);
     s->write("hello", 1, 5);
     s->reOpen(kZYRStreamRead | kZYRStreamAppend);
-    EXPECT_EQ(s->getEOF(), 5u) << "append keeps the data";
+    EXPECT_EQ(s->getEOF(), 5u);
     EXPECT_EQ(s->getPos(), 5u);
     s->reOpen(kZYRStreamAppend | kZYRStreamTruncate);
     EXPECT_EQ(s->getEOF(), 0u);
@@ -175,47 +160,26 @@ TEST(ZYRStreamsTest, MemoryStreamAllocationFailure) {
 
 // ---- wrappers ------------------------------------------------------------------------------
 
-TEST(ZYRStreamsTest, WrappersNeedAFileSystem) {
+TEST(ZYRStreamsTest, WrappersForwardAndCount) {
     ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
     expectError([] { ZYRStd::CZYRBaseStream s(kZYRStreamWrite, 16, nullptr); },
                 ZYRPublic::kZYRErrorFileSystemNotInitialized,
                 "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method",
                 "source/zyr/std/CZYRFileSys");
-}
+    static ZYRFileSys::IZYRFileSys* installed = nullptr;
+    const std::unique_ptr<ZYRFileSys::IZYRFileSys> fileSys(ZYRFileSys::createDefaultFileSystem(
+        ZYRStd::CZYRUniString(), ZYRStd::CZYRUniString(), nullptr));
+    installed = fileSys.get();
+    ZYRStd::ZYRStdInit_SetDefaultFileSysProc([] { return installed; });
+    ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
+    ZYRStd::ZYRStdInit_SetZYRFactoryProc(ZYRHostKit::posixFileNameFactory);
 
-class StreamWrapperTest : public ::testing::Test {
-protected:
-    void SetUp() override {
-        fileSys_ = ZYRFileSys::createDefaultFileSystem(ZYRStd::CZYRUniString(),
-                                                       ZYRStd::CZYRUniString(), nullptr);
-        ASSERT_NE(fileSys_, nullptr);
-        installed_ = fileSys_;
-        ZYRStd::ZYRStdInit_SetDefaultFileSysProc([] { return installed_; });
-        ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
-        ZYRStd::ZYRStdInit_SetZYRFactoryProc(ZYRHostKit::posixFileNameFactory);
-    }
-    void TearDown() override {
-        ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
-        ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
-        installed_ = nullptr;
-        delete fileSys_;
-    }
-
-    static inline ZYRFileSys::IZYRFileSys* installed_ = nullptr;
-    ZYRFileSys::IZYRFileSys* fileSys_ = nullptr;
-    zyrtest::TempDir dir_;
-};
-
-TEST_F(StreamWrapperTest, BaseStreamForwardsAndCounts) {
     ZYRStd::CZYRBaseStream empty;
-    EXPECT_FALSE(empty.isValid());
-    EXPECT_FALSE(empty.isShared());
+    EXPECT_FALSE(empty.isValid() || empty.isShared());
     expectError([&] { empty.getPos(); }, ZYRPublic::kZYRErrorInvalidObject, "Null object",
                 "source/zyr/std/CZYRBaseStream");
-
     ZYRStd::CZYRBaseStream s(kZYRStreamRead | kZYRStreamWrite, 16, nullptr);
     ASSERT_TRUE(s.isValid());
-    EXPECT_FALSE(s.isShared());
     EXPECT_EQ(s.write("abc", 1, 3), 3u);
     s.setPos(0);
     char out[3];
@@ -226,37 +190,419 @@ TEST_F(StreamWrapperTest, BaseStreamForwardsAndCounts) {
     ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
     EXPECT_EQ(s.write(out, 1, 20, err), 0u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidData);
+    EXPECT_FALSE(s.isShared());
     {
         ZYRStd::CZYRBaseStream copy(s);
         EXPECT_TRUE(s.isShared());
-        const CZYRSmartZYRRefPtr<IZYRStream>& held = copy;
-        EXPECT_EQ(held->peekRefCnt(), 2);
+        EXPECT_EQ(static_cast<const CZYRSmartZYRRefPtr<IZYRStream>&>(copy)->peekRefCnt(), 2);
     }
     EXPECT_FALSE(s.isShared());
-}
 
-TEST_F(StreamWrapperTest, FileStreamWrapper) {
-    const std::string path = dir_.file("wrapped.txt");
+    zyrtest::TempDir dir;
+    const std::string path = dir.file("wrapped.txt");
     {
-        ZYRStd::CZYRFStream out(ZYRStd::CZYRFileName(path.c_str()),
-                                kZYRStreamWrite | kZYRStreamTruncate);
-        ASSERT_TRUE(out.isOpen());
-        EXPECT_EQ(out.write("file text", 1, 9), 9u);
-        out.flush();
-        EXPECT_STREQ(ZYRStd::UniStringToUTF8String(out.getFilePath()).c_str(), path.c_str());
-        out.close();
-        EXPECT_FALSE(out.isOpen());
+        ZYRStd::CZYRFStream file(ZYRStd::CZYRFileName(path.c_str()),
+                                 kZYRStreamWrite | kZYRStreamTruncate);
+        ASSERT_TRUE(file.isOpen());
+        EXPECT_EQ(file.write("file text", 1, 9), 9u);
+        file.flush();
+        EXPECT_STREQ(ZYRStd::UniStringToUTF8String(file.getFilePath()).c_str(), path.c_str());
+        file.close();
+        EXPECT_FALSE(file.isOpen());
     }
-    ZYRStd::CZYRFStream in(ZYRStd::CZYRFileName(path.c_str()), kZYRStreamRead);
-    ASSERT_TRUE(in.isOpen());
-    EXPECT_EQ(in.getSize(), 9u);
-    char text[16] = {};
-    EXPECT_EQ(in.read(text, 1, sizeof text), 9u);
-    EXPECT_STREQ(text, "file text");
-
-    ZYRStd::CZYRFStream missing(ZYRStd::CZYRFileName(dir_.file("missing").c_str()), kZYRStreamRead);
+    EXPECT_EQ(zyrtest::readFile(path), "file text");
+    ZYRStd::CZYRFStream missing(ZYRStd::CZYRFileName(dir.file("missing").c_str()), kZYRStreamRead);
     EXPECT_TRUE(missing.isValid()) << "a file that does not open still gives a stream";
     EXPECT_FALSE(missing.isOpen());
+    ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
+    ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
+}
+
+// ---- filters --------------------------------------------------------------------------------
+
+using Stream = CZYRSmartZYRRefPtr<IImpZYRMemStream>;
+
+Stream sink(unsigned int capacity = 1 << 20) {
+    return memStream(kZYRStreamRead | kZYRStreamWrite, capacity);
+}
+
+std::string contents(const Stream& s) {
+    return std::string(reinterpret_cast<const char*>(s->data()), s->getEOF());
+}
+
+// A stream over a copy of `text`, kept alive by the returned stream's buffer.
+Stream source(const std::string& text) {
+    Stream s = sink(static_cast<unsigned int>(text.size()) + 1);
+    s->write(text.data(), 1, static_cast<unsigned int>(text.size()));
+    s->setPos(0);
+    return s;
+}
+
+std::string randomBytes(size_t n, unsigned int seed, bool zeroRuns = false) {
+    std::mt19937 random(seed);
+    std::string out(n, '\0');
+    for (size_t i = 0; i < n; ++i)
+        out[i] = (zeroRuns && (i / 8) % 3 == 0) ? '\0' : static_cast<char>(random());
+    return out;
+}
+
+// Encodes through writes of `chunk` bytes (all at once for 0).
+template <class Encoder, class... Args>
+std::string encode(const std::string& bytes, size_t chunk, Args... args) {
+    Stream out = sink();
+    {
+        Encoder filter(CZYRSmartZYRRefPtr<IZYRStream>(out), args...);
+        const size_t step = chunk ? chunk : std::max<size_t>(bytes.size(), 1);
+        for (size_t at = 0; at < bytes.size(); at += step) {
+            const size_t n = std::min(step, bytes.size() - at);
+            EXPECT_EQ(filter.write(bytes.data() + at, 1, static_cast<unsigned int>(n)), n);
+        }
+        filter.close();
+    }
+    return contents(out);
+}
+
+std::string encode85(const std::string& bytes, const char* prefix = nullptr,
+                     const char* eod = nullptr, bool allowZ = true, size_t chunk = 0) {
+    return encode<CZYRStreamFilterASCII85>(bytes, chunk, prefix, eod, allowZ);
+}
+
+std::string encodeHex(const std::string& bytes, const char* prefix = nullptr,
+                      const char* eod = nullptr, size_t chunk = 0) {
+    return encode<CZYRStreamFilterASCIIHEX>(bytes, chunk, prefix, eod);
+}
+
+// Decodes through reads of `step` bytes, to cross every buffer boundary.
+template <class Decoder> std::string decode(const std::string& text, unsigned int step = 4096) {
+    Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
+    std::string out;
+    std::vector<char> buf(step);
+    for (;;) {
+        const unsigned int got = decoder.read(buf.data(), 1, step);
+        out.append(buf.data(), got);
+        if (got < step)
+            break;
+    }
+    EXPECT_TRUE(decoder.isAtEOD());
+    EXPECT_EQ(decoder.read(buf.data(), 1, step), 0u);
+    return out;
+}
+
+std::string decode85(const std::string& text, unsigned int step = 4096) {
+    return decode<CZYRStreamFilterASCII85Decode>(text, step);
+}
+
+std::string decodeHex(const std::string& text, unsigned int step = 4096) {
+    return decode<CZYRStreamFilterASCIIHEXDecode>(text, step);
+}
+
+// The first decoding error of `text`, as the caller keeps it; `where` gets its message with
+// the offending byte and offset the decoder reports.
+template <class Decoder>
+CZYRError firstError(const std::string& text, std::string* where = nullptr) {
+    Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
+    char buf[64];
+    try {
+        while (decoder.read(buf, 1, sizeof buf) > 0) {
+        }
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorInvalidData);
+        const std::string first = e.getMessage();
+        try {
+            decoder.read(buf, 1, sizeof buf);
+            ADD_FAILURE() << "a failed decoder must keep failing";
+        } catch (const CZYRError& again) {
+            EXPECT_EQ(first, again.getMessage());
+        }
+        if (where) {
+            char at[64];
+            if (decoder.getFailureCharacter() >= 0)
+                std::snprintf(at, sizeof at, " 0x%02X at offset %llu",
+                              decoder.getFailureCharacter(), decoder.getFailureOffset());
+            else
+                std::snprintf(at, sizeof at, " at offset %llu", decoder.getFailureOffset());
+            *where = first + at;
+        }
+        return e;
+    }
+    if (where)
+        *where = "(no error)";
+    return CZYRError(ZYRPublic::kZYRErrorNoError, "(no error)", "", 0);
+}
+
+template <class Decoder> std::string decodeError(const std::string& text) {
+    std::string where;
+    firstError<Decoder>(text, &where);
+    return where;
+}
+
+constexpr const char* kA85Source = "source/zyr/std/CZYRStreamsFilterASCII85";
+constexpr const char* kHexSource = "source/zyr/std/CZYRStreamsFilterASCIIHEX";
+
+// ---- ASCII85 encoder ------------------------------------------------------------------------
+
+TEST(CZYRStreamsFilterTest, ASCII85Layout) {
+    EXPECT_EQ(encode85(std::string(4, '\0')), "!!!!!~>\r\n") << "a full group at close is never z";
+    EXPECT_EQ(encode85(std::string(8, '\0')), "z!!!!!~>\r\n");
+    EXPECT_EQ(encode85(std::string(8, '\0'), nullptr, nullptr, false), "!!!!!!!!!!~>\r\n");
+    EXPECT_EQ(encode85("A"), "5l~>\r\n");
+    EXPECT_EQ(encode85(""), "") << "nothing written, nothing at all, not even the marker";
+    EXPECT_EQ(encode85("Man is", "  ", "EOD"), "  9jqo^BlaEOD\r\n");
+
+    const std::string nonzero(64, '\x7f');
+    const std::string text = encode85(nonzero);
+    ASSERT_EQ(text.size(), 80u + 2 + 2 + 2);
+    EXPECT_EQ(text.substr(80), "\r\n~>\r\n") << "80 digits, then the marker alone";
+
+    // 17 groups: the 17th does not fit the first line and starts the second.
+    const std::string seventeen = encode85(std::string(68, '\x7f') + "x");
+    EXPECT_EQ(seventeen.find("\r\n"), 80u);
+
+    // A group split over two lines: one 'z' first moves every group by one character.
+    const std::string group = text.substr(0, 5); // the digits of 7f7f7f7f
+    const std::string split = encode85(std::string(4, '\0') + std::string(68, '\x7f'));
+    EXPECT_EQ(split.find("\r\n"), 80u);
+    EXPECT_EQ(split.substr(76, 4) + split.substr(82, 1), group);
+
+    // At close, the split never leaves a single character for the next line. `zeros` 'z'
+    // characters and 15 groups of digits come first; then "A" gives the final "5l".
+    auto closing = [](unsigned int zeros, const char* eod, const std::string& last = "A") {
+        return encode85(std::string(4 * zeros, '\0') + std::string(60, '\x7f') + last, nullptr,
+                        eod);
+    };
+    auto lines = [&](const std::string& t) {
+        const size_t end = t.find("\r\n");
+        return std::make_pair(t.substr(end - 5, 5), t.substr(end + 2));
+    };
+    // 77 characters, then "5l~>": 3 would fit and leave ">" alone, so "~>" goes on whole.
+    EXPECT_EQ(lines(closing(2, nullptr)), std::make_pair(group.substr(2) + "5l", "~>\r\n"s));
+    EXPECT_EQ(closing(2, nullptr).find("\r\n"), 79u);
+    // 78: 2 fit, 2 go on.
+    EXPECT_EQ(lines(closing(3, nullptr)), std::make_pair(group.substr(2) + "5l", "~>\r\n"s));
+    EXPECT_EQ(closing(3, nullptr).find("\r\n"), 80u);
+    // 79: 1 fits, 3 go on.
+    EXPECT_EQ(lines(closing(4, nullptr)), std::make_pair(group.substr(1) + "5", "l~>\r\n"s));
+    // 79, then "5l": the split would leave "l" alone, so both go on.
+    EXPECT_EQ(lines(closing(4, "")).second, "5l\r\n");
+    EXPECT_EQ(closing(4, "").find("\r\n"), 79u);
+    // 78, then "5l~": "~" would be alone, so "l~" goes on.
+    EXPECT_EQ(lines(closing(3, "~")).second, "l~\r\n");
+    // 79, then three digits and "~>": 1 fits, 4 go on.
+    EXPECT_EQ(lines(closing(4, nullptr, "AB")).second.size(), 4u + 2);
+}
+
+TEST(CZYRStreamsFilterTest, ASCII85ArgumentsAndFailures) {
+    Stream out = sink();
+    const CZYRSmartZYRRefPtr<IZYRStream> target(out);
+    EXPECT_NO_THROW(CZYRStreamFilterASCII85(target, "ab", "12345678901234"));
+    expectError([&] { CZYRStreamFilterASCII85 f(target, nullptr, "123456789012345"); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long", kA85Source);
+    expectError([&] { CZYRStreamFilterASCII85 f(target, "abc", nullptr); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long", kA85Source);
+
+    CZYRStreamFilterASCII85 filter(target, nullptr, nullptr, true);
+    EXPECT_STREQ(filter.getFilterName(), "ASCII85");
+    EXPECT_EQ(filter.getTargetStream().get(), target.get());
+    EXPECT_EQ(filter.write("", 1, 0), 0u);
+    {
+        CZYRStreamFilterASCII85 copy(filter);
+        EXPECT_EQ(target->peekRefCnt(), 4) << "ours, filter's, copy's, and the Stream's";
+    }
+    filter.write("abcd", 1, 4);
+    filter.close();
+    filter.close();
+    EXPECT_FALSE(filter.getTargetStream());
+    expectError([&] { filter.write("x", 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
+                "CZYRStreamFilterASCII85::write - stream invalid", kA85Source);
+    ZYRStd::C_Error err;
+    EXPECT_EQ(filter.write("x", 1, 1, err), 0u);
+    EXPECT_EQ(err.getError(), ZYRPublic::kZYRErrorFileOpFailed);
+    EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCII85::write - stream invalid");
+    EXPECT_STREQ(err.getSrcFileName(), kA85Source);
+
+    // A target too small for the second line: the write fails, the target is dropped,
+    // and the destructor's close does not throw.
+    Stream small = sink(90);
+    {
+        CZYRStreamFilterASCII85 f{CZYRSmartZYRRefPtr<IZYRStream>(small)};
+        const std::string bytes(200, '\x7f');
+        ZYRStd::C_Error writeErr;
+        EXPECT_EQ(f.write(bytes.data(), 1, 200, writeErr), 0u);
+        EXPECT_EQ(writeErr.getError(), ZYRPublic::kZYRErrorInvalidData);
+        EXPECT_STREQ(writeErr.getMessage(), "write past end of stream");
+        EXPECT_FALSE(f.getTargetStream());
+        EXPECT_THROW(f.write("x", 1, 1), CZYRError);
+    }
+    EXPECT_EQ(small->peekRefCnt(), 1);
+}
+
+// ---- ASCIIHex encoder -----------------------------------------------------------------------
+
+TEST(CZYRStreamsFilterTest, ASCIIHexLayout) {
+    EXPECT_EQ(encodeHex(""), ">\r\n") << "the marker is written even without data";
+    EXPECT_EQ(encodeHex("", "  "), "  >\r\n");
+    EXPECT_EQ(encodeHex("\x01\xab\xff"), "01abff>\r\n");
+
+    const std::string bytes = randomBytes(41, 3);
+    std::string expectedDigits;
+    for (unsigned char c : bytes) {
+        static const char digits[] = "0123456789abcdef";
+        expectedDigits += digits[c >> 4];
+        expectedDigits += digits[c & 15];
+    }
+    const std::string text = encodeHex(bytes, "  ");
+    EXPECT_EQ(text,
+              "  " + expectedDigits.substr(0, 80) + "\r\n  " + expectedDigits.substr(80) + ">\r\n");
+    for (size_t chunk : {1, 3, 7, 40, 41})
+        EXPECT_EQ(encodeHex(bytes, "  ", nullptr, chunk), text) << "chunk " << chunk;
+
+    // 39 bytes fill 78 of 80 characters: a 3-character marker needs a line of its own.
+    const std::string full = encodeHex(randomBytes(39, 4), nullptr, "EOD");
+    EXPECT_EQ(full.substr(78), "\r\nEOD\r\n");
+    EXPECT_EQ(encodeHex(randomBytes(39, 4), nullptr, "E").substr(78), "E\r\n");
+
+    EXPECT_EQ(CZYRStreamFilterASCIIHEX::approximateEncodedLength(0, nullptr, nullptr), 83u);
+    EXPECT_EQ(CZYRStreamFilterASCIIHEX::approximateEncodedLength(40, "ab", "EOD"), 2u * 82 + 4 + 3);
+    for (unsigned int n : {0u, 1u, 39u, 40u, 41u, 1000u, 4096u})
+        EXPECT_GE(CZYRStreamFilterASCIIHEX::approximateEncodedLength(n, "ab", nullptr),
+                  encodeHex(randomBytes(n, n), "ab").size());
+    EXPECT_EQ(CZYRStreamFilterASCIIHEX::approximateEncodedLength(0xFFFFFFFFu, nullptr, nullptr),
+              0xFFFFFFFFu)
+        << "saturates rather than wrapping to a small size";
+
+    const CZYRSmartZYRRefPtr<IZYRStream> out(sink());
+    expectError(
+        [&] { CZYRStreamFilterASCIIHEX f(out, "abc", nullptr); }, ZYRPublic::kZYRErrorBadParam,
+        "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: prefix is too long", kHexSource);
+    expectError([&] { CZYRStreamFilterASCIIHEX f(out, nullptr, "123456789012345"); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCIIHEX::CZYRStreamFilterASCIIHEX: eod is too long", kHexSource);
+    CZYRStreamFilterASCIIHEX closed{out};
+    EXPECT_STREQ(closed.getFilterName(), "ASCIIHEX");
+    closed.close();
+    ZYRStd::C_Error err;
+    EXPECT_EQ(closed.write("x", 1, 1, err), 0u);
+    EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCIIHEX::write - stream invalid");
+    EXPECT_EQ(closed.write("x", 1, 1, err), 0u) << "an error already recorded stays";
+}
+
+// ---- decoders -------------------------------------------------------------------------------
+
+TEST(CZYRStreamsFilterTest, RoundTripsOfManyLengths) {
+    for (size_t n = 0; n < 300; ++n) {
+        for (bool zeros : {false, true}) {
+            const std::string bytes = randomBytes(n, static_cast<unsigned int>(n), zeros);
+            const std::string a85 = encode85(bytes, nullptr, nullptr, true, 1 + n % 7);
+            ASSERT_EQ(decode85(a85, 1 + n % 5), bytes) << n << " bytes: " << a85;
+            ASSERT_EQ(encode85(bytes, nullptr, nullptr, true, 1), a85)
+                << "byte by byte or in bulk, the same text";
+            const std::string hex = encodeHex(bytes, "  ", nullptr, 1 + n % 9);
+            ASSERT_EQ(decodeHex(hex, 1 + n % 5), bytes) << n << " bytes: " << hex;
+        }
+    }
+    for (size_t n : {4095u, 65536u, 65537u, 200001u}) {
+        const std::string bytes = randomBytes(n, 99, true);
+        EXPECT_EQ(decode85(encode85(bytes, "  ", nullptr, true)), bytes) << n;
+        EXPECT_EQ(decode85(encode85(bytes, nullptr, nullptr, false), 1000), bytes) << n;
+        EXPECT_EQ(decodeHex(encodeHex(bytes)), bytes) << n;
+    }
+}
+
+TEST(CZYRStreamsFilterTest, ASCII85DecodeRules) {
+    EXPECT_EQ(decode85("9jqo^BlbD-BleB1DJ+*+F(f,q~>"), "Man is distinguished");
+    EXPECT_EQ(decode85(" 9jq\no^\tBl\rbD-\f~ >"), "Man is d") << "white space anywhere";
+    EXPECT_EQ(decode85("<~9jqo^~>"), "Man ") << "Adobe's opening bracket";
+    EXPECT_EQ(decode85("z!!!!!~>"), std::string(8, '\0'));
+    EXPECT_EQ(decode85("5l~>"), "A");
+    EXPECT_EQ(decode85("5l"), "A") << "the end of the source ends the data";
+    EXPECT_EQ(decode85("~>garbage{"), "") << "nothing after the marker is read";
+    EXPECT_EQ(decode85("s8W-!~>"), "\xff\xff\xff\xff");
+    EXPECT_EQ(decode85(""), "");
+
+    using D = CZYRStreamFilterASCII85Decode;
+    EXPECT_EQ(decodeError<D>("9jqo^{"), "ASCII85Decode: invalid character 0x7B at offset 5");
+    EXPECT_EQ(decodeError<D>("9jz"), "ASCII85Decode: 'z' inside a group at offset 2");
+    EXPECT_EQ(decodeError<D>("9jqo^5~>"),
+              "ASCII85Decode: final group of one character at offset 5");
+    EXPECT_EQ(decodeError<D>("s8W-\"~>"), "ASCII85Decode: group out of range at offset 0");
+    EXPECT_EQ(decodeError<D>("9j~x"), "ASCII85Decode: '~' not followed by '>' at offset 2");
+    EXPECT_EQ(decodeError<D>("9j~"), "ASCII85Decode: '~' not followed by '>' at offset 2");
+
+    // The offset counts from the start of the encoded data across buffer refills.
+    std::string longText = encode85(randomBytes(100000, 5));
+    longText.insert(70000, "v");
+    EXPECT_EQ(decodeError<D>(longText), "ASCII85Decode: invalid character 0x76 at offset 70000");
+
+    ZYRStd::C_Error err;
+    D decoder(CZYRSmartZYRRefPtr<IZYRStream>(source("ab{")));
+    char buf[8];
+    EXPECT_EQ(decoder.read(buf, 1, 8, err), 0u);
+    EXPECT_EQ(err.getError(), ZYRPublic::kZYRErrorInvalidData);
+    EXPECT_STREQ(err.getSrcFileName(), kA85Source);
+    EXPECT_STREQ(decoder.getFilterName(), "ASCII85Decode");
+    decoder.close();
+    EXPECT_FALSE(decoder.getSourceStream());
+}
+
+TEST(CZYRStreamsFilterTest, ASCIIHexDecodeRules) {
+    EXPECT_EQ(decodeHex("4d616E>"), "Man");
+    EXPECT_EQ(decodeHex(" 4 d\r\n61\t6e\f>"), "Man");
+    EXPECT_EQ(decodeHex("4d6>"), "M`") << "an odd last digit is followed by 0";
+    EXPECT_EQ(decodeHex("4d6"), "M`");
+    EXPECT_EQ(decodeHex(">4d"), "");
+    EXPECT_EQ(decodeHex(""), "");
+
+    using D = CZYRStreamFilterASCIIHEXDecode;
+    EXPECT_EQ(decodeError<D>("4d6g>"), "ASCIIHexDecode: invalid character 0x67 at offset 3");
+    std::string longText = encodeHex(randomBytes(50000, 6));
+    longText.insert(70001, "~");
+    EXPECT_EQ(decodeError<D>(longText), "ASCIIHexDecode: invalid character 0x7E at offset 70001");
+}
+
+TEST(CZYRStreamsFilterTest, DecodingErrorTextsOutliveTheNextErrorAndTheThread) {
+    using A85 = CZYRStreamFilterASCII85Decode;
+    using Hex = CZYRStreamFilterASCIIHEXDecode;
+    const CZYRError bad85 = firstError<A85>("9jqo^{");
+    const std::string text85 = bad85.getMessage();
+    const CZYRError badHex = firstError<Hex>("4d6g>");
+    const std::string textHex = badHex.getMessage();
+    EXPECT_EQ(text85.rfind("ASCII85Decode: invalid character", 0), 0u) << text85;
+    EXPECT_EQ(textHex.rfind("ASCIIHexDecode: invalid character", 0), 0u) << textHex;
+
+    // Later errors of the same kind on the same thread leave the earlier texts alone.
+    firstError<A85>("9jz");
+    firstError<Hex>(std::string(100, '4') + "~");
+    EXPECT_EQ(bad85.getMessage(), text85);
+    EXPECT_EQ(badHex.getMessage(), textHex);
+
+    // An error made on a thread that has ended keeps its text.
+    CZYRError fromThread(ZYRPublic::kZYRErrorNoError, nullptr, "", 0);
+    std::string textThread;
+    std::thread([&] {
+        fromThread = firstError<Hex>("zz");
+        textThread = fromThread.getMessage();
+    }).join();
+    EXPECT_EQ(std::string(fromThread.getMessage()), textThread);
+}
+
+TEST(CZYRStreamsFilterTest, ErrorReportingWriteEncodesWhateverTheStatusHolds) {
+    ZYRStd::C_Error earlier;
+    earlier.setError(ZYRPublic::kZYRErrorBadParam, "earlier", "elsewhere", 1);
+    Stream out85 = sink();
+    Stream outHex = sink();
+    {
+        CZYRStreamFilterASCII85 a85{CZYRSmartZYRRefPtr<IZYRStream>(out85)};
+        CZYRStreamFilterASCIIHEX hex{CZYRSmartZYRRefPtr<IZYRStream>(outHex)};
+        EXPECT_EQ(a85.write("A", 1, 1, earlier), 1u);
+        EXPECT_EQ(hex.write("Man", 1, 3, earlier), 3u);
+        a85.close();
+        hex.close();
+    }
+    EXPECT_EQ(contents(out85), "5l~>\r\n");
+    EXPECT_EQ(contents(outHex), "4d616e>\r\n");
+    EXPECT_STREQ(earlier.getMessage(), "earlier") << "a successful write changes no status";
 }
 
 } // namespace

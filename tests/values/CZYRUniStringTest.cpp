@@ -1,9 +1,13 @@
-// Unicode strings: construction, conversion, ordering, interning and path forms.
+// Strings: Unicode strings (construction, conversion, ordering, interning, path forms, ICU
+// failures), narrow strings and hex decoding, data buffers, and the common strings table with
+// the dynamic string cache.
 #include <gtest/gtest.h>
 
 #include <cstdlib>
 #include <cstring>
 #include <set>
+#include <sstream>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -11,6 +15,7 @@
 
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
+#include "zyr/std/values/CZYRDataBuffer.h"
 #include "zyr/std/values/CZYRString.h"
 #include "zyr/std/values/CZYRUniString.h"
 
@@ -30,6 +35,26 @@ CZYRUniString fresh(const char* text) {
     return CZYRUniString(createUniString(text, "UTF-8", err), false);
 }
 
+C_SmartPtr<I_UniString> freshPtr(const std::u16string& text) {
+    C_Error err;
+    return C_SmartPtr<I_UniString>(createUniString(text.c_str(), err), false);
+}
+
+std::u16string textOf(const C_SmartPtr<I_UniString>& s) {
+    return units(CZYRUniString(s.get(), true));
+}
+
+template <class Call>
+void expectError(Call call, ZYRPublic::eZYRErrorType type, const char* message) {
+    try {
+        call();
+        ADD_FAILURE() << "expected " << message;
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), type);
+        EXPECT_STREQ(e.getMessage(), message);
+    }
+}
+
 } // namespace
 
 TEST(CZYRUniStringTest, ConstructionFromEveryEncoding) {
@@ -41,14 +66,8 @@ TEST(CZYRUniStringTest, ConstructionFromEveryEncoding) {
     EXPECT_EQ(bytes, 0u);
 
     EXPECT_FALSE(CZYRUniString(static_cast<const char*>(nullptr)).isValid());
-    try {
-        CZYRUniString(static_cast<const char*>(nullptr), "UTF-8");
-        ADD_FAILURE() << "a null text with an encoding is an error";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), kZYRErrorBadParam);
-        EXPECT_STREQ(e.getMessage(), "Cannot create a NULL IImp_ZYRUniString");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRUniString");
-    }
+    expectError([] { CZYRUniString(static_cast<const char*>(nullptr), "UTF-8"); },
+                kZYRErrorBadParam, "Cannot create a NULL IImp_ZYRUniString");
 
     EXPECT_EQ(units(CZYRUniString("abc", 2, "UTF-8")), u"ab");
     const CZYRUniString withZero("a\0b", 3, "UTF-8");
@@ -84,13 +103,9 @@ TEST(CZYRUniStringTest, ConvertReportsNeededLengthAndTerminates) {
     EXPECT_EQ(size, 6u);
     EXPECT_EQ(std::u16string(wide), u"abc");
 
-    try {
-        abc.convert(buffer, &size, "no-such-converter-anywhere");
-        ADD_FAILURE() << "unknown converters are an error";
-    } catch (const CZYRError& e) {
-        EXPECT_STREQ(e.getMessage(),
-                     "IImp_ZYRUniString::convert couldn't open converter for codePage");
-    }
+    expectError([&] { abc.convert(buffer, &size, "no-such-converter-anywhere"); },
+                kZYRErrorBadParam,
+                "IImp_ZYRUniString::convert couldn't open converter for codePage");
     C_Error err;
     abc.getImpl()->convert(buffer, nullptr, "UTF-8", err);
     EXPECT_STREQ(err.getMessage(), "Bad argument to IImp_ZYRUniString::convert");
@@ -155,7 +170,6 @@ TEST(CZYRUniStringTest, ConcatAndAppendBuildNewObjects) {
     const CZYRUniString left = fresh("left"), right = fresh("right");
     const CZYRUniString joined = left.concat(right);
     EXPECT_EQ(units(joined), u"leftright");
-    EXPECT_EQ(units(left), u"left");
     EXPECT_NE(joined.getUniqueID(), left.getUniqueID());
 
     CZYRUniString grown = left;
@@ -303,4 +317,152 @@ TEST(CZYRUniStringTest, IcuAllocationFailureIsAnErrorNotACrash) {
     icuHeapFails = false;
     EXPECT_EQ(grown, nullptr);
     EXPECT_EQ(growErr.getError(), ZYRPublic::kZYRErrorOutOfMemory);
+}
+
+// ---- narrow strings and data buffers ---------------------------------------------------------
+
+TEST(CZYRStringTest, HashConversionsAndStreams) {
+    EXPECT_EQ(CZYRString("ab").hashCode(), 3105u);
+    const CZYRString withZero("a\0b", 3);
+    EXPECT_EQ(withZero.length(), 3u);
+    EXPECT_EQ(withZero.hashCode(), 97u) << "the hash stops at a zero";
+    EXPECT_EQ(CZYRString("").hashCode(), 0u);
+    const CZYRString accented{CZYRUniString(u"\u00e9")};
+    EXPECT_EQ(accented.length(), 1u);
+    EXPECT_EQ(accented[0], '\x1a') << "outside ASCII the substitution byte stands in";
+    EXPECT_TRUE(CZYRString{CZYRUniString()}.empty());
+    EXPECT_EQ(CZYRWString{CZYRUniString(u"w\u00e9")}.str(), u"w\u00e9");
+    EXPECT_EQ(CZYRString("hello").find("xyz"), 4294967295u);
+    EXPECT_EQ(CZYRString(CZYRString("hello world"), 6, 100).c_str(), std::string("world"));
+    EXPECT_EQ((CZYRString("a") + CZYRString("b")).c_str(), std::string("ab"));
+
+    std::istringstream in("first second\nthird;fourth");
+    CZYRString word;
+    in >> word;
+    EXPECT_EQ(word.c_str(), std::string("first"));
+    getline(in, word);
+    EXPECT_EQ(word.c_str(), std::string(" second"));
+    getline(in, word, ';');
+    EXPECT_EQ(word.c_str(), std::string("third"));
+    std::ostringstream out;
+    out << word;
+    EXPECT_EQ(out.str(), "third");
+}
+
+TEST(CZYRStringTest, HexDecoding) {
+    const CZYRString bytes = CZYRStringFromHexASCIIString("00ff");
+    ASSERT_EQ(bytes.length(), 2u);
+    EXPECT_EQ(static_cast<unsigned char>(bytes[0]), 0);
+    EXPECT_EQ(static_cast<unsigned char>(bytes[1]), 255);
+    EXPECT_EQ(CZYRStringFromHexASCIIString("48692").c_str(), std::string("Hi"));
+    EXPECT_EQ(CZYRStringFromHexASCIIString("4A6a9Ff0").c_str(), std::string("Jj\x9f\xf0"));
+    EXPECT_TRUE(CZYRStringFromHexASCIIString("7").empty());
+    EXPECT_TRUE(CZYRStringFromHexASCIIString("").empty());
+    EXPECT_TRUE(CZYRStringFromHexASCIIString(nullptr).empty());
+    // A non-digit repeats the nibble of the previous pair: "4g" after "41" is 0x41 again.
+    EXPECT_EQ(CZYRStringFromHexASCIIString("41g1").c_str(), std::string("AA"));
+    const CZYRString none = CZYRStringFromHexASCIIString("G@`g");
+    EXPECT_EQ(std::string(none.c_str(), none.length()), std::string(2, '\0'));
+    // 127 bytes fit the stack buffer with their terminator, 128 do not.
+    for (size_t n : {127u, 128u, 300u}) {
+        const CZYRString decoded = CZYRStringFromHexASCIIString(std::string(2 * n, 'a').c_str());
+        ASSERT_EQ(decoded.length(), n);
+        EXPECT_EQ(static_cast<unsigned char>(decoded[n - 1]), 0xAA);
+    }
+}
+
+TEST(CZYRStringTest, DataBuffersKeepTheirOwnCopy) {
+    char bytes[] = "payload";
+    const CZYRDataBuffer buffer(bytes, 7);
+    bytes[0] = 'X';
+    EXPECT_EQ(std::string(buffer.getBuffer(), buffer.getLength()), "payload");
+    const CZYRDataBuffer copy = buffer;
+    EXPECT_EQ(copy.getImpl(), buffer.getImpl());
+    EXPECT_EQ(copy.getUniqueID(), buffer.getUniqueID());
+    EXPECT_NE(CZYRDataBuffer(bytes, 7).getUniqueID(), buffer.getUniqueID());
+    C_Error err;
+    for (const auto& [data, length] : {std::pair<const char*, unsigned int>{nullptr, 10},
+                                       std::pair<const char*, unsigned int>{"x", 0}}) {
+        const CZYRDataBuffer empty(createDataBuffer(data, length, err), false);
+        EXPECT_TRUE(empty.isValid());
+        EXPECT_EQ(empty.getBuffer(), nullptr);
+        EXPECT_EQ(empty.getLength(), 0u);
+    }
+    EXPECT_FALSE(err.errorOccurred());
+    const CZYRDataBuffer invalid;
+    EXPECT_EQ(invalid.getLength(), 0u);
+    expectError([&] { invalid.getUniqueID(); }, ZYRPublic::kZYRErrorInvalidObject,
+                "CZYRDataBuffer::getUniqueID invalid object");
+    err.setError(ZYRPublic::kZYRErrorBadParam, "earlier", nullptr, 1);
+    EXPECT_EQ(createDataBuffer("x", 1, err), nullptr);
+}
+
+// ---- the common strings table and the dynamic cache --------------------------------------------
+
+TEST(CZYRCommonUniStringsTest, EveryAccessorAnswersItsOwnRowAndText) {
+    IZYRCommonUniStrings* table = GetCommonUniStrings();
+    unsigned int row = 0;
+    // Each row is found by its own text, and the accessors follow the rows.
+    auto check = [&](C_SmartPtr<I_UniString> s, const char* name) {
+        ASSERT_EQ(s.get(), table->GetCachedCommonUniString(row).get()) << name << " at " << row;
+        ASSERT_STREQ(CommonUniStringText(row), name);
+        const std::string text(name);
+        ASSERT_EQ(textOf(s), std::u16string(text.begin(), text.end())) << row;
+        ASSERT_EQ(table->findCommonUniString(freshPtr(textOf(s))).get(), s.get()) << row;
+        ++row;
+    };
+#define ZYR_COMMON_STRING(Name) check(table->str_##Name(), #Name);
+#include "zyr/std/values/CZYRCommonUniStrings.def"
+    EXPECT_EQ(row, kCommonUniStringAccessors);
+    EXPECT_NE(table->str_ALL().get(), table->str_All().get());
+    expectError([&] { table->GetCachedCommonUniString(626); }, kZYRErrorBadParam,
+                "String constant invalid in GetCachedCommonUniString");
+    // The last rows have no accessor and are found only by text.
+    EXPECT_STREQ(CommonUniStringText(641), "ZYRTemp\\trap");
+    EXPECT_STREQ(CommonUniStringText(693), "*");
+    EXPECT_EQ(CommonUniStringText(100000), nullptr);
+    const C_SmartPtr<I_UniString> slash = freshPtr(u"/");
+    EXPECT_NE(table->findCommonUniString(slash).get(), slash.get());
+    const C_SmartPtr<I_UniString> other = freshPtr(u"not in the table");
+    EXPECT_EQ(table->findCommonUniString(other).get(), other.get());
+}
+
+TEST(CZYRCommonUniStringsTest, CacheIsBoundedAndLeastRecentlyUsedGoesFirst) {
+    ReleaseDynamicUniStringCache();
+    InitDynamicUniStringCache();
+    std::vector<C_SmartPtr<I_UniString>> first;
+    for (int i = 0; i < 101; ++i) {
+        first.push_back(freshPtr(u"entry " + std::u16string(1, char16_t(u'A' + i))));
+        EXPECT_EQ(GetUniStringFromDynamicCache(first.back()).get(), first.back().get());
+    }
+    // Touch entry 0, so that entry 1 is now the least recently used.
+    EXPECT_EQ(GetUniStringFromDynamicCache(freshPtr(textOf(first[0]))).get(), first[0].get());
+    GetUniStringFromDynamicCache(freshPtr(u"the 102nd text"));
+    EXPECT_EQ(GetUniStringFromDynamicCache(freshPtr(textOf(first[0]))).get(), first[0].get());
+    const C_SmartPtr<I_UniString> again = freshPtr(textOf(first[1]));
+    EXPECT_EQ(GetUniStringFromDynamicCache(again).get(), again.get()) << "entry 1 was dropped";
+
+    // Too long, or a temporary file's name, is not cached.
+    for (const std::u16string& text : {std::u16string(261, u'x'), std::u16string(u"x.tmp")}) {
+        const C_SmartPtr<I_UniString> s = freshPtr(text);
+        GetUniStringFromDynamicCache(s);
+        EXPECT_NE(GetUniStringFromDynamicCache(freshPtr(text)).get(), s.get());
+    }
+    for (const std::u16string& text : {std::u16string(260, u'x'), std::u16string(u".tmp")}) {
+        const C_SmartPtr<I_UniString> s = freshPtr(text);
+        GetUniStringFromDynamicCache(s);
+        EXPECT_EQ(GetUniStringFromDynamicCache(freshPtr(text)).get(), s.get());
+    }
+    ReleaseDynamicUniStringCache();
+    const C_SmartPtr<I_UniString> uncached = freshPtr(u".tmp");
+    EXPECT_EQ(GetUniStringFromDynamicCache(uncached).get(), uncached.get());
+    InitDynamicUniStringCache();
+}
+
+TEST(CZYRCommonUniStringsTest, TextConstructorsNeedTheTable) {
+    ReleaseCommonUniStrings();
+    expectError([] { CZYRUniString("anything"); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+                "CommonUniString singleton not initialized");
+    InitCommonUniStrings();
+    EXPECT_NO_THROW(CZYRUniString("anything"));
 }

@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <memory>
 #include <sstream>
 
 #include "zyr/std/values/CZYRDict.h"
@@ -102,61 +103,49 @@ struct Item : CZYRRegisterItemBase {
     explicit Item(int id) : CZYRRegisterItemBase(id) {}
     ~Item() override { ++destroyed; }
 };
+// An item for the registry, which deletes what it owns with the default procedure.
+Item* owned(int id) {
+    return std::make_unique<Item>(id).release();
+}
 } // namespace
 
 TEST(ZYRDictEnumProcsTest, InterfaceRegistryOwnsWhatItIsGiven) {
     destroyed = 0;
     {
         CZYRInterfaceRegistry registry;
-        EXPECT_EQ(registry.queryInterface(1), nullptr);
-        EXPECT_FALSE(registry.hasInterface(1));
-        EXPECT_EQ(registry.getNumInterfaces(), 0);
-        EXPECT_FALSE(registry.isShared());
-
-        auto* first = new Item(5);
-        registry.registerInterface(first, ZYRRegisterInterfaceDefaultDeleteProc, false);
-        auto* second = new Item(5);
+        EXPECT_EQ(registry.queryInterface(5), nullptr);
+        EXPECT_FALSE(registry.hasInterface(5) || registry.isShared());
+        registry.registerInterface(owned(5), ZYRRegisterInterfaceDefaultDeleteProc, false);
+        Item* second = owned(5);
         registry.registerInterface(second, ZYRRegisterInterfaceDefaultDeleteProc, true);
-        EXPECT_EQ(destroyed, 1);
+        EXPECT_EQ(destroyed, 1) << "the replaced item is deleted";
         EXPECT_EQ(registry.getNumInterfaces(), 1);
         EXPECT_EQ(registry.queryInterface(5), second);
         // Registering the same item again keeps it alive.
         registry.registerInterface(second, ZYRRegisterInterfaceDefaultDeleteProc, true);
         EXPECT_EQ(destroyed, 1);
-
         EXPECT_THROW(registry.registerInterface(nullptr, nullptr, false), CZYRError);
-        EXPECT_EQ(registry.getNumInterfaces(), 1);
-    }
-    EXPECT_EQ(destroyed, 2) << "the table's destruction deletes what it owns";
 
-    // Copies share the table; clones own nothing.
-    destroyed = 0;
-    {
-        CZYRInterfaceRegistry registry;
-        registry.registerInterface(new Item(1), ZYRRegisterInterfaceDefaultDeleteProc, false);
+        // Copies share the table; clones own nothing.
         CZYRInterfaceRegistry copy = registry;
-        copy.registerInterface(new Item(2), ZYRRegisterInterfaceDefaultDeleteProc, false);
-        EXPECT_TRUE(registry.hasInterface(2));
-        EXPECT_TRUE(registry.isShared());
-        EXPECT_TRUE(copy.isShared());
-        EXPECT_THROW(registry.registerInterface(registry.queryInterface(1), nullptr, false),
-                     CZYRError);
+        copy.registerInterface(owned(2), ZYRRegisterInterfaceDefaultDeleteProc, false);
+        EXPECT_TRUE(registry.hasInterface(2) && registry.isShared());
+        EXPECT_THROW(registry.registerInterface(second, nullptr, false), CZYRError);
         EXPECT_EQ(registry.getNumInterfaces(), 2);
-
         {
             CZYRInterfaceRegistry clone = registry.clone();
-            EXPECT_EQ(clone.queryInterface(1), registry.queryInterface(1));
-            clone.deleteInterface(1);
-            EXPECT_TRUE(registry.hasInterface(1));
+            EXPECT_EQ(clone.queryInterface(5), second);
+            clone.deleteInterface(5);
+            EXPECT_TRUE(registry.hasInterface(5));
         }
-        EXPECT_EQ(destroyed, 0) << "a clone owns nothing";
-        registry.deleteInterface(1);
-        EXPECT_EQ(destroyed, 1);
+        EXPECT_EQ(destroyed, 1) << "a clone owns nothing";
+        registry.deleteInterface(5);
+        EXPECT_EQ(destroyed, 2);
         EXPECT_EQ(copy.getNumInterfaces(), 1);
-        registry.deleteInterface(1);
-        EXPECT_EQ(destroyed, 1);
+        registry.deleteInterface(5);
+        EXPECT_EQ(destroyed, 2);
     }
-    EXPECT_EQ(destroyed, 2);
+    EXPECT_EQ(destroyed, 3) << "the table's destruction deletes what it owns";
 }
 
 TEST(ZYRDictEnumProcsTest, CyclesAreMarkedAndDepthIsBounded) {

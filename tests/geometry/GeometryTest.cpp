@@ -1,0 +1,477 @@
+// Geometry: matrix algebra, rectangles, sampled functions and fixed-point arithmetic, each at
+// its boundaries and against plain references over random inputs.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <bit>
+#include <cmath>
+#include <cstdint>
+#include <limits>
+#include <random>
+#include <vector>
+
+#include "zyr/std/core/CZYRError.h"
+#include "zyr/std/geometry/CZYRMatrix.h"
+#include "zyr/std/geometry/CZYRRect.h"
+#include "zyr/std/geometry/CZYRSampledFunc.h"
+#include "zyr/std/geometry/ZYRFixed.h"
+
+using namespace ZYRStd;
+using namespace ZYRPublic;
+
+namespace {
+
+template <class Call> void expectBadParam(Call call, const char* message, const char* source) {
+    try {
+        call();
+        ADD_FAILURE() << "expected " << message;
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), kZYRErrorBadParam);
+        EXPECT_STREQ(e.getMessage(), message);
+        EXPECT_STREQ(e.getSrcFileName(), source);
+    }
+}
+
+// ---- matrices -------------------------------------------------------------------------------
+
+::testing::AssertionResult near(const CZYRMatrix& got, const CZYRMatrix& want, double eps) {
+    if (got.equal(want, eps))
+        return ::testing::AssertionSuccess();
+    const sZYRMatrix& g = got;
+    return ::testing::AssertionFailure() << "got (" << g.a << ", " << g.b << ", " << g.c << ", "
+                                         << g.d << ", " << g.tx << ", " << g.ty << ")";
+}
+
+const CZYRMatrix kA(1, 2, 3, 4, 5, 6);
+const CZYRMatrix kB(7, 8, 9, 10, 11, 12);
+const double kNaN = std::numeric_limits<double>::quiet_NaN();
+
+TEST(CZYRMatrixTest, IdentityValidityAndComparisons) {
+    EXPECT_TRUE(CZYRMatrix().isIdentity());
+    EXPECT_TRUE(CZYRMatrix(1, -0.0, 0, 1, 0, 0).isIdentity()) << "-0.0 compares equal to 0";
+    EXPECT_FALSE(CZYRMatrix(1, 0, 0, 1, 0, 1e-300).isIdentity());
+    const CZYRMatrix bad(1, 0, 0, 1, 0, kNaN);
+    EXPECT_FALSE(bad.isValid());
+    EXPECT_FALSE(bad == bad) << "a NaN entry makes equality false";
+    EXPECT_FALSE(bad.equal(bad, 1.0));
+    EXPECT_TRUE(kA.isValid());
+    EXPECT_TRUE(kA != kB);
+    // eps is inclusive for every entry, and any one entry beyond it counts.
+    const CZYRMatrix shifted(1.5, 2.5, 3.5, 4.5, 5.5, 6.5);
+    EXPECT_TRUE(kA.equal(shifted, 0.5));
+    EXPECT_FALSE(kA.equal(shifted, 0.4999));
+    EXPECT_FALSE(kA.equal(CZYRMatrix(1, 2, 3, 4.25, 5, 6), 0.2));
+
+    CZYRMatrix m;
+    m.setMtxVals(0.1, 2, 3, 4, 1e40, -7);
+    float f[6];
+    m.getMtxVals(f[0], f[1], f[2], f[3], f[4], f[5]);
+    EXPECT_EQ(f[0], 0.1f);
+    EXPECT_EQ(f[3], 4.0f);
+    EXPECT_TRUE(std::isinf(f[4])) << "values beyond float range narrow to infinity";
+    EXPECT_EQ(f[5], -7.0f);
+    EXPECT_EQ(kA.determinant(), -2.0);
+    EXPECT_DOUBLE_EQ(kA.resolution(72), 72 * std::sqrt(2.0));
+}
+
+TEST(CZYRMatrixTest, ProductOrdersAndForms) {
+    // Worked by hand: in A times B, A applies first.
+    const CZYRMatrix AB(25, 28, 57, 64, 100, 112);
+    const CZYRMatrix BA(31, 46, 39, 58, 52, 76);
+    EXPECT_TRUE(kA * kB == AB);
+    EXPECT_TRUE(kB * kA == BA);
+    double x = 1, y = 1;
+    kA.transformPoint(x, y);
+    ZYRMatrix_transformPoint(kB, x, y);
+    EXPECT_EQ(x, 182);
+    EXPECT_EQ(y, 204);
+
+    const double rad = 30 * 3.141592653589793 / 180;
+    const CZYRMatrix R(std::cos(rad), std::sin(rad), -std::sin(rad), std::cos(rad), 0, 0);
+    // Each prefix (operand first) and postfix (MTX, operand last) form, as a method and as
+    // the free function.
+    const struct {
+        void (*apply)(CZYRMatrix&);
+        CZYRMatrix want;
+        double eps;
+    } forms[] = {
+        {[](CZYRMatrix& m) { m *= kB; }, AB, 0},
+        {[](CZYRMatrix& m) { m.concat(kB); }, BA, 0},
+        {[](CZYRMatrix& m) { m.concatMTX(kB); }, AB, 0},
+        {[](CZYRMatrix& m) { m.translate(2, 3); }, {1, 2, 3, 4, 16, 22}, 0},
+        {[](CZYRMatrix& m) { ZYRMatrix_translate(m, 2, 3); }, {1, 2, 3, 4, 16, 22}, 0},
+        {[](CZYRMatrix& m) { m.translateMTX(2, 3); }, {1, 2, 3, 4, 7, 9}, 0},
+        {[](CZYRMatrix& m) { ZYRMatrix_translateMTX(m, 2, 3); }, {1, 2, 3, 4, 7, 9}, 0},
+        {[](CZYRMatrix& m) { m.scale(2, 3); }, {2, 4, 9, 12, 5, 6}, 0},
+        {[](CZYRMatrix& m) { ZYRMatrix_scale(m, 2, 3); }, {2, 4, 9, 12, 5, 6}, 0},
+        {[](CZYRMatrix& m) { m.scaleMTX(2, 3); }, {2, 6, 6, 12, 10, 18}, 0},
+        {[](CZYRMatrix& m) { ZYRMatrix_scaleMTX(m, 2, 3); }, {2, 6, 6, 12, 10, 18}, 0},
+        {[](CZYRMatrix& m) { m.rotate(90); }, {3, 4, -1, -2, 5, 6}, 1e-12},
+        {[](CZYRMatrix& m) { m.rotateMTX(90); }, {-2, 1, -4, 3, -6, 5}, 1e-12},
+        {[](CZYRMatrix& m) { ZYRMatrix_rotate(m, 30); }, R * kA, 1e-12},
+        {[](CZYRMatrix& m) { ZYRMatrix_rotateMTX(m, 30); }, kA * R, 1e-12},
+    };
+    for (size_t i = 0; i < std::size(forms); ++i) {
+        CZYRMatrix m = kA;
+        forms[i].apply(m);
+        EXPECT_TRUE(near(m, forms[i].want, forms[i].eps)) << "form " << i;
+    }
+    // cos 90 degrees is not 0 in double, and the rotation keeps that.
+    const double cos90 = std::cos(90 * 3.141592653589793 / 180);
+    CZYRMatrix m;
+    m.rotate(90);
+    EXPECT_TRUE(m == CZYRMatrix(cos90, 1, -1, cos90, 0, 0));
+}
+
+TEST(CZYRMatrixTest, Inversion) {
+    CZYRMatrix m(2, 0, 0, 4, 10, 20);
+    m.invert();
+    EXPECT_TRUE(m == CZYRMatrix(0.5, 0, 0, 0.25, -5, -5));
+    std::mt19937_64 rng(7);
+    std::uniform_real_distribution<double> linear(-10.0, 10.0), shift(-1000.0, 1000.0);
+    for (int i = 0; i < 1000; ++i) {
+        const CZYRMatrix A(linear(rng), linear(rng), linear(rng), linear(rng), shift(rng),
+                           shift(rng));
+        if (std::fabs(A.determinant()) < 0.5)
+            continue;
+        CZYRMatrix inv;
+        ZYRMatrix_invert(A, inv);
+        ASSERT_TRUE(near(A * inv, CZYRMatrix(), 1e-9)) << "case " << i;
+        ASSERT_TRUE(near(inv * A, CZYRMatrix(), 1e-9)) << "case " << i;
+    }
+    CZYRMatrix same = kA;
+    ZYRMatrix_invert(same, same);
+    EXPECT_TRUE(near(same * kA, CZYRMatrix(), 1e-12)) << "source and target may be one matrix";
+
+    // Exactly singular: the error, and neither matrix changes.
+    CZYRMatrix singular(1, 2, 2, 4, 0, 0);
+    EXPECT_FALSE(singular.invertible());
+    expectBadParam([&] { singular.invert(); }, "Inverting Singular Matrix",
+                   "source/zyr/std/CZYRMatrix");
+    EXPECT_TRUE(singular == CZYRMatrix(1, 2, 2, 4, 0, 0));
+    CZYRMatrix target = kB;
+    EXPECT_THROW(ZYRMatrix_invert(singular, target), CZYRError);
+    EXPECT_TRUE(target == kB);
+
+    // invert has no tolerance; invertible judges the determinant as a float.
+    CZYRMatrix tiny(1e-20, 0, 0, 1e-20, 0, 0);
+    EXPECT_FALSE(tiny.invertible());
+    EXPECT_NO_THROW(tiny.invert());
+    EXPECT_TRUE(near(tiny, CZYRMatrix(1e20, 0, 0, 1e20, 0, 0), 1e5));
+    const double fmin = std::numeric_limits<float>::min();
+    EXPECT_FALSE(CZYRMatrix(1, 0, 0, fmin, 0, 0).invertible()) << "must exceed, not reach";
+    EXPECT_TRUE(CZYRMatrix(1, 0, 0, 2 * fmin, 0, 0).invertible());
+    EXPECT_TRUE(CZYRMatrix(0, 1e-3, 1, 0, 0, 0).invertible()) << "negative determinant";
+    EXPECT_TRUE(CZYRMatrix(1e200, 0, 0, 1e200, 0, 0).invertible()) << "beyond float range";
+    EXPECT_FALSE(CZYRMatrix(kNaN, 0, 0, 1, 0, 0).invertible());
+}
+
+TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
+    float fx = 1.5f, fy = -2.0f;
+    kA.transformPoint(fx, fy);
+    EXPECT_EQ(fx, 0.5f);
+    EXPECT_EQ(fy, 1.0f);
+    // In float, 2^24 + 1 would round away before the translation cancels 2^24.
+    const CZYRMatrix cancel(1, 0, 1, 1, -16777216.0, 0);
+    fx = 16777216.0f;
+    fy = 1.0f;
+    ZYRMatrix_transformPoint(cancel, fx, fy);
+    EXPECT_EQ(fx, 1.0f) << "float points are transformed in double";
+
+    // Against the extremes of the four transformed corners, for arbitrary (mirroring too)
+    // matrices.
+    std::mt19937_64 rng(11);
+    std::uniform_real_distribution<double> any(-100.0, 100.0);
+    for (int i = 0; i < 2000; ++i) {
+        const CZYRMatrix m(any(rng), any(rng), any(rng), any(rng), any(rng), any(rng));
+        const double x0 = any(rng), x1 = any(rng), y0 = any(rng), y1 = any(rng);
+        const sZYRRect box{std::min(x0, x1), std::min(y0, y1), std::max(y0, y1), std::max(x0, x1)};
+        double lo[2] = {INFINITY, INFINITY}, hi[2] = {-INFINITY, -INFINITY};
+        for (double cx : {x0, x1})
+            for (double cy : {y0, y1}) {
+                double p[2] = {cx, cy};
+                m.transformPoint(p[0], p[1]);
+                for (int k = 0; k < 2; ++k) {
+                    lo[k] = std::min(lo[k], p[k]);
+                    hi[k] = std::max(hi[k], p[k]);
+                }
+            }
+        const sZYRRect got = i % 2 ? ZYRMatrix_transformBBox(m, box) : m.transformBBox(box);
+        ASSERT_NEAR(got.left, lo[0], 1e-9) << "case " << i;
+        ASSERT_NEAR(got.right, hi[0], 1e-9) << "case " << i;
+        ASSERT_NEAR(got.bottom, lo[1], 1e-9) << "case " << i;
+        ASSERT_NEAR(got.top, hi[1], 1e-9) << "case " << i;
+    }
+}
+
+// ---- rectangles -----------------------------------------------------------------------------
+
+// Expected values in the constructor's order: left, bottom, right, top.
+::testing::AssertionResult is(const CZYRRect& got, double l, double b, double r, double t) {
+    const sZYRRect& g = got;
+    if (g.left == l && g.bottom == b && g.right == r && g.top == t)
+        return ::testing::AssertionSuccess();
+    return ::testing::AssertionFailure() << "got left " << g.left << " bottom " << g.bottom
+                                         << " right " << g.right << " top " << g.top;
+}
+
+TEST(CZYRRectTest, InvertedDefaultGrowsToItsPoints) {
+    const sZYRRect& rec = CZYRRect(1, 2, 3, 4); // left, bottom, right, top
+    EXPECT_EQ(rec.top, 4) << "the record keeps top before right";
+    EXPECT_EQ(rec.right, 3);
+    const double huge = std::numeric_limits<double>::max();
+    CZYRRect r;
+    EXPECT_TRUE(is(r, huge, huge, -huge, -huge));
+    EXPECT_TRUE(r.isempty());
+    EXPECT_FALSE(r.isBoundingBox());
+    r.updateBBoxPoint(5, 6);
+    EXPECT_TRUE(is(r, 5, 6, 5, 6));
+    EXPECT_TRUE(r.isBoundingBox());
+    EXPECT_TRUE(r.isempty()) << "a single point has no area";
+    r.updateBBoxPoint(-1, 10);
+    r.updateBBoxPoint(2, 0);
+    EXPECT_TRUE(is(r, -1, 0, 5, 10));
+    EXPECT_FALSE(r.isempty());
+    EXPECT_TRUE(CZYRRect(0, 0, 1, 0).isempty() && CZYRRect(0, 0, 0, 1).isempty());
+    CZYRRect u;
+    u.unionRect(CZYRRect(1, 2, 3, 4));
+    EXPECT_TRUE(u == CZYRRect(1, 2, 3, 4)) << "the default is neutral for union";
+    u.unionRect(CZYRRect(-5, 3, 0, 9));
+    EXPECT_TRUE(is(u, -5, 2, 3, 9));
+
+    r.setRect(CZYRRect(3, 0, 1, 1));
+    EXPECT_TRUE(is(r, 3, 0, 1, 1)) << "setRect does not check";
+    EXPECT_NO_THROW(r.setBoundingBox(CZYRRect(0, 0, 0, 0)));
+    expectBadParam([&] { r.setBoundingBox(CZYRRect(0, 5, 1, 4)); }, "Invalid bounding box set",
+                   "source/zyr/std/CZYRRect");
+    EXPECT_TRUE(is(r, 0, 5, 1, 4)) << "the refused values are kept";
+    EXPECT_THROW(r.setBoundingBox(CZYRRect(2, 0, 1, 1)), CZYRError);
+}
+
+TEST(CZYRRectTest, IntersectionAndTouch) {
+    CZYRRect r(0, 0, 10, 10);
+    r.intersectRect(CZYRRect(5, -5, 15, 8));
+    EXPECT_TRUE(is(r, 5, 0, 10, 8));
+    // Closed rectangles: a shared edge or corner, or containment, touches.
+    const CZYRRect unit(0, 0, 1, 1);
+    for (const CZYRRect& other : {CZYRRect(1, 0, 2, 1), CZYRRect(1, 1, 2, 2),
+                                  CZYRRect(0.25, 0.25, 0.5, 0.5), CZYRRect(-1, -1, 0, 0)})
+        EXPECT_TRUE(unit.touch(other) && other.touch(unit));
+    for (const CZYRRect& other : {CZYRRect(1.5, 0, 2, 1), CZYRRect(0, 1.001, 1, 2),
+                                  CZYRRect(-2, 0, -0.5, 1), CZYRRect(0, -2, 1, -0.5)})
+        EXPECT_FALSE(unit.touch(other) || other.touch(unit));
+    // Without area, an intersection collapses to zeros.
+    for (const CZYRRect& other :
+         {CZYRRect(1, 0, 2, 1), CZYRRect(0, 1, 1, 2), CZYRRect(5, 5, 6, 6)}) {
+        CZYRRect edge = unit;
+        edge.intersectRect(other);
+        EXPECT_TRUE(is(edge, 0, 0, 0, 0));
+    }
+}
+
+// ---- sampled functions ----------------------------------------------------------------------
+
+struct Collect : IEncodedDataCBProc {
+    bool encodedSample(int index, float value) override {
+        EXPECT_EQ(index, static_cast<int>(values.size()));
+        values.push_back(value);
+        return true;
+    }
+    std::vector<float> values;
+};
+
+std::vector<float> samples(std::vector<CZYRSampledFunc<float>::Point> points,
+                           sZYRRangeT<float> domain, sZYRRangeT<float> range, int n) {
+    CZYRSampledFunc<float> f(domain, range);
+    f.setPoints(points.data(), static_cast<unsigned int>(points.size()));
+    Collect out;
+    const auto eightBit = Caculate8BitEncodedSamples(CZYRSampledFunc<float>(f), n, out);
+    EXPECT_EQ(eightBit.min, 0.0f);
+    EXPECT_EQ(eightBit.max, 255.0f);
+    return out.values;
+}
+
+TEST(CZYRSampledFuncTest, ResamplingRules) {
+    using V = std::vector<float>;
+    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0, 1}, 3), (V{0.0f, 127.5f, 255.0f}));
+    // Points cover 0.25..0.75 of the domain: outside them the end values hold.
+    const V held = samples({{0.25f, 0.2f}, {0.5f, 0.6f}, {0.75f, 0.4f}}, {0, 1}, {0, 1}, 5);
+    const V heldWant{0.2f * 255, 0.2f * 255, 0.6f * 255, 0.4f * 255, 0.4f * 255};
+    ASSERT_EQ(held.size(), heldWant.size());
+    for (size_t i = 0; i < held.size(); ++i)
+        EXPECT_FLOAT_EQ(held[i], heldWant[i]) << i;
+    EXPECT_EQ(samples({{0, -1}, {1, 2}}, {0, 1}, {0, 1}, 2), (V{0, 255})) << "clamped";
+    EXPECT_EQ(samples({{0, 0.5f}, {1, 0.5f}}, {0, 1}, {0.25f, 0.75f}, 2), (V{127.5f, 127.5f}));
+    // A zero-width range is a step at its value.
+    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0.5f, 0.5f}, 5), (V{0, 0, 255, 255, 255}));
+    // Two points at the same x: left of it the first y, from it on the second.
+    EXPECT_EQ(samples({{0.5f, 0}, {0.5f, 1}}, {0, 1}, {0, 1}, 3), (V{0, 255, 255}));
+    EXPECT_TRUE(samples({{0, 0}, {1, 1}}, {0.25f, 1}, {0, 1}, 0).empty());
+    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0.25f, 1}, {0, 1}, 1), (V{0.25f * 255}));
+    // One point is not a function.
+    expectBadParam(
+        [] {
+            samples({{0, 0}}, {0, 1}, {0, 1}, 4);
+        },
+        "invalid index", "source/zyr/std/CZYRMemBuffer");
+}
+
+// ---- fixed point ----------------------------------------------------------------------------
+
+constexpr int32_t kMin = std::numeric_limits<int32_t>::min();
+constexpr int32_t kMax = std::numeric_limits<int32_t>::max();
+constexpr int32_t kOne = 0x00010000;
+constexpr int32_t kFrac = 0x40000000;
+
+using i128 = __int128;
+
+i128 floorDiv(i128 n, i128 d) {
+    const i128 q = n / d;
+    return (n % d != 0 && (n < 0) != (d < 0)) ? q - 1 : q;
+}
+
+// n / d to the nearest integer, halves away from zero.
+i128 nearest(i128 n, i128 d) {
+    if (d < 0) {
+        n = -n;
+        d = -d;
+    }
+    return n >= 0 ? floorDiv(2 * n + d, 2 * d) : -floorDiv(-2 * n + d, 2 * d);
+}
+
+int32_t clamp32(i128 v) {
+    return v > kMax ? kMax : v < kMin ? kMin : static_cast<int32_t>(v);
+}
+
+int32_t refFixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded) {
+    if (c == 0)
+        return ((a < 0) + (b < 0)) % 2 ? kMin : kMax;
+    return clamp32(rounded ? nearest(i128{a} * b, c) : i128{a} * b / c);
+}
+
+int32_t refPFloatToFixed(float x) {
+    if (std::isnan(x))
+        return 0;
+    const long double v = static_cast<long double>(x) * 65536.0L;
+    const long double r = v >= 0 ? std::floor(v + 0.5L) : -std::floor(-v + 0.5L);
+    return r >= 2147483647.0L ? kMax : r <= -2147483648.0L ? kMin : static_cast<int32_t>(r);
+}
+
+int32_t toFixed(float x) {
+    return PFloatToFixed(&x);
+}
+
+// Rows of {a, b, expected}.
+template <size_t N>
+void expectAll(const char* name, int32_t (*f)(int32_t, int32_t), const int32_t (&rows)[N][3]) {
+    for (const auto& r : rows)
+        EXPECT_EQ(f(r[0], r[1]), r[2]) << name << "(" << r[0] << ", " << r[1] << ")";
+}
+
+// Operands of every scale: full range, a random bit length, small values and the extremes.
+int32_t operand(std::mt19937_64& rng) {
+    static constexpr int32_t special[] = {
+        0,         1,          -1,         2,       3,         kOne,     -kOne,
+        kOne + 1,  3 * kOne,   -3 * kOne,  0x18000, kFrac,     -kFrac,   kFrac + 1,
+        kFrac - 1, 0x20000000, 0x1FFFFFFF, kMin,    kMax,      kMin + 1, kMax - 1,
+        0x7FFF,    0x8000,     -0x8000,    -0x8001, 0x7FFF0000};
+    const uint64_t r = rng();
+    const auto high = static_cast<int32_t>(r >> 32);
+    switch (r % 4) {
+    case 0:
+        return high;
+    case 1:
+        return high >> (r >> 3) % 32;
+    case 2:
+        return high >> 14;
+    default:
+        return special[(r >> 32) % std::size(special)];
+    }
+}
+
+// The random sweep below meets every pair of the special operands, the extremes among them;
+// these rows are the cases it cannot find: division by zero and products or quotients near a
+// half that a double would round the wrong way.
+TEST(ZYRFixedTest, ProductsAndQuotientsRoundAndSaturate) {
+    // clang-format off
+    const int32_t fracmulRows[][3] = {
+        {0x3172c8f0, 0x2a92a8b3, 551855119}, {-0x3172c8f0, 0x2a92a8b3, -551855119},
+    };
+    const int32_t tFixedDivRows[][3] = {{-5, 0, kMin}, {kMin, 0, kMin}, {0, 0, kMax}, {5, 0, kMax}};
+    const int32_t fixratioRows[][3] = {
+        {-5, 0, kMin}, {kMin, 0, kMin}, {0, 0, kMax}, {5, 0, kMax},
+        {0x57046cea, 0x72bbc2b1, 814358052},
+    };
+    // clang-format on
+    expectAll("fracmul", fracmul, fracmulRows);
+    expectAll("TFixedDiv", TFixedDiv, tFixedDivRows);
+    expectAll("fixratio", fixratio, fixratioRows);
+}
+
+TEST(ZYRFixedTest, FixedMulDivSignsRoundingAndOverflow) {
+    EXPECT_EQ(FixedMulDiv(0x40000000, 0x40000000, 0x40000000, false), 0x40000000);
+    // Rows of {a, b, c, rounded, expected}: halves, division by zero, the extremes;
+    // 65535 * 65537 / 2 is 2^31 - 0.5 (fits truncated, overflows once rounded), 641 * 6700417 / 2
+    // is 2^31 + 0.5.
+    // clang-format off
+    const int32_t rows[][5] = {
+        {7, 1, -2, 1, -4}, {-7, -1, -2, 0, -3}, {5, 1, 3, 1, 2}, {4, 1, 3, 1, 1},
+        {1, 1, 0, 0, kMax}, {-1, 1, 0, 1, kMin}, {-1, -1, 0, 0, kMax}, {0, 0, 0, 0, kMax},
+        {kMax, 1, 1, 0, kMax}, {0x40000000, 2, 1, 0, kMax}, {kMin, 1, 1, 0, kMin},
+        {kMin, -1, 1, 0, kMax}, {kMin, kMin, kMin, 0, kMin}, {65535, 65537, 2, 0, kMax},
+        {-65535, 65537, 2, 0, kMin + 1}, {-65535, 65537, 2, 1, kMin}, {-641, 6700417, 2, 0, kMin},
+        {641, 6700417, 2, 0, kMax},
+    };
+    // clang-format on
+    for (const auto& r : rows)
+        EXPECT_EQ(FixedMulDiv(r[0], r[1], r[2], r[3] != 0), r[4])
+            << r[0] << " * " << r[1] << " / " << r[2] << (r[3] ? " rounded" : "");
+}
+
+TEST(ZYRFixedTest, PFloatToFixedRoundsAndSaturates) {
+    const float half = 0.5f / 65536;
+    const float inf = std::numeric_limits<float>::infinity();
+    const struct {
+        float x;
+        int32_t want;
+    } cases[] = {
+        // clang-format off
+        {1.5f, 0x00018000}, {-0.5f, static_cast<int32_t>(0xFFFF8000)}, {-0.0f, 0},
+        {32768.0f, kMax}, {-32768.0f, kMin}, {1e10f, kMax}, {-1e10f, kMin},
+        {std::nextafter(32768.0f, 0.0f), 0x7FFFFF80}, {std::nextafter(-32768.0f, 0.0f), -0x7FFFFF80},
+        {std::nextafter(-32768.0f, -inf), kMin}, {half, 1}, {-half, -1},
+        {std::nextafter(half, 0.0f), 0}, {-std::nextafter(half, 0.0f), 0},
+        // 2^23 + 1 units is exact and must not round to an even neighbour.
+        {8388609.0f / 65536, 8388609}, {-8388609.0f / 65536, -8388609},
+        {inf, kMax}, {-inf, kMin}, {std::numeric_limits<float>::quiet_NaN(), 0},
+        // clang-format on
+    };
+    for (const auto& c : cases)
+        EXPECT_EQ(toFixed(c.x), c.want) << "PFloatToFixed(" << c.x << ")";
+}
+
+TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
+    std::mt19937_64 rng(20240611);
+    for (int i = 0; i < 1000000; ++i) {
+        const int32_t a = operand(rng), b = operand(rng), c = operand(rng);
+        const i128 p = i128{a} * b;
+        ASSERT_EQ(FixedMul(a, b), clamp32(nearest(p, 1 << 16))) << a << " * " << b;
+        ASSERT_EQ(fracmul(a, b), clamp32(nearest(p, 1 << 30))) << a << " * " << b;
+        if (b != 0) {
+            ASSERT_EQ(TFixedDiv(a, b), clamp32((i128{a} << 16) / b)) << a << " / " << b;
+            ASSERT_EQ(fixratio(a, b), clamp32(nearest(i128{a} << 30, b))) << a << " / " << b;
+        }
+        const bool rounded = (i & 1) != 0;
+        ASSERT_EQ(FixedMulDiv(a, b, c, rounded), refFixedMulDiv(a, b, c, rounded))
+            << a << " * " << b << " / " << c << (rounded ? " rounded" : "");
+
+        // Half arbitrary bit patterns (NaNs, infinities, subnormals), half ordinary values.
+        const uint64_t r = rng();
+        const float x = (i & 1) ? std::bit_cast<float>(static_cast<uint32_t>(r))
+                                : std::ldexp(static_cast<float>(static_cast<int32_t>(r >> 32)),
+                                             -16 - static_cast<int>(r % 40));
+        ASSERT_EQ(toFixed(x), refPFloatToFixed(x)) << "PFloatToFixed(" << x << ")";
+    }
+}
+
+} // namespace
