@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstring>
 #include <string>
+#include <type_traits>
 
 #include "zyr/std/config/ZYRStartupOptions.h"
 #include "zyr/std/core/ZYRThread.h"
@@ -56,231 +57,45 @@ inline std::string showValue(float v) {
 inline std::string showValue(const std::string& v) {
     return v;
 }
+template <class Enum>
+requires std::is_enum_v<Enum> std::string showValue(Enum v) {
+    return std::to_string(static_cast<int32_t>(v));
+}
+
+template <class Record> const Record& storedRecord();
+template <> inline const sMTOptions& storedRecord() {
+    return ZYRGetMTOptions();
+}
+template <> inline const sDLCacheOptions& storedRecord() {
+    return ZYRGetDLCacheOptions();
+}
+template <> inline const sMarkerOptions& storedRecord() {
+    return ZYRGetMarkerOptions();
+}
+template <> inline const sSLDLOptions& storedRecord() {
+    return ZYRGetSLDLOptions();
+}
 } // namespace detail
 
 // The four records' keys, then the store's, in the order the option tables list them.
 inline const sZYRStartupOptionKey kZYRStartupOptionKeys[] = {
-    // sMTOptions
-    {"NumMTRThreads", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMTOptions().numMTRThreads); }},
-    {"NumMTBThreads", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMTOptions().numMTBThreads); }},
-    {"MTRThreshold", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMTOptions().mtrThreshold); }},
-    {"MTRFallbackPerBand", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetMTOptions().mtrFallbackPerBand); }},
-    {"HasExternalCompositor", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetMTOptions().hasExternalCompositor); }},
-    // sDLCacheOptions
-    {"XObjDLCacheMaxRAM", eZYRStartupReading::kSpecial,
-     [] { return detail::showValue(ZYRGetDLCacheOptions().maxRAM); }},
-    {"XObjDLCacheMaxDisk", eZYRStartupReading::kSpecial,
-     [] { return detail::showValue(ZYRGetDLCacheOptions().maxDisk); }},
-    {"VDPThroughFlattener", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetDLCacheOptions().vdpThroughFlattener); }},
-    {"XObjDLSharedCache", eZYRStartupReading::kSpecial,
-     [] { return detail::showValue(ZYRGetDLCacheOptions().sharedCache); }},
-    {"MaxPatternCacheEntry", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetDLCacheOptions().maxPatternCacheEntry); }},
-    // sMarkerOptions
-    {"ImageMarkerType", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMarkerOptions().imageMarkerType); }},
-    {"ImageMarkerTiling", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMarkerOptions().imageMarkerTiling); }},
-    {"ImageMarkerFactorSourceStep", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetMarkerOptions().imageMarkerFactorSourceStep); }},
-    {"ImageMarkerFactorTiling", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMarkerOptions().imageMarkerFactorTiling); }},
-    {"MeshMarkerFactorD11", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetMarkerOptions().meshMarkerFactorD11); }},
-    {"MeshMarkerFactorD18", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetMarkerOptions().meshMarkerFactorD18); }},
-    {"MeshMarkerFactorD48", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetMarkerOptions().meshMarkerFactorD48); }},
-    {"SSE2", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMarkerOptions().sse2); }},
-    {"UseNewImageMarker", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMarkerOptions().useNewImageMarker); }},
-    {"OverScanIdntImageMaskMarking", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetMarkerOptions().overScanIdntImageMaskMarking); }},
-    // sSLDLOptions
-    {"SLCompression", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetSLDLOptions().slCompression); }},
-    {"SLCompressionRatio", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetSLDLOptions().slCompressionRatio); }},
-    {"SL0CompressionRatio", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetSLDLOptions().sl0CompressionRatio); }},
-    // the store
-    {"UseNullGraphics", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRUseNullGraphics()); }},
-    {"MaxCacheShades", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRMaxCacheShades()); }},
-    {"RasterizeTilingPattern", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRRasterizeTilingPattern()); }},
-    {"TileSuperCell", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRTileSuperCell()); }},
-    {"OptimizePortPipeLine", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetOptimizePortPipeLineOption()); }},
-    {"RenderAllInterpretedSurfaces", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetRenderAllInterpretedSurfacesOption()); }},
-    {"SingleThreadProcess", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRSingleThreadProcess()); }},
-    {"SurfaceOverLap", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRSurfaceOverlap()); }},
-    {"XPVDPCacheOverlapThreshold", eZYRStartupReading::kUnsigned,
-     [] { return detail::showValue(ZYRGetXPVDPCacheOverlapThreshold()); }},
-    {"XPVDPOptimizeFlattening", eZYRStartupReading::kSpecial,
-     [] { return detail::showValue(ZYRGetXPVDPExperimentalOption()); }},
-    {"AdjustImageNearCopydot", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetAdjustImageNearCopydot()); }},
-    {"DisableAxialShadeOptimization", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRAxialShadeOptimizationDisabled()); }},
-    {"SplitShadeWithAbruptColorChange", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRSplitShadeWithAbruptColorChange()); }},
-    {"SplitShadeAbruptChangeThreshold", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRSplitShadeAbruptChangeThreshold()); }},
-    {"ClipsubPathStackSizeThreshold", eZYRStartupReading::kUnsigned,
-     [] { return detail::showValue(ZYRGetClipsubPathStackSizeThreshold()); }},
-    {"CopyDotMethod", eZYRStartupReading::kWord,
-     [] { return detail::showValue(ZYRGetCopyDotApproach()); }},
-    {"EnableBPCbyObjectType", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYREnableBPCbyObjectType()); }},
-    {"EnableExternalDLCachePurge", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYREnableExternalDLCachePurge()); }},
-    {"EnableXObjDLCachePurge", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYREnableXObjDLCachePurge()); }},
-    {"EnableXPVDPDLCachePurge", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYREnableXPVDPDLCachePurge()); }},
-    {"GRMemoryThreshold", eZYRStartupReading::kUnsigned,
-     [] { return detail::showValue(ZYRGetGRMemoryThreshold()); }},
-    {"GRPMThreshold", eZYRStartupReading::kUnsigned,
-     [] { return detail::showValue(ZYRGetGRPMThreshold()); }},
-    {"GRFLThreshold", eZYRStartupReading::kUnsigned,
-     [] { return detail::showValue(ZYRGetGRFLThreshold()); }},
-    {"GROption", eZYRStartupReading::kWord,
-     [] { return detail::showValue(static_cast<int32_t>(ZYRGetGROption())); }},
-    {"AutomaticGlobalRasterizationOption", eZYRStartupReading::kWord, nullptr},
-    {"UseFasterOpaqueMarking", eZYRStartupReading::kSpecial,
-     [] { return detail::showValue(ZYRGetUseFasterOpaqueMarking()); }},
-    {"ConvertComplexPatternToImage", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetConvertComplexPatternToImage()); }},
-    {"DontCopyDevImage", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetDontCopyDevImage()); }},
-    {"UsePathCache", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetUsePathCache()); }},
-    {"UseInPlaceComposition", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetUseInPlaceComposition()); }},
-    {"GRSAOCTilingPattern", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGRSAOCTilingPattern()); }},
-    {"GRCacheOpaqueTilingPattern", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGRCacheOpaqueTilingPattern()); }},
-    {"DisableOPInMarker", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRIsDisableOPInMarker()); }},
-    {"UseFasterTransparencyTilingPattern", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetUseFasterXPTilingPattern()); }},
-    {"UseOldHOVReducer", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetUseOldHOVReducer()); }},
-    {"MaxGlyphCache", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMaxGlyphCache()); }},
-    {"MaxGraphPathCache", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetMaxGraphPathCache()); }},
-    {"OptimizeArtworkTree", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetOptimizeArtworkTree()); }},
-    {"UseNew1pxImageMaskHandler", eZYRStartupReading::kSpecial, nullptr},
-    {"OverscanImageMasksThreshold", eZYRStartupReading::kUnsigned,
-     [] { return detail::showValue(ZYRGetOverscanImageMasksThreshold()); }},
-    {"PDFGCPageInterval", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetPDFGCPageInterval()); }},
-    {"PDFGCMemoryThreshold", eZYRStartupReading::kInt,
-     [] { return detail::showValue(ZYRGetPDFGCMemoryThreshold()); }},
-    {"PDFGCInterpreterThreadMemoryThreshold", eZYRStartupReading::kInt64,
-     [] { return detail::showValue(ZYRGetPDFGCInterpreterThreadMemoryThreshold()); }},
-    {"PDFGCMainThreadMemoryThreshold", eZYRStartupReading::kInt64,
-     [] { return detail::showValue(ZYRGetPDFGCMainThreadMemoryThreshold()); }},
-    {"PathWidthAdjustment", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetPathWidthAdjustment()); }},
-    {"SubPathSizeThreshold", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetSubPathSizeThreshold()); }},
-    {"AdjustPathWidthInsideTilingPattern", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRAdjustPathWidthInsideTilingPattern()); }},
-    {"DiscardEmptyPathAfterAdjustment", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRDiscardEmptyPathAfterAdjustment()); }},
-    {"ReplaceSourceColorPrecision", eZYRStartupReading::kHighLow,
-     [] { return detail::showValue(ZYRGetReplaceSourceColorPrecision()); }},
-    {"ShiftImageMaskDeviceDelta", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetShiftImageMaskDeviceDelta()); }},
-    {"ShipXPImageSlicesInOrder", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRShipXPImageSlicesInOrder()); }},
-    {"TrapPixelOverlap", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRGetTrapPixelOverlap()); }},
-    {"TrappingLibraryPath", eZYRStartupReading::kText,
-     [] { return detail::showValue(ZYRGetTrappingLibraryPath()); }},
-    {"UseNewTrapReducer", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRUseNewTrapReducer()); }},
-    {"XObjDLCachePurgeChild", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRXObjDLCachePurgeChild()); }},
-    {"XObjDLCachePurgePercentage", eZYRStartupReading::kFloat,
-     [] { return detail::showValue(ZYRXObjDLCachePurgePercentage()); }},
-    {"DisableXPImageDLOptimization", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRXPImageDLOptimizationDisabled()); }},
-    {"EmitIMG_META", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYREmitIMG_META()); }},
-    {"AtomicRegionDirectCMYKOption", eZYRStartupReading::kInt,
-     [] { return detail::showValue(static_cast<int32_t>(ZYRAtomicRegionDirectCMYKOption())); }},
-    {"ThreadPriority", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRThreadPriority()); }},
-    {"UseNullXPDevice", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRUseNullXPDevice()); }},
-    {"UseNullXPImage", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRUseNullXPImage()); }},
-    {"XPShadeCache", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRXPShadeCache()); }},
-    {"RasterizeAllTransparencyShades", eZYRStartupReading::kBool,
-     [] { return detail::showValue(ZYRGetRasterizeAllTransparencyShades()); }},
-    {"MaxMemLimit", eZYRStartupReading::kSpecial, nullptr},
-    {"TestAvailablePhysicalMemory", eZYRStartupReading::kSpecial, nullptr},
-    {"BreakOnAllocationCount", eZYRStartupReading::kSpecial, nullptr},
+#define ZYR_RECORD_KEY(record, key, field, reading, rule, value)                                   \
+    {key, eZYRStartupReading::reading,                                                             \
+     [] { return detail::showValue(detail::storedRecord<record>().field); }},
+#define ZYR_STORE_KEY(setter, key, field, type, value, reading, rule, getter)                      \
+    {key, eZYRStartupReading::reading, [] { return detail::showValue(getter()); }},
+#define ZYR_OWN_KEY(setter, key, rule, reading, getter)                                            \
+    {key, eZYRStartupReading::reading, [] { return detail::showValue(getter()); }},
+#define ZYR_ACTION_KEY(setter, key, rule, reading) {key, eZYRStartupReading::reading, nullptr},
+#include "zyr/std/config/internal/ZYRStartupOptions.def"
 };
 
 using tZYRStartupKeySetter = void (*)(const char* key, const char* value);
 
 // Every key setter of the store; each ignores the keys of the others.
 inline constexpr tZYRStartupKeySetter kZYRStartupKeySetters[] = {
-    ZYRGraphicsOptions,
-    ZYRMaxCacheShadesOption,
-    ZYRParseOptimizePortPipeLineOption,
-    ZYRParseRenderAllInterpretedSurfacesOption,
-    ZYRParseSingleThreadOptions,
-    ZYRParseSurfaceOverlapOptions,
-    ZYRParseXPVDPCacheOverlapThreshold,
-    ZYRSetAdjustImageNearCopydot,
-    ZYRSetAxialShadeOptimizationOption,
-    ZYRSetClipsubPathStackSizeParameters,
-    ZYRSetCopyDotApproach,
-    ZYRSetEnableBPCbyObjectType,
-    ZYRSetEnableExternalDLCachePurge,
-    ZYRSetEnableXObjDLCachePurge,
-    ZYRSetEnableXPVDPDLCachePurge,
-    ZYRSetGRParams,
-    ZYRSetMaxGlyphCache,
-    ZYRSetOptimizeArtworkTree,
-    ZYRSetOverscanImageMasksParameters,
-    ZYRSetPDFGCPageInterval,
-    ZYRSetPathWidthAdjustment,
-    ZYRSetReplaceSourceColorPrecision,
-    ZYRSetShiftImageMaskDeviceDelta,
-    ZYRSetShipXPImageSlicesInOrder,
-    ZYRSetTrapPixelOverlap,
-    ZYRSetTrappingLibraryPath,
-    ZYRSetUseNewTrapReducer,
-    ZYRSetXObjDLCachePurgeChild,
-    ZYRSetXObjDLCachePurgePercentage,
-    ZYRSetXPImageDLOptimization,
-    ZYRThreadPriorityOptons,
-    ZYRXPDeviceOptions,
-    ZYRXPImageOptions,
-    ZYRXPShadeCacheOptions,
-    ZYRParseMemoryOptions,
+#define ZYR_KEY_SETTER(setter) setter,
+#include "zyr/std/config/internal/ZYRStartupOptions.def"
 };
 
 // True for a key that some setter or record parser acts on.
