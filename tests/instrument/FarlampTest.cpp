@@ -2,7 +2,6 @@
 // arguments for every group, document facts, errors, events, surfaces and the session folder.
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -47,15 +46,29 @@ Calls operator+(Calls first, const Calls& second) {
 
 std::u16string drainErrorStack() {
     std::u16string text;
-    CZYRErrorStk stack;
-    return stack.getErrorMessage(text) ? text : u"";
+    return CZYRErrorStk().getErrorMessage(text) ? text : u"";
+}
+
+// An enabled record of group `group` with the given key and value pairs.
+void setPairs(CZYRAnalyticsData&) {}
+template <class Value, class... Rest>
+void setPairs(CZYRAnalyticsData& r, const char* key, Value value, Rest... rest) {
+    r.set(CZYRUniString(key), value);
+    setPairs(r, rest...);
+}
+template <class... Pairs> CZYRAnalyticsData record(const char* group, Pairs... pairs) {
+    ZYRSetAnalyticsActive(true);
+    CZYRAnalyticsData r;
+    if (group)
+        r.set(CZYRUniString("DataGroupName"), CZYRUniString(group));
+    setPairs(r, pairs...);
+    return r;
 }
 
 class FarlampTest : public ::testing::Test {
 protected:
     void SetUp() override {
         recorder.refuseSessions(false);
-        recorder.setDelay(0);
         drainErrorStack();
     }
     void TearDown() override {
@@ -63,29 +76,11 @@ protected:
         ZYRSetAnalyticsActive(false);
         (void)recorder.take();
     }
-
     // An active session in a fresh folder, with the start-up calls taken.
     void start() {
-        const std::u16string folder = wide(dir.path());
-        ASSERT_TRUE(Farlamp::StartSession(true, folder.c_str()));
+        ASSERT_TRUE(Farlamp::StartSession(true, wide(dir.path()).c_str()));
         ASSERT_TRUE(Farlamp::LoggingEnabled());
         (void)recorder.take();
-    }
-
-    // An enabled record of group `group` with the given key and value pairs.
-    template <class... Pairs> static CZYRAnalyticsData record(const char* group, Pairs... pairs) {
-        ZYRSetAnalyticsActive(true);
-        CZYRAnalyticsData r;
-        if (group)
-            r.set(CZYRUniString("DataGroupName"), CZYRUniString(group));
-        setPairs(r, pairs...);
-        return r;
-    }
-    static void setPairs(CZYRAnalyticsData&) {}
-    template <class Value, class... Rest>
-    static void setPairs(CZYRAnalyticsData& r, const char* key, Value value, Rest... rest) {
-        r.set(CZYRUniString(key), value);
-        setPairs(r, rest...);
     }
 
     RecordingKelvrin& recorder = RecordingKelvrin::get();
@@ -97,41 +92,49 @@ protected:
 TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
     // A missing folder is created and probed; the probe file does not stay.
     const std::string fresh = dir.file("logs");
-    const std::u16string freshWide = wide(fresh);
-    ASSERT_TRUE(Farlamp::StartSession(true, freshWide.c_str()));
+    ASSERT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str()));
     EXPECT_TRUE(std::filesystem::is_directory(fresh));
     EXPECT_FALSE(std::filesystem::exists(fresh + "/test.txt"));
-    const Calls started = {"UTInitialize(ZYRStd,0,<null>)", "UTSetOptIn(1)",
-                           "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,," + fresh + ")"};
-    EXPECT_EQ(recorder.take(), started);
-    EXPECT_TRUE(Farlamp::StartSession(true, freshWide.c_str())) << "a second start keeps it";
+    EXPECT_EQ(recorder.take(), (Calls{"UTInitialize(ZYRStd,0,<null>)", "UTSetOptIn(1)",
+                                      "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,," + fresh + ")"}));
+    EXPECT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str())) << "a second start keeps it";
     EXPECT_EQ(recorder.take(), Calls{});
     EXPECT_EQ(drainErrorStack(), u"");
-    Farlamp::CloseSession();
-    (void)recorder.take();
 
-    // A folder that cannot be made (under a plain file) falls back, with a report.
+    // A folder that cannot be made (under a plain file), or a plain file: the default folder,
+    // with a report; an empty folder name: the default folder.
     zyrtest::writeFile(dir.file("plain"), "x");
-    const std::u16string blocked = wide(dir.file("plain") + "/logs");
-    ASSERT_TRUE(Farlamp::StartSession(true, blocked.c_str()));
-    EXPECT_EQ(recorder.take().back(), "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,,./AnalyticsLogs)");
-    EXPECT_EQ(drainErrorStack(), u" Default directory was used to store analytics logs \n");
-    Farlamp::CloseSession();
+    const std::string kDefault = "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,,./AnalyticsLogs)";
+    for (const std::string& folder :
+         {dir.file("plain") + "/logs", dir.file("plain"), std::string()}) {
+        Farlamp::CloseSession();
+        (void)recorder.take();
+        ASSERT_TRUE(Farlamp::StartSession(true, wide(folder).c_str()));
+        EXPECT_EQ(recorder.take().back(), kDefault) << folder;
+        EXPECT_EQ(drainErrorStack(),
+                  folder.empty() ? u"" : u" Default directory was used to store analytics logs \n");
+    }
 
     // An inactive session goes to the default folder, with logging off.
+    Farlamp::CloseSession();
     (void)recorder.take();
-    ASSERT_TRUE(Farlamp::StartSession(false, freshWide.c_str()));
+    ASSERT_TRUE(Farlamp::StartSession(false, wide(fresh).c_str()));
     EXPECT_FALSE(Farlamp::LoggingEnabled());
-    EXPECT_EQ(recorder.take().back(), "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,,./AnalyticsLogs)");
+    EXPECT_EQ(recorder.take(), (Calls{"UTInitialize(ZYRStd,0,<null>)", "UTSetOptIn(0)", kDefault}));
     Farlamp::LogDataObject(record("DripSessionInfo"));
     Farlamp::LogZYRError(kZYRErrorBadParam, "Area", "f.cpp");
+    Farlamp::LogDict(CZYRDict());
+    Farlamp::LogEventNow(kZYRAnalyticsEventGlobalRasterization);
+    Farlamp::UpdateCurrentSurfaceInfo(1, 1, 1);
+    Farlamp::LogSurfaceDataGroup();
+    Farlamp::FlushJob(1);
     EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventGlobalRasterization, false), 0u);
     Farlamp::CloseSession();
     EXPECT_EQ(recorder.take(), Calls{"UTCloseSession()"}) << "nothing logged while off";
 
     // A library that refuses the session: no session, logging off.
     recorder.refuseSessions(true);
-    EXPECT_FALSE(Farlamp::StartSession(true, freshWide.c_str()));
+    EXPECT_FALSE(Farlamp::StartSession(true, wide(fresh).c_str()));
     EXPECT_FALSE(Farlamp::LoggingEnabled());
 }
 
@@ -156,26 +159,26 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
     Farlamp::LogDataObject(raster);
     const auto dl = record("DLCacheInfo", "NumLargeDLs", 1u);
     Farlamp::LogDataObject(dl);
-
     // Records without a known group name are not logged.
     Farlamp::LogDataObject(record("NoSuchGroup"));
     Farlamp::LogDataObject(record(nullptr));
     Farlamp::LogDataObject(C_SmartPtr<I_AnalyticsData>());
-
-    const Calls expected =
-        group(100, "ProductInfo",
-              {"OEMName,Acme", "OEMModelName,P1", "NumDevices,2", "InstanceMode,Single",
-               "xobjMode,2"}) +
-        group(101, "FontInfo",
-              {"NumSubstFont,3", "PreferredFont,ERROR : PreferredFont Not Found",
-               "UseDefaultFont,1", "UseFontEmulation,-1"}) +
-        group(102, "DripSessionInfo", {"NumWorkers,4", "WorkerCrashedCount,0"}) +
-        group(103, "dripCntrlJobInfo", {"JobStatus,Done", "JobCompleteTime,2.5", "NumSurfaces,9"}) +
-        group(104, "ErrorInfo", {"Area,PDF", "Type,kZYRErrorPDF", "Parameter1,page 3"}) +
-        group(105, "JobInfo", {"SurfaceCount,2", "TotalMediaSize,1.5", "ErrorOccured,n\xc3\xa9"}) +
-        // The cache groups add to the job's group.
-        group(105, nullptr, {"NumSmallRasters,5", "RasterDiskCachingEnabled,0", "NumLargeDLs,1"});
-    EXPECT_EQ(recorder.take(), expected);
+    EXPECT_EQ(recorder.take(),
+              group(100, "ProductInfo",
+                    {"OEMName,Acme", "OEMModelName,P1", "NumDevices,2", "InstanceMode,Single",
+                     "xobjMode,2"}) +
+                  group(101, "FontInfo",
+                        {"NumSubstFont,3", "PreferredFont,ERROR : PreferredFont Not Found",
+                         "UseDefaultFont,1", "UseFontEmulation,-1"}) +
+                  group(102, "DripSessionInfo", {"NumWorkers,4", "WorkerCrashedCount,0"}) +
+                  group(103, "dripCntrlJobInfo",
+                        {"JobStatus,Done", "JobCompleteTime,2.5", "NumSurfaces,9"}) +
+                  group(104, "ErrorInfo", {"Area,PDF", "Type,kZYRErrorPDF", "Parameter1,page 3"}) +
+                  group(105, "JobInfo",
+                        {"SurfaceCount,2", "TotalMediaSize,1.5", "ErrorOccured,n\xc3\xa9"}) +
+                  // The cache groups add to the job's group.
+                  group(105, nullptr,
+                        {"NumSmallRasters,5", "RasterDiskCachingEnabled,0", "NumLargeDLs,1"}));
 
     // The job's start time gives its completion time; the next job gets a new group.
     Farlamp::LogEvent(kZYRAnalyticsEventHasTransparency, false);
@@ -184,14 +187,12 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
               group(105, nullptr, {"CompletionTime,2.35", "HasTrapping,0", "HasTransparency,1"}));
     Farlamp::LogDataObject(job);
     EXPECT_EQ(recorder.take().front(), "UTNewDataGroup(JobInfo,,JobInfo)=106");
-
     // A product mode other than 0 and 2 keeps the cache groups out.
     Farlamp::LogDataObject(record("ProductInfo", "xobjMode", 1u));
     Farlamp::LogDataObject(raster);
     Farlamp::LogDataObject(dl);
     EXPECT_EQ(recorder.take(), group(100, nullptr, {"xobjMode,1"}))
         << "the product group is reused";
-
     // The product group exists, so closing adds no placeholder.
     Farlamp::CloseSession();
     EXPECT_EQ(recorder.take(), Calls{"UTCloseSession()"});
@@ -209,37 +210,44 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
     info.set(CZYRUniString("SecurityType"), 0u);
     info.set(CZYRUniString("NumPages"), 12u);
     Farlamp::LogDict(info);
-    const Calls facts = group(100, "PDFInfo",
-                              {"PDFVersion,1.7", "PDFX,1", "creatorApp,Writer", "PreTrapped,False",
-                               "HasPassword,0", "NumPages,12"});
-    EXPECT_EQ(recorder.take(), facts);
+    EXPECT_EQ(recorder.take(), group(100, "PDFInfo",
+                                     {"PDFVersion,1.7", "PDFX,1", "creatorApp,Writer",
+                                      "PreTrapped,False", "HasPassword,0", "NumPages,12"}));
+    info.remove(CZYRUniString("PDFMinorVersion"));
+    Farlamp::LogDict(info);
+    EXPECT_EQ(recorder.take()[1], "UTAddToGroup(101,PDFX,1)") << "no version without both parts";
     info.set(CZYRUniString("DataGroupName"), CZYRUniString("Other"));
     Farlamp::LogDict(info);
     EXPECT_EQ(recorder.take(), Calls{});
 
     Farlamp::LogZYRError(kZYRErrorBadParam, "Streams", "source/zyr/std\\deep/CZYRDict.cpp");
     Farlamp::LogZYRError(kZYRErrorFatal, "Init", "plain.cpp");
-    const Calls errors = group(101, "ErrorInfo",
-                               {"Area,Streams", "Type,kZYRErrorBadParam", "Parameter1,CZYRDict.cpp",
-                                "Parameter2,", "Parameter3,", "Fatal,0"}) +
-                         group(102, "ErrorInfo",
-                               {"Area,Init", "Type,kZYRErrorFatal", "Parameter1,plain.cpp",
-                                "Parameter2,", "Parameter3,", "Fatal,1"});
-    EXPECT_EQ(recorder.take(), errors);
+    EXPECT_EQ(recorder.take(),
+              group(102, "ErrorInfo",
+                    {"Area,Streams", "Type,kZYRErrorBadParam", "Parameter1,CZYRDict.cpp",
+                     "Parameter2,", "Parameter3,", "Fatal,0"}) +
+                  group(103, "ErrorInfo",
+                        {"Area,Init", "Type,kZYRErrorFatal", "Parameter1,plain.cpp", "Parameter2,",
+                         "Parameter3,", "Fatal,1"}));
     EXPECT_EQ(drainErrorStack(), u"");
-
-    // A type without a name is reported on the error stack.
-    Farlamp::LogZYRError(static_cast<eZYRErrorType>(2), "Area", nullptr);
-    EXPECT_EQ(drainErrorStack(), u" Error code not updated in Analytics \n");
-    EXPECT_EQ(recorder.take()[2], "UTAddToGroup(103,Type,2)");
+    Farlamp::LogZYRError(static_cast<eZYRErrorType>(35), nullptr, nullptr);
+    EXPECT_EQ(recorder.take()[2], "UTAddToGroup(104,Type,kZYRErrorModuleNotInitialized)");
+    EXPECT_EQ(drainErrorStack(), u"");
+    // A type without a name is reported on the error stack and logged as its number.
+    int id = 105;
+    for (const int type : {2, 36}) {
+        Farlamp::LogZYRError(static_cast<eZYRErrorType>(type), "Area", nullptr);
+        EXPECT_EQ(drainErrorStack(), u" Error code not updated in Analytics \n");
+        EXPECT_EQ(recorder.take()[2],
+                  "UTAddToGroup(" + std::to_string(id++) + ",Type," + std::to_string(type) + ")");
+    }
 
     // Never created, the product group gets placeholders when the session closes.
     Farlamp::CloseSession();
-    const Calls closing = group(104, "ProductInfo",
-                                {"OEMName,NoData", "OEMModelName,NoData", "NumDevices,NoData",
-                                 "InstanceMode,NoData"}) +
-                          Calls{"UTCloseSession()"};
-    EXPECT_EQ(recorder.take(), closing);
+    EXPECT_EQ(recorder.take(), group(107, "ProductInfo",
+                                     {"OEMName,NoData", "OEMModelName,NoData", "NumDevices,NoData",
+                                      "InstanceMode,NoData"}) +
+                                   Calls{"UTCloseSession()"});
 }
 
 TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
@@ -247,17 +255,21 @@ TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
     EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false), 1u);
     EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false), 2u);
     EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, true), 2u) << "peek";
-    Farlamp::LogEvent(kZYRAnalyticsEventCachePlacedObject, false); // no gate: not logged
-    Farlamp::LogEvent(kZYRAnalyticsEventEnableCutContourProcessing, false);
-    Farlamp::LogEvent(kZYRAnalyticsEventCutContourProcessed, false); // opens event 1
-    Farlamp::LogEvent(kZYRAnalyticsEventHasTrapping, false);         // counted only
-    Farlamp::LogEvent(kZYRAnalyticsEventZYREnableMTR, false);
+    for (const auto type :
+         {kZYRAnalyticsEventCachePlacedObject, // without its gate: not logged
+          kZYRAnalyticsEventEnableCutContourProcessing, kZYRAnalyticsEventCutContourProcessed,
+          kZYRAnalyticsEventHasTrapping, // counted only
+          kZYRAnalyticsEventEnableLowResRasterization, kZYRAnalyticsEventZYREnableMTR})
+        Farlamp::LogEvent(type, false);
+    EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(13), false), 0u);
+    EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(-1), false), 0u);
     EXPECT_EQ(recorder.take(), Calls{}) << "counting logs nothing";
-
     Farlamp::LogEvent(kZYRAnalyticsEventAll, false);
-    const Calls logged = {"UTLogEvent(Job,,EnableCutContourProcessing,0)",
-                          "UTLogEvent(Job,,TextAntiAliasing,0)", "UTLogEvent(Job,,ZYREnableMTR,0)"};
-    EXPECT_EQ(recorder.take(), logged) << "each counted event once, in type order";
+    EXPECT_EQ(recorder.take(),
+              (Calls{"UTLogEvent(Job,,EnableCutContourProcessing,0)",
+                     "UTLogEvent(Job,,EnableLowResRasterization,0)",
+                     "UTLogEvent(Job,,TextAntiAliasing,0)", "UTLogEvent(Job,,ZYREnableMTR,0)"}))
+        << "each counted event once, in type order";
     for (int type = 0; type < kZYRAnalyticsEventAll; ++type)
         EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(type), true), 0u)
             << "counter " << type << " is reset";
@@ -265,21 +277,25 @@ TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
     Farlamp::LogEvent(kZYRAnalyticsEventPlacedObjectCached, false);
     Farlamp::LogEvent(kZYRAnalyticsEventCachePlacedObject, false);
     Farlamp::LogEventNow(kZYRAnalyticsEventGlobalRasterization);
+    Farlamp::LogEventNow(kZYRAnalyticsEventZYREnableMTR);
     Farlamp::LogEventNow(kZYRAnalyticsEventHasTrapping); // has no event name
-    EXPECT_EQ(recorder.take(), Calls{"UTLogEvent(Job,,GlobalRasterization,0)"});
+    Farlamp::LogEventNow(static_cast<eZYRAnalyticsEventType>(-1));
+    EXPECT_EQ(recorder.take(),
+              (Calls{"UTLogEvent(Job,,GlobalRasterization,0)", "UTLogEvent(Job,,ZYREnableMTR,0)"}));
     Farlamp::FlushJob(1.0); // no job group: only the events
     EXPECT_EQ(recorder.take(), Calls{"UTLogEvent(Job,,CachePlacedObject,0)"});
 }
 
 TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
     start();
-    for (int i = 0; i < 3; ++i) {
-        Farlamp::UpdateCurrentSurfaceInfo(2480, 3508, 4);
+    const auto surface = [](double w, double h, unsigned int placed) {
+        Farlamp::UpdateCurrentSurfaceInfo(w, h, placed);
         Farlamp::LogSurfaceDataGroup();
-    }
+    };
+    for (int i = 0; i < 3; ++i)
+        surface(2480, 3508, 4);
     EXPECT_EQ(recorder.take(), Calls{}) << "the run is still open";
-    Farlamp::UpdateCurrentSurfaceInfo(1000.9, 500, 0);
-    Farlamp::LogSurfaceDataGroup();
+    surface(1000.9, 500, 0);
     EXPECT_EQ(recorder.take(),
               group(100, "SurfaceInfo",
                     {"Surface Resolution,2480X3508", "Placed Objects,4", "count,3"}, "Surface"));
@@ -289,10 +305,8 @@ TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
                     {"Surface Resolution,1000X500", "Placed Objects,0", "count,1"}, "Surface"));
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take(), Calls{}) << "a flushed run is not logged again";
-
     // Extents beyond the printed range are clamped rather than converted.
-    Farlamp::UpdateCurrentSurfaceInfo(1e300, -1e300, 1);
-    Farlamp::LogSurfaceDataGroup();
+    surface(1e300, -1e300, 1);
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take().at(1), "UTAddToGroup(102,Surface Resolution,2147483647X-2147483648)");
 }
@@ -306,8 +320,7 @@ TEST(FarlampLibraryTest, IncompleteLibraryLeavesTheLoggerIdle) {
             if (!dlopen(ZYRSTD_INCOMPLETE_KELVRIN, RTLD_NOW | RTLD_GLOBAL))
                 std::_Exit(2);
             zyrtest::TempDir dir;
-            const std::u16string folder = wide(dir.path());
-            const bool started = Farlamp::StartSession(true, folder.c_str());
+            const bool started = Farlamp::StartSession(true, wide(dir.path()).c_str());
             const bool idle = !started && !Farlamp::LoggingEnabled() &&
                               Farlamp::LogEvent(kZYRAnalyticsEventGlobalRasterization, false) == 0;
             Farlamp::CloseSession();

@@ -20,50 +20,41 @@
 #include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
 
 using namespace ZYRStd;
-using nlohmann::json;
+using Lines = std::vector<std::string>;
 
 namespace {
 
-std::vector<std::filesystem::path> sessionFiles(const std::string& folder) {
-    std::vector<std::filesystem::path> files;
-    if (std::filesystem::exists(folder))
-        for (const auto& entry : std::filesystem::directory_iterator(folder))
-            if (entry.path().extension() == ".jsonl")
-                files.push_back(entry.path());
-    return files;
-}
-
-std::vector<json> readLines(const std::filesystem::path& file) {
-    std::vector<json> lines;
-    std::ifstream in(file);
-    for (std::string line; std::getline(in, line);)
-        lines.push_back(json::parse(line));
-    return lines;
-}
-
-// The library loaded by path, as a host would see it.
-struct Library {
-    Library() : handle(dlopen(ZYRSTD_KELVRIN, RTLD_NOW | RTLD_LOCAL)) {}
-    ~Library() {
-        if (handle)
-            dlclose(handle);
+// The session files of `folder`, each as its lines without their times.
+std::vector<Lines> sessions(const std::string& folder) {
+    std::vector<Lines> out;
+    for (const auto& entry : std::filesystem::directory_iterator(folder)) {
+        if (entry.path().extension() != ".jsonl")
+            continue;
+        out.emplace_back();
+        std::ifstream in(entry.path());
+        for (std::string line; std::getline(in, line);) {
+            nlohmann::json object = nlohmann::json::parse(line);
+            EXPECT_TRUE(object["time"].is_number()) << line;
+            object.erase("time");
+            out.back().push_back(object.dump());
+        }
     }
-    template <class F> F get(const char* name) { return reinterpret_cast<F>(dlsym(handle, name)); }
-    void* handle;
-};
+    return out;
+}
 
 } // namespace
 
 TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
-    Library lib;
-    ASSERT_NE(lib.handle, nullptr) << dlerror();
-    auto setOptIn = lib.get<UTSetOptInProc>("UTSetOptIn");
-    auto start = lib.get<UTStartSessionProc>("UTStartSession");
-    auto addToSession = lib.get<UTAddToSessionProc>("UTAddToSession");
-    auto newGroup = lib.get<UTNewDataGroupProc>("UTNewDataGroup");
-    auto addToGroup = lib.get<UTAddToGroupProc>("UTAddToGroup");
-    auto logEvent = lib.get<UTLogEventProc>("UTLogEvent");
-    auto close = lib.get<UTCloseSessionProc>("UTCloseSession");
+    void* const lib = dlopen(ZYRSTD_KELVRIN, RTLD_NOW | RTLD_LOCAL);
+    ASSERT_NE(lib, nullptr) << dlerror();
+    const auto get = [&](const char* name) { return dlsym(lib, name); };
+    const auto setOptIn = reinterpret_cast<UTSetOptInProc>(get("UTSetOptIn"));
+    const auto start = reinterpret_cast<UTStartSessionProc>(get("UTStartSession"));
+    const auto addToSession = reinterpret_cast<UTAddToSessionProc>(get("UTAddToSession"));
+    const auto newGroup = reinterpret_cast<UTNewDataGroupProc>(get("UTNewDataGroup"));
+    const auto addToGroup = reinterpret_cast<UTAddToGroupProc>(get("UTAddToGroup"));
+    const auto logEvent = reinterpret_cast<UTLogEventProc>(get("UTLogEvent"));
+    const auto close = reinterpret_cast<UTCloseSessionProc>(get("UTCloseSession"));
     ASSERT_TRUE(setOptIn && start && addToSession && newGroup && addToGroup && logEvent && close);
     zyrtest::TempDir dir;
     const std::string folder = dir.file("deep/logs");
@@ -78,45 +69,38 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     EXPECT_EQ(group, 0);
     close(session);
     EXPECT_EQ(session, nullptr);
-    EXPECT_TRUE(sessionFiles(folder).empty());
+    EXPECT_FALSE(std::filesystem::exists(folder));
 
     setOptIn(1);
     start(session, "Print", "P", "1.2.3.4", "1.2", nullptr, folder.c_str());
     ASSERT_NE(session, nullptr);
     addToSession(session, "host", "h1");
     newGroup(session, "JobInfo", "", "JobInfo", group, nullptr, 0);
-    EXPECT_EQ(group, 0);
-    addToGroup(session, group, "Quote\"\n", "caf\xc3\xa9");
+    newGroup(session, "Second", nullptr, "S", group, nullptr, 0);
+    addToGroup(session, group, "Quote\"\n", "caf\xc3\xa9 \xff");
     unsigned char data[] = {1, 255};
     logEvent(session, "Job", "", "TextAntiAliasing", data, 2);
     close(session);
-
-    const auto files = sessionFiles(folder);
-    ASSERT_EQ(files.size(), 1u);
-    const auto lines = readLines(files[0]);
-    ASSERT_EQ(lines.size(), 6u);
-    EXPECT_EQ(lines[0]["type"], "session_start");
-    EXPECT_EQ(lines[0]["version"], "1.2.3.4");
-    EXPECT_TRUE(lines[0]["reserved"].is_null());
-    EXPECT_EQ(lines[1]["type"], "session_value");
-    EXPECT_EQ(lines[1]["value"], "h1");
-    EXPECT_EQ(lines[2]["type"], "group");
-    EXPECT_EQ(lines[2]["name"], "JobInfo");
-    EXPECT_EQ(lines[3]["type"], "value");
-    EXPECT_EQ(lines[3]["group"], 0);
-    EXPECT_EQ(lines[3]["key"], "Quote\"\n");
-    EXPECT_EQ(lines[3]["value"], "caf\xc3\xa9");
-    EXPECT_EQ(lines[4]["type"], "event");
-    EXPECT_EQ(lines[4]["data"], json::array({1, 255}));
-    EXPECT_EQ(lines[5]["type"], "session_close");
-    for (const auto& line : lines)
-        EXPECT_TRUE(line["time"].is_number());
+    const std::vector<Lines> expected = {
+        {R"({"folder":")" + folder +
+             R"(","kind":"Print","product":"P","reserved":null,"short_version":"1.2",)"
+             R"("type":"session_start","version":"1.2.3.4"})",
+         R"({"key":"host","type":"session_value","value":"h1"})",
+         R"({"data":[],"display_name":"JobInfo","group":0,"name":"JobInfo","subname":"","type":"group"})",
+         R"({"data":[],"display_name":"S","group":1,"name":"Second","subname":null,"type":"group"})",
+         "{\"group\":1,\"key\":\"Quote\\\"\\n\",\"type\":\"value\",\"value\":\"caf\xc3\xa9 "
+         "\xef\xbf\xbd\"}", // not UTF-8: U+FFFD
+         R"({"category":"Job","data":[1,255],"name":"TextAntiAliasing","subcategory":"",)"
+         R"("type":"event"})",
+         R"({"type":"session_close"})"}};
+    EXPECT_EQ(sessions(folder), expected);
 
     // A folder that cannot be made: no session.
     zyrtest::writeFile(dir.file("plain"), "x");
     start(session, "Print", "P", "1", "1", "", (dir.file("plain") + "/logs").c_str());
     EXPECT_EQ(session, nullptr);
     setOptIn(0);
+    dlclose(lib);
 }
 
 // The library the logger finds by name is ours, beside libZYRStd; records reach its file.
@@ -132,23 +116,20 @@ TEST(KelvrinTest, RecordsReachTheSessionFile) {
     record.set(CZYRUniString("NumWorkers"), 3u);
     record.finalize();
     // Logged before termination: wait until the worker wrote the value.
-    const auto logged = [&] {
-        const auto files = sessionFiles(dir.path());
-        return files.size() == 1 && readLines(files[0]).size() >= 3;
-    };
-    for (int i = 0; i < 10000 && !logged(); ++i)
+    for (int i = 0;
+         i < 10000 && (sessions(dir.path()).size() != 1 || sessions(dir.path())[0].size() < 3); ++i)
         std::this_thread::sleep_for(std::chrono::milliseconds(1));
     ZYRAnalyticsManagerTerm();
     ZYRSetAnalyticsActive(false);
     ZYRSetAnalyticsLogFolder(nullptr);
 
-    const auto files = sessionFiles(dir.path());
+    const std::vector<Lines> files = sessions(dir.path());
     ASSERT_EQ(files.size(), 1u);
-    const auto lines = readLines(files[0]);
-    ASSERT_GE(lines.size(), 4u);
-    EXPECT_EQ(lines[0]["folder"], dir.path());
-    EXPECT_EQ(lines[1]["name"], "DripSessionInfo");
-    EXPECT_EQ(lines[2]["key"], "NumWorkers");
-    EXPECT_EQ(lines[2]["value"], "3");
-    EXPECT_EQ(lines.back()["type"], "session_close");
+    ASSERT_GE(files[0].size(), 4u);
+    EXPECT_NE(files[0][0].find(R"("folder":")" + dir.path() + "\""), std::string::npos);
+    EXPECT_EQ(Lines(files[0].begin() + 1, files[0].begin() + 3),
+              (Lines{R"({"data":[],"display_name":"DripSessionInfo","group":0,)"
+                     R"("name":"DripSessionInfo","subname":"","type":"group"})",
+                     R"({"group":0,"key":"NumWorkers","type":"value","value":"3"})"}));
+    EXPECT_EQ(files[0].back(), R"({"type":"session_close"})");
 }
