@@ -2,6 +2,7 @@
 // decoders over memory streams.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <memory>
 #include <random>
@@ -55,96 +56,102 @@ CZYRSmartZYRRefPtr<IImpZYRMemStream> memStream(unsigned int mode, unsigned int c
 
 const char* const kPastEnd = "write past end of stream";
 
-TEST(ZYRStreamsTest, MemoryStreamReadsAndWritesWithinCapacity) {
-    auto s = memStream(kZYRStreamRead | kZYRStreamWrite, 8);
-    EXPECT_EQ(s->write("abcdef", 2, 3), 6u) << "a byte count, not an item count";
-    EXPECT_EQ(s->getPos(), 6u);
-    EXPECT_EQ(s->getSize(), 6u);
-    expectError([&] { s->write("xyz", 1, 3); }, ZYRPublic::kZYRErrorInvalidData, kPastEnd);
-    EXPECT_EQ(s->getPos(), 6u) << "a failed write changes nothing";
-    EXPECT_EQ(s->getEOF(), 6u);
-    EXPECT_EQ(s->write("gh", 1, 2), 2u) << "up to the capacity exactly";
-
-    EXPECT_EQ(s->setPos(2), 2u);
-    char out[8] = {};
-    EXPECT_EQ(s->read(out, 2, 3), 6u) << "up to the EOF, counted in bytes";
-    EXPECT_EQ(std::string(out, 6), "cdefgh");
-    EXPECT_EQ(s->read(out, 1, 1), 0u);
-    s->setPos(1);
-    EXPECT_EQ(s->write("Z", 1, 1), 1u);
-    EXPECT_EQ(s->getEOF(), 8u) << "writing inside the data keeps the EOF";
-    s->setPos(0);
-    EXPECT_EQ(s->read(out, 1, 8), 8u);
-    EXPECT_EQ(std::string(out, 8), "aZcdefgh");
-    s->setPos(0);
-    s->setEOF();
-    EXPECT_EQ(s->getPos(), 8u);
-
+// The memory stream against a model over random modes, capacities, own or caller's buffers
+// and transfers: a write past the capacity fails and changes nothing, reads stop at the EOF,
+// a readable caller's buffer is the content unless truncated, append implies writing and
+// starts at the EOF, and reOpen without append drops the content.
+TEST(ZYRStreamsTest, MemoryStreamMatchesAModel) {
+    std::mt19937 random(3);
+    const unsigned int R = kZYRStreamRead, W = kZYRStreamWrite, A = kZYRStreamAppend,
+                       T = kZYRStreamTruncate;
+    const auto randomMode = [&] {
+        const unsigned int bits = random() % 16;
+        return (bits & (R | W | A)) | (bits & 8 ? T : 0);
+    };
+    for (int round = 0; round < 400; ++round) {
+        unsigned int mode = randomMode();
+        const unsigned int capacity = random() % 40;
+        const bool caller = random() % 2;
+        std::string callerBytes(capacity, 'c');
+        auto s = memStream(mode, capacity, caller ? callerBytes.data() : nullptr);
+        std::string data = caller ? callerBytes : std::string(capacity, '\0');
+        if (!caller && capacity) // our own bytes start undefined
+            std::memset(s->data(), 0, capacity);
+        unsigned int eof = caller && (mode & R) && !(mode & T) ? capacity : 0;
+        unsigned int pos = mode & A ? eof : 0;
+        for (int step = 0; step < 30; ++step) {
+            const unsigned int size = 1 + random() % 3, count = random() % 6, n = size * count;
+            const unsigned int action = random() % 6;
+            if (action < 2 && !(mode & (W | A))) {
+                expectError([&] { s->write("", size, count); }, ZYRPublic::kZYRErrorInvalidFuncCall,
+                            "stream is not writable");
+            } else if (action < 2 && pos + n > capacity) {
+                expectError([&] { s->write("", size, count); }, ZYRPublic::kZYRErrorInvalidData,
+                            kPastEnd);
+            } else if (action < 2) {
+                const std::string bytes(n, static_cast<char>('a' + random() % 26));
+                ASSERT_EQ(s->write(bytes.data(), size, count), n) << "a byte count";
+                data.replace(pos, n, bytes);
+                pos += n;
+                eof = n ? std::max(eof, pos) : eof; // writing nothing moves no EOF
+            } else if (action < 4 && !(mode & R)) {
+                expectError([&] { s->read(nullptr, size, count); },
+                            ZYRPublic::kZYRErrorInvalidFuncCall, "stream is not readable");
+            } else if (action < 4 && pos > eof) {
+                expectError([&] { s->read(nullptr, size, count); }, ZYRPublic::kZYRErrorInvalidData,
+                            "attempt to read negative bytes");
+            } else if (action < 4) {
+                std::string out(n, '\0');
+                const unsigned int got = std::min(n, eof - pos);
+                ASSERT_EQ(s->read(out.data(), size, count), got) << "up to the EOF";
+                ASSERT_EQ(out.substr(0, got), data.substr(pos, got));
+                pos += got;
+            } else if (action == 4) {
+                const unsigned int to = random() % (capacity + 3);
+                if (to > capacity) {
+                    expectError([&] { s->setPos(to); }, ZYRPublic::kZYRErrorLimitCheck,
+                                "Attempt to setPos beyond Mem Stream size");
+                } else {
+                    ASSERT_EQ(s->setPos(to), to);
+                    pos = to;
+                }
+            } else if (random() % 2) {
+                s->setEOF();
+                pos = eof;
+            } else {
+                mode = randomMode();
+                s->reOpen(mode);
+                if ((mode & T) || ((mode & W) && !(mode & (R | A))))
+                    eof = 0;
+                pos = mode & A ? eof : (eof = 0);
+            }
+            ASSERT_EQ(s->getPos(), pos) << "round " << round << " step " << step;
+            ASSERT_EQ(s->getEOF(), eof) << "round " << round << " step " << step;
+            ASSERT_EQ(s->getSize(), eof);
+            ASSERT_EQ(s->getAccessMode(), mode);
+            if (capacity) {
+                ASSERT_EQ(std::string(reinterpret_cast<char*>(s->data()), capacity), data);
+            }
+        }
+        s.reset();
+        if (caller) {
+            ASSERT_EQ(callerBytes, data) << "writes go into the caller's bytes, which outlive us";
+        }
+    }
     // The 32-bit product and sum of a huge write must not slip past the capacity check.
+    auto s = memStream(R | W, 8);
     s->setPos(4);
     expectError([&] { s->write("", 0x10000, 0x10000 - 1); }, ZYRPublic::kZYRErrorInvalidData,
                 kPastEnd);
-    EXPECT_EQ(s->setPos(8), 8u) << "the capacity, not the EOF, is the limit";
-    expectError([&] { s->setPos(9); }, ZYRPublic::kZYRErrorLimitCheck,
-                "Attempt to setPos beyond Mem Stream size");
-
-    auto gap = memStream(kZYRStreamRead | kZYRStreamWrite, 10);
-    gap->setPos(3);
-    expectError([&] { gap->read(out, 1, 1); }, ZYRPublic::kZYRErrorInvalidData,
-                "attempt to read negative bytes");
-    auto none = memStream(kZYRStreamRead | kZYRStreamWrite, 0);
-    EXPECT_EQ(none->write("", 1, 0), 0u);
-    expectError([&] { none->write("a", 1, 1); }, ZYRPublic::kZYRErrorInvalidData, kPastEnd);
-    EXPECT_EQ(none->read(out, 1, 1), 0u);
-}
-
-TEST(ZYRStreamsTest, MemoryStreamModesOverCallerBuffer) {
-    char bytes[10];
-    std::memcpy(bytes, "0123456789", 10);
-    auto reader = memStream(kZYRStreamRead, sizeof bytes, bytes);
-    char out[12] = {};
-    EXPECT_EQ(reader->read(out, 3, 4), 10u) << "a readable buffer is all content";
-    EXPECT_EQ(std::string(out, 10), "0123456789");
-    expectError([&] { reader->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
-                "stream is not writable");
-    EXPECT_EQ(memStream(kZYRStreamRead | kZYRStreamTruncate, 10, bytes)->getEOF(), 0u);
-    auto appender = memStream(kZYRStreamRead | kZYRStreamAppend, sizeof bytes, bytes);
-    EXPECT_EQ(appender->getPos(), 10u);
-    expectError([&] { appender->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidData, kPastEnd);
-
-    // Writes go into the caller's bytes, and the caller's buffer outlives the stream.
-    auto writer = memStream(kZYRStreamWrite, sizeof bytes, bytes);
-    EXPECT_EQ(writer->getEOF(), 0u);
-    writer->write("ab", 1, 2);
-    expectError([&] { writer->read(out, 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
-                "stream is not readable");
     ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(writer->read(out, 1, 1, err), 0u);
-    EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidFuncCall);
+    EXPECT_EQ(s->read(nullptr, 1, 1, err), 0u);
+    EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidData) << "the error-reporting forms report";
     err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(writer->write("abcdefghijk", 1, 11, err), 0u);
+    EXPECT_EQ(s->write("abcde", 1, 5, err), 0u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidData);
     err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(writer->write("c", 1, 1, err), 1u);
+    EXPECT_EQ(s->write("abcd", 1, 4, err), 4u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorNoError) << "success leaves the status alone";
-    writer.reset();
-    EXPECT_EQ(std::string(bytes, 4), "abc3");
-    EXPECT_EQ(memStream(kZYRStreamAppend, 4)->write("a", 1, 1), 1u) << "append implies writing";
-
-    // reOpen: without append the content goes; append keeps it and starts at its end.
-    auto s = memStream(kZYRStreamRead | kZYRStreamWrite, 8);
-    s->write("hello", 1, 5);
-    s->reOpen(kZYRStreamRead);
-    EXPECT_EQ(s->getEOF(), 0u);
-    EXPECT_EQ(s->getPos(), 0u);
-    EXPECT_EQ(s->getAccessMode(), kZYRStreamRead);
-    s->reOpen(kZYRStreamWrite);
-    s->write("hello", 1, 5);
-    s->reOpen(kZYRStreamRead | kZYRStreamAppend);
-    EXPECT_EQ(s->getEOF(), 5u);
-    EXPECT_EQ(s->getPos(), 5u);
-    s->reOpen(kZYRStreamAppend | kZYRStreamTruncate);
-    EXPECT_EQ(s->getEOF(), 0u);
 }
 
 TEST(ZYRStreamsTest, MemoryStreamAllocationFailure) {
@@ -597,10 +604,8 @@ TEST(CZYRStreamsFilterTest, ErrorReportingWriteEncodesWhateverTheStatusHolds) {
         CZYRStreamFilterASCIIHEX hex{CZYRSmartZYRRefPtr<IZYRStream>(outHex)};
         EXPECT_EQ(a85.write("A", 1, 1, earlier), 1u);
         EXPECT_EQ(hex.write("Man", 1, 3, earlier), 3u);
-        a85.close();
-        hex.close();
     }
-    EXPECT_EQ(contents(out85), "5l~>\r\n");
+    EXPECT_EQ(contents(out85), "5l~>\r\n") << "the destructors close";
     EXPECT_EQ(contents(outHex), "4d616e>\r\n");
     EXPECT_STREQ(earlier.getMessage(), "earlier") << "a successful write changes no status";
 }
