@@ -2,18 +2,22 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <sstream>
+#include <string>
 
 #include "TestSupport.h"
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/memory/ZYRDMM.h"
 
 using namespace ZYRStd;
 
 namespace {
 
+// Sets (or, for null, removes) an environment variable for its lifetime.
 class EnvGuard {
 public:
     EnvGuard(const char* name, const char* value) : name_(name) {
@@ -45,6 +49,18 @@ ZYRFactory::IZYRFactory* factoryB() {
     return nullptr;
 }
 
+// The factory procedure's error as "message @ line", or "" when there is none.
+template <class Body> std::string thrown(Body body) {
+    try {
+        body();
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorFatal);
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRStdInit");
+        return std::string(e.getMessage()) + " @ " + std::to_string(e.getSrcLineNumber());
+    }
+    return "";
+}
+
 } // namespace
 
 TEST(ZYRStdInitTest, MemoryStatLevelComesFromTheEnvironment) {
@@ -69,8 +85,7 @@ TEST(ZYRStdInitTest, HostRecordIsCopiedAndNullKeepsTheLimit) {
     zyrtest::FailingHost host;
     tZYRMemMgr record = host.record();
     ZYRStdInit_ZYRMemMgrSet(&record);
-    const unsigned long long limit = ZYRGetMemLimit();
-    EXPECT_GT(limit, 0u) << "a host record sets the limit from the machine";
+    EXPECT_GT(ZYRGetMemLimit(), 0u) << "a host record sets the limit from the machine";
     record.clientData = nullptr; // the library's copy must not follow
     EXPECT_EQ(ZYRStdInit_ZYRMemMgrGet()->clientData, &host);
     void* p = ZYRMalloc(8);
@@ -85,33 +100,18 @@ TEST(ZYRStdInitTest, HostRecordIsCopiedAndNullKeepsTheLimit) {
     zyrtest::installFront(0);
 }
 
-TEST(ZYRStdInitTest, FactoryProcedureIsSetOnce) {
-    try {
-        ZYRGetFactory();
-        ADD_FAILURE() << "no factory yet";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorFatal);
-        EXPECT_STREQ(e.getMessage(), "ZYRFactory Proc not set in ZYRStd");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRStdInit");
-        EXPECT_EQ(e.getSrcLineNumber(), 35);
-    }
+TEST(ZYRStdInitTest, FactoryProcedureIsSetOnceAndWorkerIdentifierStartsAtOne) {
+    EXPECT_EQ(thrown([] { ZYRGetFactory(); }), "ZYRFactory Proc not set in ZYRStd @ 35");
     ZYRStdInit_SetZYRFactoryProc(factoryA);
     EXPECT_EQ(ZYRGetFactory(), kFakeFactory);
-    try {
-        ZYRStdInit_SetZYRFactoryProc(factoryB);
-        ADD_FAILURE() << "a second procedure must be refused";
-    } catch (const CZYRError& e) {
-        EXPECT_STREQ(e.getMessage(), "Default filsSys already set");
-        EXPECT_EQ(e.getSrcLineNumber(), 56);
-    }
+    EXPECT_EQ(thrown([] { ZYRStdInit_SetZYRFactoryProc(factoryB); }),
+              "Default filsSys already set @ 56");
     EXPECT_EQ(ZYRGetFactory(), kFakeFactory) << "the first procedure stays";
     ZYRStdInit_SetZYRFactoryProc(nullptr);
     ZYRStdInit_SetZYRFactoryProc(factoryB);
     EXPECT_EQ(ZYRGetFactory(), nullptr);
     ZYRStdInit_SetZYRFactoryProc(nullptr);
-}
 
-TEST(ZYRStdInitTest, WorkerIdentifierStartsAtOne) {
     EXPECT_EQ(ZYRGetWorkerID(), 1u);
     ZYRStdInit_ZYRSetWorkerID(7);
     EXPECT_EQ(ZYRGetWorkerID(), 7u);
@@ -119,29 +119,27 @@ TEST(ZYRStdInitTest, WorkerIdentifierStartsAtOne) {
     EXPECT_EQ(ZYRGetWorkerID(), 1u);
 }
 
+// The log opens only where ZYR_DMM_LOG names a file that can be made with a path of at most
+// 259 characters, and starts empty.
 TEST(ZYRStdInitTest, DmmLogOpensOnlyWhenNamed) {
     zyrtest::TempDir dir;
-    const std::string path = dir.file("dmm.log");
+    const std::string base = dir.path() + "/" + std::string(100, 'd') + "/";
+    std::filesystem::create_directories(base);
+    auto sized = [&](size_t n) { return base + std::string(n - base.size(), 'f'); };
+    const std::pair<std::string, const char*> cases[] = {{"", ""},
+                                                         {dir.path() + "/missing/dir/dmm.log", ""},
+                                                         {sized(260), "old"},
+                                                         {sized(259), "line\n"}};
     tZYRMemMgr any{};
-    {
-        EnvGuard env("ZYR_DMM_LOG", nullptr);
+    for (const auto& [named, expected] : cases) {
+        std::ofstream(named) << "old";
+        EnvGuard env("ZYR_DMM_LOG", named.empty() ? nullptr : named.c_str());
         ZYRStdInit_ZYRDMMEnv_set(&any);
+        LogDMMInfo("line\n");
         ZYRStdInit_ZYRDMMEnv_set(nullptr);
-    }
-    {
-        EnvGuard env("ZYR_DMM_LOG", (dir.path() + "/missing/dir/dmm.log").c_str());
-        ZYRStdInit_ZYRDMMEnv_set(&any); // cannot open: stays off, silently
-        ZYRStdInit_ZYRDMMEnv_set(nullptr);
-    }
-    {
-        std::ofstream(path) << "old contents";
-        EnvGuard env("ZYR_DMM_LOG", path.c_str());
-        ZYRStdInit_ZYRDMMEnv_set(&any);
-        ZYRStdInit_ZYRDMMEnv_set(nullptr);
-        std::ifstream in(path);
         std::stringstream text;
-        text << in.rdbuf();
-        EXPECT_EQ(text.str(), "") << "the log is truncated when opened";
+        text << std::ifstream(named).rdbuf();
+        EXPECT_EQ(text.str(), expected) << named;
     }
 }
 
