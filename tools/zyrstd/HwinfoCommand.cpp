@@ -9,6 +9,7 @@
 #include "Commands.h"
 #include "ToolSupport.h"
 #include "ZYRStd.h"
+#include "zyr/std/core/internal/ZYRUTF8.h"
 
 namespace zyrtool {
 
@@ -16,26 +17,7 @@ namespace {
 
 std::string utf8(const std::wstring& text) {
     std::string out;
-    for (const wchar_t wc : text) {
-        auto c = static_cast<char32_t>(wc);
-        if (c > 0x10FFFF || (c >= 0xD800 && c <= 0xDFFF))
-            c = 0xFFFD;
-        if (c < 0x80) {
-            out += static_cast<char>(c);
-        } else if (c < 0x800) {
-            out += static_cast<char>(0xC0 | (c >> 6));
-            out += static_cast<char>(0x80 | (c & 0x3F));
-        } else if (c < 0x10000) {
-            out += static_cast<char>(0xE0 | (c >> 12));
-            out += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-            out += static_cast<char>(0x80 | (c & 0x3F));
-        } else {
-            out += static_cast<char>(0xF0 | (c >> 18));
-            out += static_cast<char>(0x80 | ((c >> 12) & 0x3F));
-            out += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-            out += static_cast<char>(0x80 | (c & 0x3F));
-        }
-    }
+    ZYRStd::detail::appendUTF8(out, text.data(), text.size());
     return out;
 }
 

@@ -12,6 +12,7 @@
 #include "zyr/std/core/internal/ZYRErrorBoundary.h"
 #include "zyr/std/core/internal/ZYRMemInternal.h"
 #include "zyr/std/core/internal/ZYRNoDestructor.h"
+#include "zyr/std/core/internal/ZYRUTF8.h"
 #include "zyr/std/engine/ZYROEMInterfacesInternal.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
 #include "zyr/std/values/CZYRString.h"
@@ -80,34 +81,6 @@ std::string defaultLogPath() {
 
 // ---- texts -------------------------------------------------------------------------------
 
-void appendUtf8(std::string& out, const char16_t* units, size_t count) {
-    for (size_t i = 0; i < count; ++i) {
-        uint32_t c = units[i];
-        if (c >= 0xD800 && c <= 0xDBFF && i + 1 < count && units[i + 1] >= 0xDC00 &&
-            units[i + 1] <= 0xDFFF) {
-            c = 0x10000 + ((c - 0xD800) << 10) + (units[i + 1] - 0xDC00);
-            ++i;
-        } else if (c >= 0xD800 && c <= 0xDFFF) {
-            c = 0xFFFD; // a lone surrogate has no UTF-8 form
-        }
-        if (c < 0x80) {
-            out += static_cast<char>(c);
-        } else if (c < 0x800) {
-            out += static_cast<char>(0xC0 | (c >> 6));
-            out += static_cast<char>(0x80 | (c & 0x3F));
-        } else if (c < 0x10000) {
-            out += static_cast<char>(0xE0 | (c >> 12));
-            out += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-            out += static_cast<char>(0x80 | (c & 0x3F));
-        } else {
-            out += static_cast<char>(0xF0 | (c >> 18));
-            out += static_cast<char>(0x80 | ((c >> 12) & 0x3F));
-            out += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-            out += static_cast<char>(0x80 | (c & 0x3F));
-        }
-    }
-}
-
 std::u16string_view unitsOf(const I_UniString* s) {
     if (!s)
         return {};
@@ -120,7 +93,7 @@ std::u16string_view unitsOf(const I_UniString* s) {
 
 void appendText(std::string& out, const CZYRUniString& s) {
     const std::u16string_view units = unitsOf(s.getImpl());
-    appendUtf8(out, units.data(), units.size());
+    detail::appendUTF8(out, units.data(), units.size());
 }
 
 bool textIs(const CZYRUniString& s, std::u16string_view text) {
@@ -138,7 +111,7 @@ std::string logFileForm(const char16_t* wide) {
         ((units[0] >= u'A' && units[0] <= u'Z') || (units[0] >= u'a' && units[0] <= u'z')))
         out += '/';
     const size_t start = out.size();
-    appendUtf8(out, units.data(), units.size());
+    detail::appendUTF8(out, units.data(), units.size());
     for (size_t i = start; i < out.size(); ++i)
         if (out[i] == '\\')
             out[i] = '/';
@@ -148,7 +121,7 @@ std::string logFileForm(const char16_t* wide) {
 std::string plainForm(const char16_t* wide) {
     std::string out;
     const std::u16string_view units(wide);
-    appendUtf8(out, units.data(), units.size());
+    detail::appendUTF8(out, units.data(), units.size());
     return out;
 }
 

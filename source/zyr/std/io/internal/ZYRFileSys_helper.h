@@ -7,6 +7,7 @@
 #include "IZYRFileName.h"
 #include "I_Error.h"
 #include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/internal/ZYRUTF8.h"
 #include "zyr/std/values/CZYRString.h"
 #include "zyr/std/values/CZYRUniString.h"
 
@@ -29,32 +30,8 @@ unsigned int reportStreamError(ZYRPublic::eZYRErrorType& err, Body&& body) noexc
 // UTF-16 to UTF-8, the encoding of POSIX path bytes. A lone surrogate becomes U+FFFD.
 inline ZYRStd::CZYRString utf16ToUTF8(const char16_t* text, unsigned int length) {
     ZYRStd::CZYRString out;
-    auto& bytes = out.str();
-    bytes.reserve(length);
-    for (unsigned int i = 0; i < length; ++i) {
-        char32_t c = text[i];
-        if (c >= 0xD800 && c <= 0xDBFF && i + 1 < length && text[i + 1] >= 0xDC00 &&
-            text[i + 1] <= 0xDFFF) {
-            c = 0x10000 + ((c - 0xD800) << 10) + (text[++i] - 0xDC00);
-        } else if (c >= 0xD800 && c <= 0xDFFF) {
-            c = 0xFFFD;
-        }
-        if (c < 0x80) {
-            bytes += static_cast<char>(c);
-        } else if (c < 0x800) {
-            bytes += static_cast<char>(0xC0 | (c >> 6));
-            bytes += static_cast<char>(0x80 | (c & 0x3F));
-        } else if (c < 0x10000) {
-            bytes += static_cast<char>(0xE0 | (c >> 12));
-            bytes += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-            bytes += static_cast<char>(0x80 | (c & 0x3F));
-        } else {
-            bytes += static_cast<char>(0xF0 | (c >> 18));
-            bytes += static_cast<char>(0x80 | ((c >> 12) & 0x3F));
-            bytes += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-            bytes += static_cast<char>(0x80 | (c & 0x3F));
-        }
-    }
+    out.str().reserve(length);
+    ZYRStd::detail::appendUTF8(out.str(), text, length);
     return out;
 }
 
