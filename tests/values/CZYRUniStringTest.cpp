@@ -13,6 +13,7 @@
 
 #include <unicode/uclean.h>
 
+#include "TestSupport.h"
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
 #include "zyr/std/values/CZYRDataBuffer.h"
@@ -395,6 +396,13 @@ TEST(CZYRStringTest, DataBuffersKeepTheirOwnCopy) {
                 "CZYRDataBuffer::getUniqueID invalid object");
     err.setError(ZYRPublic::kZYRErrorBadParam, "earlier", nullptr, 1);
     EXPECT_EQ(createDataBuffer("x", 1, err), nullptr);
+    // A buffer that cannot get its bytes is an error, not an empty buffer.
+    zyrtest::FailingHost host;
+    host.failAll = true;
+    tZYRMemMgr record = host.record();
+    zyrtest::installFront(0, &record);
+    EXPECT_THROW(CZYRDataBuffer("x", 1), CZYRError);
+    zyrtest::installFront(0);
 }
 
 // ---- the common strings table and the dynamic cache --------------------------------------------
