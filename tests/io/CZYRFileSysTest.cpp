@@ -339,42 +339,73 @@ TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
     fx.record_ = ZYRHostKit::posixFileProcs();
     EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true));
 
+    // Each procedure missing, or failing, as the stream uses it.
     using Record = ZYRPublic::_t_ZYRPDLFileSysRec;
     using Stream = CZYRSmartZYRRefPtr<IZYRFStream>;
+    const ZYRPublic::eZYRErrorType undefined = ZYRPublic::kZYRErrorInvalidFuncCall,
+                                   fails = ZYRPublic::kZYRErrorFileOpFailed;
     const struct {
-        void (*clear)(Record&);
+        void (*change)(Record&);
         void (*use)(Stream&);
+        ZYRPublic::eZYRErrorType type;
         const char* message;
-    } missing[] = {
-        {[](Record& r) { r.flush = nullptr; }, [](Stream& s) { s->flush(); },
+    } procedures[] = {
+        {[](Record& r) { r.flush = nullptr; }, [](Stream& s) { s->flush(); }, undefined,
          "flush proc not defined"},
-        {[](Record& r) { r.getpos64 = nullptr; }, [](Stream& s) { s->getPos(); },
+        {[](Record& r) { r.flush = [](void*) { return -1; }; }, [](Stream& s) { s->flush(); },
+         fails, "error flushing file"},
+        {[](Record& r) { r.getpos64 = nullptr; }, [](Stream& s) { s->getPos(); }, undefined,
          "getpos64 proc not defined"},
-        {[](Record& r) { r.setpos64 = nullptr; }, [](Stream& s) { s->setPos(1); },
+        {[](Record& r) { r.getpos64 = [](void*, unsigned long long*) { return -1; }; },
+         [](Stream& s) { s->getPos(); }, fails, "Error getpos file"},
+        {[](Record& r) { r.setpos64 = nullptr; }, [](Stream& s) { s->setPos(1); }, undefined,
          "setpos64 proc not defined"},
-        {[](Record& r) { r.setpos64 = nullptr; }, [](Stream& s) { s->setEOF(); },
+        {[](Record& r) { r.setpos64 = [](void*, uint32_t, uint32_t) { return -1; }; },
+         [](Stream& s) { s->setPos(1); }, fails, "Error setpos file"},
+        {[](Record& r) { r.setpos64 = nullptr; }, [](Stream& s) { s->setEOF(); }, undefined,
          "geteof64 or setpos64 proc not defined"},
-        {[](Record& r) { r.geteof64 = nullptr; }, [](Stream& s) { s->getSize(); },
+        {[](Record& r) { r.setpos64 = [](void*, uint32_t, uint32_t) { return -1; }; },
+         [](Stream& s) { s->setEOF(); }, fails, "Error seteof file"},
+        {[](Record& r) { r.geteof64 = nullptr; }, [](Stream& s) { s->getSize(); }, undefined,
          "geteof proc not defined"},
-        {[](Record& r) { r.seteof = nullptr; }, [](Stream& s) { s->truncate(); },
+        {[](Record& r) { r.geteof64 = [](void*, unsigned long long*) { return -1; }; },
+         [](Stream& s) { s->getSize(); }, fails, "Error getting size of file"},
+        {[](Record& r) { r.seteof = nullptr; }, [](Stream& s) { s->truncate(); }, undefined,
          "getpos64 or seteof proc not defined"},
-        {[](Record& r) { r.read = nullptr; }, [](Stream& s) { s->read(nullptr, 1, 1); },
+        {[](Record& r) { r.read = nullptr; }, [](Stream& s) { s->read(nullptr, 1, 1); }, undefined,
          "read proc not defined"},
-        {[](Record& r) { r.write = nullptr; }, [](Stream& s) { s->write("x", 1, 1); },
+        {[](Record& r) { r.write = nullptr; }, [](Stream& s) { s->write("x", 1, 1); }, undefined,
          "write proc not defined"},
-        {[](Record& r) { r.remove = nullptr; }, [](Stream& s) { s->removeFile(); },
+        {[](Record& r) {
+             r.write = [](const void*, size_t, size_t, void*, int* error) -> size_t {
+                 *error = EIO;
+                 return 0;
+             };
+         },
+         [](Stream& s) { s->write("x", 1, 1); }, fails, "Error writing file"},
+        {[](Record& r) { r.remove = nullptr; }, [](Stream& s) { s->removeFile(); }, undefined,
          "remove proc not defined"},
-        {[](Record& r) { r.close = nullptr; }, [](Stream& s) { s->close(); },
+        {[](Record& r) { r.remove = [](void*) { return -1; }; }, [](Stream& s) { s->removeFile(); },
+         undefined, "Error removing file"},
+        {[](Record& r) { r.close = nullptr; }, [](Stream& s) { s->close(); }, undefined,
          "close or remove proc not defined"},
+        {[](Record& r) {
+             r.close = [](void* handle) { return ZYRHostKit::posixFileProcs().close(handle), -1; };
+         },
+         [](Stream& s) { s->close(); }, fails, "Error closing file"},
+        {[](Record& r) { r.open64 = [](void*, unsigned short, void**) { return -1; }; },
+         [](Stream& s) { s->reOpen(kZYRStreamRead); }, fails, "Error opening file"},
     };
-    for (const auto& row : missing) {
+    for (const auto& row : procedures) {
         Stream s = fx.open(path, kZYRStreamRead | kZYRStreamWrite);
         ASSERT_TRUE(s->isOpen());
-        row.clear(fx.record_);
-        expectError([&] { row.use(s); }, ZYRPublic::kZYRErrorInvalidFuncCall, row.message,
-                    kHostSource);
+        row.change(fx.record_);
+        expectError([&] { row.use(s); }, row.type, row.message, kHostSource);
         fx.record_ = ZYRHostKit::posixFileProcs();
     }
+    fx.record_.seteof = [](void*, uint32_t, uint32_t) { return -1; };
+    EXPECT_FALSE(fx.open(path, kZYRStreamRead | kZYRStreamWrite)->truncate());
+    fx.record_ = ZYRHostKit::posixFileProcs();
 }
 
 // ---- file operations ------------------------------------------------------------------------
