@@ -1,19 +1,19 @@
-// Error statuses, exceptions and the boundary between them; the error stack: per-thread
-// order, unique reports, filters, and the out-of-memory notice.
+// Error statuses, exceptions and the boundary between them; and every allocation of a
+// realistic workload failing in turn: nothing may crash, leak, leave the accounting off or post
+// a notice, and each kind of caller reports its failure with the record hosts know it by.
 #include <gtest/gtest.h>
 
-#include <atomic>
+#include <memory>
+#include <set>
 #include <stdexcept>
 #include <string>
-#include <thread>
 #include <tuple>
+#include <vector>
 
 #include "TestSupport.h"
-#include "zyr/std/core/CZYRError.h"
-#include "zyr/std/core/CZYRErrorStk.h"
-#include "zyr/std/core/ZYRMem.h"
-#include "zyr/std/core/ZYRThread.h"
+#include "ZYRStd.h"
 #include "zyr/std/core/internal/ZYRErrorBoundary.h"
+#include "zyr/std/memory/ZYRPool.h"
 
 using namespace ZYRStd;
 using namespace ZYRPublic;
@@ -25,13 +25,12 @@ using Fields = std::tuple<int, std::string, std::string, int, bool>;
 std::string text(const char* s) {
     return s ? s : "(null)";
 }
-Fields fields(const CZYRError& e) {
+template <class Error> Fields fields(const Error& e) {
+    bool unexpected = false;
+    if constexpr (std::is_same_v<Error, CZYRError>)
+        unexpected = e.getUnExpectedErr();
     return {e.getError(), text(e.getMessage()), text(e.getSrcFileName()), e.getSrcLineNumber(),
-            e.getUnExpectedErr()};
-}
-Fields fields(const C_Error& e) {
-    return {e.getError(), text(e.getMessage()), text(e.getSrcFileName()), e.getSrcLineNumber(),
-            false};
+            unexpected};
 }
 // What `body` throws as a CZYRError; all empty when it throws none.
 template <class Body> Fields thrown(Body body) {
@@ -43,31 +42,45 @@ template <class Body> Fields thrown(Body body) {
     return {};
 }
 
-// Everything on the stack, newest first per thread, except what the filter contains.
-std::u16string fetch(std::u16string filter = u"") {
-    CZYRErrorStk stack;
-    return stack.getErrorMessage(filter) ? filter : u"<none>";
-}
-
-class CZYRErrorStkTest : public ::testing::Test {
-protected:
-    void SetUp() override { fetch(); }
-    void TearDown() override { fetch(); }
-};
-
-void report(const char16_t* text, bool unique = false) {
-    CZYRErrorStk stack;
-    if (unique)
-        stack.reportUniqueError(ZYRMakeErrorInfo(1, text));
-    else
-        stack.reportError(ZYRMakeErrorInfo(1, text));
-}
-
 int handlerCalls = 0;
 void countingHandler() {
     ++handlerCalls;
 }
 void otherHandler() {}
+
+struct OnClientBase : CZYRClientBase {
+    int payload[4];
+};
+
+// Values, strings, the dynamic memory manager, the container allocator, the sure variants of
+// the front, class allocation, smart-pointer boxes and a pool in one go.
+void workload() {
+    CZYRDict dict;
+    dict.set(CZYRUniString("first key"), 1u);
+    CZYRArray array;
+    array.set(3, CZYRUniString("element"));
+    array.set(1, CZYRDataBuffer("bytes", 5));
+    dict.set(CZYRUniString("array"), array);
+    const CZYRDict copy = dict.clone();
+    CZYRUniString joined = CZYRUniString("left").concat(CZYRUniString("right"));
+    joined.append(CZYRUniString("more"));
+    const CZYRString narrow(joined);
+    void* block = ZYRDMMMalloc(100, "FAULTS", nullptr, nullptr, nullptr,
+                               ZYRPublic::eFlushMemorySeverityNormal);
+    ZYRDMMFree(block, "FAULTS", nullptr);
+    std::vector<int, CZYRStdAllocator<int>> numbers(64, 7);
+    numbers.resize(1000);
+    std::unique_ptr<void, void (*)(void*)> sure(ZYRSureCalloc(4, 10), ZYRFree);
+    void* grown = ZYRSureRealloc(sure.get(), 400);
+    sure.release();
+    sure.reset(grown);
+    sure.reset(ZYRSureMalloc(24));
+    delete new OnClientBase;
+    CZYRSmartZYRRefPtr<CZYRSmartRefPtrContainer<int>> box(
+        CZYRSmartRefPtrContainer<int>::create(nullptr));
+    ZYRFixedSizePool pool(16, 4);
+    pool.Free(pool.SureAlloc());
+}
 
 } // namespace
 
@@ -165,92 +178,49 @@ TEST(CZYRErrorTest, UnexpectedHandlerGuardsNestAndRestore) {
     EXPECT_EQ(ZYRGetUnexpectedHandler(), original);
 }
 
-TEST_F(CZYRErrorStkTest, OrderFilterUniquenessAndTheRawInterface) {
-    report(u"a");
-    report(u"b");
-    EXPECT_EQ(fetch(), u"ba");
-    EXPECT_EQ(fetch(), u"<none>") << "fetching empties the stack";
-    report(u"c");
-    report(u"ab");
-    report(u"");
-    EXPECT_EQ(fetch(u"xxabyy"), u"c") << "the filter skips messages it contains";
-    report(u"same", true);
-    report(u"same", true);
-    std::thread([] { report(u"same", true); }).join();
-    EXPECT_EQ(fetch(), u"samesame") << "unique per thread";
+class FaultInjectionTest : public ::testing::TestWithParam<int> {};
 
-    uint32_t ids[2] = {};
-    for (int i = 0; i < 2; ++i)
-        std::thread([&ids, i] {
-            ids[i] = ZYRGetCurrentThreadId();
-            report(i == 0 ? u"1" : u"2");
-        }).join();
-    EXPECT_EQ(fetch(), ids[0] < ids[1] ? u"12" : u"21") << "threads in identifier order";
-
-    // The raw interface leaves the length alone when nothing is found.
-    C_Error err;
-    I_ErrorStk* raw = createErrorStk(err);
-    ASSERT_NE(raw, nullptr);
-    char16_t buffer[1025] = u"";
-    unsigned short length = 77;
-    EXPECT_FALSE(raw->getErrorMessage(buffer, &length));
-    EXPECT_EQ(length, 77);
-    raw->reportError(3, u"xyz", 0);
-    EXPECT_TRUE(raw->getErrorMessage(buffer, &length));
-    EXPECT_EQ(length, 3);
-    EXPECT_EQ(std::u16string(buffer), u"xyz");
-
-    report(u"lost");
-    TerminateErrorStk();
-    EXPECT_EQ(fetch(), u"<none>") << "a new stack starts empty";
-}
-
-TEST_F(CZYRErrorStkTest, LongMessagesAndResultsAreCutAt1024) {
-    report(std::u16string(2000, u'x').c_str());
-    EXPECT_EQ(fetch().size(), 1024u);
-    report(std::u16string(700, u'a').c_str());
-    report(std::u16string(700, u'b').c_str());
-    EXPECT_EQ(fetch(), std::u16string(700, u'b') + std::u16string(324, u'a'));
-}
-
-TEST_F(CZYRErrorStkTest, RefusedAllocationLeavesOneNotice) {
-    TerminateErrorStk(); // the very first notice also builds the stack
-    zyrtest::installFront(0);
-    ZYRSetMemLimit(400ull << 20);
-    const auto tooMuch = static_cast<unsigned int>((400ull << 20) - GetMemUsage() + 8);
-    EXPECT_EQ(ZYRMalloc(tooMuch), nullptr);
-    EXPECT_EQ(ZYRMalloc(tooMuch), nullptr);
-    EXPECT_EQ(fetch(), u"Insufficient Memory.\n") << "one unique notice for repeated refusals";
-
+TEST_P(FaultInjectionTest, EveryAllocationMayFail) {
     zyrtest::FailingHost host;
-    host.failAll = true;
     tZYRMemMgr record = host.record();
-    zyrtest::installFront(0, &record);
-    EXPECT_EQ(ZYRMalloc(16), nullptr);
-    EXPECT_EQ(fetch(), u"<none>") << "a failing host allocator is not reported";
+    zyrtest::installFront(GetParam(), &record);
+    CZYRErrorStk notices; // built before measuring; it lives for the process
+    workload();           // the dynamic string cache keeps its texts from now on
+    const unsigned long long baseline = GetMemUsage();
+    host.calls = 0;
+    workload();
+    const unsigned int callsPerRun = host.calls;
+    ASSERT_GT(callsPerRun, 10u);
+
+    std::u16string notice;
+    notices.getErrorMessage(notice); // what earlier tests left there
+    std::set<Fields> seen;
+    for (unsigned int failing = 1; failing <= callsPerRun; ++failing) {
+        host.calls = 0;
+        host.failAt = failing;
+        try {
+            workload();
+        } catch (const CZYRError& e) {
+            seen.insert(fields(e));
+        } catch (const std::bad_alloc&) {
+        }
+        host.failAt = 0;
+        ASSERT_EQ(GetMemUsage(), baseline) << "allocation " << failing << " failed";
+        notice.clear();
+        ASSERT_FALSE(notices.getErrorMessage(notice)) << "a failing host is no refusal to report";
+    }
+    for (const auto& [message, source, line] :
+         {std::tuple<const char*, const char*, int>{"(null)", "source/zyr/std/ZYRMem", 2042},
+          {"(null)", "source/zyr/std/ZYRMem", 2050},
+          {"(null)", "source/zyr/std/ZYRMem", 2058},
+          {"Mem error in ZYRStdAllocator", "source/zyr/std/CZYRStdAllocator", 94},
+          {"Memory alloc failed", "source/zyr/std/CZYRClientBase", 92},
+          {"allocating smart ptr container", "source/zyr/std/CZYRSmartPtr", 242},
+          {"ZYRFixedSizePool allocation failed", "source/zyr/std/ZYRPool", 102}})
+        EXPECT_TRUE(seen.count({kZYRErrorOutOfMemory, message, source, line, false}))
+            << message << " " << line;
     zyrtest::installFront(0);
 }
 
-TEST_F(CZYRErrorStkTest, OutOfMemoryNoticeFromAnyThreadIsSafeAgainstTerminate) {
-    zyrtest::installFront(0);
-    ZYRSetMemLimit(400ull << 20);
-    // Usage at the limit, so that every small request is refused without a large block.
-    DisableMemUsageCheck();
-    void* filler = ZYRMalloc(static_cast<unsigned int>((400ull << 20) - GetMemUsage()));
-    EnableMemUsageCheck();
-    ASSERT_NE(filler, nullptr);
-    std::atomic<bool> refusing{true};
-    std::thread renderer([&] {
-        for (int i = 0; i < 20000; ++i)
-            EXPECT_EQ(ZYRMalloc(64), nullptr);
-        refusing = false;
-    });
-    while (refusing)
-        TerminateErrorStk();
-    renderer.join();
-    TerminateErrorStk();
-    EXPECT_EQ(ZYRMalloc(64), nullptr);
-    EXPECT_EQ(fetch(), u"Insufficient Memory.\n");
-    ZYRFree(filler);
-    zyrtest::installFront(0);
-}
+// Plain and guarded fronts.
+INSTANTIATE_TEST_SUITE_P(StatisticsLevels, FaultInjectionTest, ::testing::Values(0, 1));

@@ -1,7 +1,9 @@
-// The allocation front: plain and guarded variants, the limit, the tracker, the leak report,
-// and the virtual-memory blocks and status under the same limit.
+// The allocation front: plain and guarded variants, the limit, the tracker and the leak report;
+// virtual-memory blocks and status under the same limit; and the error stack, where the
+// front's out-of-memory notice goes.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cstdint>
 #include <cstring>
@@ -24,15 +26,44 @@ using namespace ZYRStd;
 
 namespace {
 
-constexpr unsigned long long kMiB = 1024 * 1024;
-constexpr unsigned long long kLimit = 400 * kMiB; // the lowest limit that can be set
+constexpr unsigned long long kLimit = 400ull << 20; // the lowest limit that can be set
 
-// Each test starts from a freshly installed plain front and leaves the C runtime front behind.
+// Each test starts from a freshly installed plain front with an empty error stack, and leaves
+// the C runtime front behind.
 class ZYRMemTest : public ::testing::Test {
 protected:
-    void SetUp() override { zyrtest::installFront(0); }
-    void TearDown() override { zyrtest::installFront(0); }
+    void SetUp() override { reset(); }
+    void TearDown() override { reset(); }
+    static void reset() {
+        zyrtest::installFront(0);
+        fetch();
+    }
+
+public:
+    // The error stack's text, newest first per thread, except what `filter` contains; the
+    // fetch empties the stack.
+    static std::u16string fetch(std::u16string filter = u"") {
+        CZYRErrorStk stack;
+        return stack.getErrorMessage(filter) ? filter : u"<none>";
+    }
 };
+using CZYRErrorStkTest = ZYRMemTest;
+
+void report(const char16_t* text, bool unique = false) {
+    CZYRErrorStk stack;
+    unique ? stack.reportUniqueError(ZYRMakeErrorInfo(1, text))
+           : stack.reportError(ZYRMakeErrorInfo(1, text));
+}
+
+// Lowers the limit to kLimit and returns a block that takes usage to kLimit + `offset`.
+void* fillToLimit(long long offset = 0) {
+    ZYRSetMemLimit(kLimit);
+    DisableMemUsageCheck();
+    void* filler = ZYRMalloc(static_cast<unsigned int>(kLimit + offset - GetMemUsage()));
+    EnableMemUsageCheck();
+    EXPECT_NE(filler, nullptr);
+    return filler;
+}
 
 bool aligned16(const void* p) {
     return reinterpret_cast<uintptr_t>(p) % 16 == 0;
@@ -50,10 +81,6 @@ template <class Body> Thrown thrown(Body body) {
     return {};
 }
 
-Thrown frontError(int type, const char* message, int line) {
-    return {type, message, "source/zyr/std/ZYRMem", line};
-}
-
 std::vector<std::string> leakReport() {
     std::vector<std::string> lines;
     ZYRStdInit_ZYRMemMgrDumpMemList(
@@ -64,21 +91,13 @@ std::vector<std::string> leakReport() {
     return lines;
 }
 
-// The error stack's text, which the fetch empties.
-std::u16string fetchNotices() {
-    CZYRErrorStk stack;
-    std::u16string text;
-    return stack.getErrorMessage(text) ? text : u"<none>";
-}
-
 } // namespace
 
 // Edge cases, rounding and contents; a failing host gives null and leaves the block and the
 // accounting as they were.
 TEST_F(ZYRMemTest, PlainFrontEdgeCasesAndAccounting) {
-    constexpr int kOutOfMemory = ZYRPublic::kZYRErrorOutOfMemory;
-    EXPECT_EQ(thrown([] { (void)ZYRSureMalloc(0); }), frontError(kOutOfMemory, "(null)", 2042));
-    EXPECT_EQ(thrown([] { (void)ZYRSureCalloc(0, 8); }), frontError(kOutOfMemory, "(null)", 2050));
+    EXPECT_EQ(thrown([] { (void)ZYRSureMalloc(0); }),
+              Thrown(ZYRPublic::kZYRErrorOutOfMemory, "(null)", "source/zyr/std/ZYRMem", 2042));
     EXPECT_EQ(ZYRMalloc(0), nullptr);
     EXPECT_EQ(ZYRCalloc(0, 16), nullptr);
     EXPECT_EQ(ZYRMemSize(nullptr), 0u);
@@ -88,82 +107,64 @@ TEST_F(ZYRMemTest, PlainFrontEdgeCasesAndAccounting) {
     zyrtest::installFront(0, &record);
 
     const unsigned long long before = GetMemUsage();
-    void* p = ZYRMalloc(13);
-    ASSERT_NE(p, nullptr);
+    auto* p = static_cast<unsigned char*>(ZYRMalloc(13));
     EXPECT_TRUE(aligned16(p));
     EXPECT_EQ(ZYRMemSize(p), 13u);
     EXPECT_EQ(GetMemUsage(), before + 16) << "accounted size is rounded up to 8";
     EXPECT_EQ(ZYRRealloc(p, 0), p) << "resizing to 0 frees nothing";
     std::memset(p, 0x5A, 13);
-    p = ZYRRealloc(p, 100);
-    ASSERT_NE(p, nullptr);
+    p = static_cast<unsigned char*>(ZYRRealloc(p, 100));
     EXPECT_TRUE(aligned16(p));
-    EXPECT_EQ(static_cast<unsigned char*>(p)[12], 0x5A);
     EXPECT_EQ(GetMemUsage(), before + 104);
     host.failAll = true;
     EXPECT_EQ(ZYRMalloc(8), nullptr);
     EXPECT_EQ(ZYRRealloc(p, 4000), nullptr);
-    EXPECT_EQ(static_cast<unsigned char*>(p)[12], 0x5A);
     EXPECT_EQ(GetMemUsage(), before + 104);
     host.failAll = false;
-    p = ZYRRealloc(p, 20);
+    EXPECT_EQ(p[12], 0x5A) << "contents survive a resize and a failed one";
+    p = static_cast<unsigned char*>(ZYRRealloc(p, 20));
     EXPECT_EQ(GetMemUsage(), before + 24) << "shrinking gives bytes back";
     ZYRFree(p);
-    EXPECT_EQ(GetMemUsage(), before);
-
-    void* fresh = ZYRRealloc(nullptr, 24);
-    EXPECT_EQ(ZYRMemSize(fresh), 24u);
-    ZYRFree(fresh);
-    auto* zeroed = static_cast<unsigned char*>(ZYRCalloc(7, 9));
-    ASSERT_NE(zeroed, nullptr);
-    EXPECT_EQ(ZYRMemSize(zeroed), 63u);
-    for (int i = 0; i < 63; ++i)
-        ASSERT_EQ(zeroed[i], 0);
-    ZYRFree(zeroed);
+    p = static_cast<unsigned char*>(ZYRRealloc(nullptr, 24));
+    EXPECT_EQ(ZYRMemSize(p), 24u);
+    ZYRFree(p);
+    p = static_cast<unsigned char*>(ZYRCalloc(7, 9));
+    EXPECT_EQ(ZYRMemSize(p), 63u);
+    EXPECT_EQ(std::count(p, p + 63, 0), 63);
+    ZYRFree(p);
     EXPECT_EQ(GetMemUsage(), before);
 }
 
 TEST_F(ZYRMemTest, LimitTestAndNestedDisables) {
-    const CZYRErrorStk notices; // the refusal notice goes there; build it before measuring
     ZYRSetMemLimit(kLimit);
-    ASSERT_EQ(ZYRGetMemLimit(), kLimit);
     const unsigned long long used = GetMemUsage();
     const auto overBy8 = static_cast<unsigned int>(kLimit - used + 8);
-    EXPECT_EQ(ZYRMalloc(overBy8), nullptr);
-    EXPECT_EQ(GetMemUsage(), used) << "a refused allocation is not counted";
     void* small = ZYRMalloc(64);
-    ASSERT_NE(small, nullptr);
     EXPECT_EQ(ZYRRealloc(small, overBy8), nullptr);
     EXPECT_EQ(ZYRMemSize(small), 64u) << "a refused resize leaves the block valid";
-
-    DisableMemUsageCheck();
-    DisableMemUsageCheck();
-    void* big = ZYRMalloc(overBy8);
-    ASSERT_NE(big, nullptr);
-    EXPECT_EQ(GetMemUsage(), used + 64 + overBy8);
-    ZYRFree(big);
-    EnableMemUsageCheck();
-    big = ZYRMalloc(overBy8);
-    EXPECT_NE(big, nullptr) << "one enable does not undo two disables";
-    ZYRFree(big);
-    EnableMemUsageCheck();
-    EnableMemUsageCheck(); // a third enable changes nothing
-    DisableMemUsageCheck();
-    big = ZYRMalloc(overBy8);
-    EXPECT_NE(big, nullptr) << "the extra enable must not have been counted";
-    ZYRFree(big);
-    EnableMemUsageCheck();
-    EXPECT_EQ(ZYRMalloc(overBy8), nullptr);
     ZYRFree(small);
+    // Disables nest; an enable that would take the count above 1 is not counted.
+    const std::pair<void (*)(), bool> steps[] = {
+        {EnableMemUsageCheck, false}, {DisableMemUsageCheck, true}, {DisableMemUsageCheck, true},
+        {EnableMemUsageCheck, true},  {EnableMemUsageCheck, false}, {EnableMemUsageCheck, false},
+        {DisableMemUsageCheck, true}, {EnableMemUsageCheck, false}};
+    int index = 0;
+    for (const auto& [step, granted] : steps) {
+        step();
+        void* big = ZYRMalloc(overBy8);
+        EXPECT_EQ(big != nullptr, granted) << "step " << index++;
+        EXPECT_EQ(GetMemUsage(), used + (big ? overBy8 : 0)) << "a refused block is not counted";
+        ZYRFree(big);
+    }
 }
 
 TEST_F(ZYRMemTest, LimitSetterOnlyLowersAndClamps) {
     const unsigned long long machine = ZYRGetMemLimit();
-    ASSERT_GT(machine, 1024 * kMiB);
+    ASSERT_GT(machine, 1024ull << 20);
     ZYRSetMemLimit(machine + 1);
     EXPECT_EQ(ZYRGetMemLimit(), machine);
-    ZYRSetMemLimit(1024 * kMiB);
-    EXPECT_EQ(ZYRGetMemLimit(), 1024 * kMiB);
+    ZYRSetMemLimit(1024ull << 20);
+    EXPECT_EQ(ZYRGetMemLimit(), 1024ull << 20);
     EXPECT_EQ(ZYRGetMemReserve(), 314572800u);
     ZYRSetMemLimit(100000000);
     EXPECT_EQ(ZYRGetMemLimit(), 419430400u);
@@ -171,12 +172,9 @@ TEST_F(ZYRMemTest, LimitSetterOnlyLowersAndClamps) {
 }
 
 TEST_F(ZYRMemTest, RecentFreesAreReusedAndNeverRefuse) {
-    const CZYRErrorStk notices;
-    ZYRSetMemLimit(kLimit);
-    const auto room = static_cast<unsigned int>(kLimit - GetMemUsage());
-    void* filler = ZYRMalloc(room - 4096);
+    void* filler = fillToLimit(-4096);
     void* small = ZYRMalloc(4096);
-    ASSERT_TRUE(filler && small);
+    ASSERT_NE(small, nullptr);
     EXPECT_EQ(GetMemUsage(), kLimit);
     ZYRFree(small);
     EXPECT_EQ(GetMemUsage(), kLimit - 4096) << "a thread's own frees are always counted";
@@ -196,19 +194,15 @@ TEST_F(ZYRMemTest, RecentFreesAreReusedAndNeverRefuse) {
 }
 
 TEST_F(ZYRMemTest, FreedBytesAreNotReusedWhileUsageIsAboveTheLimit) {
-    ZYRSetMemLimit(kLimit);
     const unsigned long long used = GetMemUsage();
+    void* over = fillToLimit(4096);
     DisableMemUsageCheck();
-    void* over = ZYRMalloc(static_cast<unsigned int>(kLimit - used + 4096));
     void* recent = ZYRMalloc(2000);
     EnableMemUsageCheck();
-    ASSERT_TRUE(over && recent);
-    fetchNotices(); // start from an empty stack
+    fetch();
     ZYRFree(recent);
-    void* again = ZYRMalloc(2000);
-    EXPECT_EQ(again, nullptr) << "usage is still above the limit";
-    EXPECT_EQ(fetchNotices(), u"Insufficient Memory.\n");
-    ZYRFree(again);
+    EXPECT_EQ(ZYRMalloc(2000), nullptr) << "usage is still above the limit";
+    EXPECT_EQ(fetch(), u"Insufficient Memory.\n");
     ZYRFree(over);
     void* fits = ZYRMalloc(2000);
     EXPECT_NE(fits, nullptr) << "back under the limit";
@@ -221,10 +215,9 @@ TEST_F(ZYRMemTest, UsageCountsFreesOfOtherAndEndingThreads) {
     // The thread's only free is its record's, made while the thread is torn down.
     std::thread([] { SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("short", true)); }).join();
     EXPECT_EQ(GetMemUsage(), before);
-
-    void* block = ZYRMalloc(1000);
     // The freeing thread stays alive while the usage is read: its end would hand its pending
     // bytes back anyway.
+    void* block = ZYRMalloc(1000);
     std::promise<void> freed, done;
     std::thread renderer([&] {
         ZYRFree(block);
@@ -235,32 +228,6 @@ TEST_F(ZYRMemTest, UsageCountsFreesOfOtherAndEndingThreads) {
     EXPECT_EQ(GetMemUsage(), before);
     done.set_value();
     renderer.join();
-    EXPECT_EQ(GetMemUsage(), before);
-}
-
-TEST_F(ZYRMemTest, ConcurrentFrontKeepsTheTotalExact) {
-    for (int level : {0, 1}) {
-        zyrtest::installFront(level);
-        const unsigned long long before = GetMemUsage();
-        auto worker = [](unsigned int seed) {
-            std::vector<void*> live;
-            for (unsigned int i = 0; i < 20000; ++i) {
-                seed = seed * 1103515245 + 12345;
-                if (live.size() < 64 && (seed >> 16) % 3 != 0) {
-                    live.push_back(ZYRMalloc(16 + (seed >> 8) % 2048));
-                } else if (!live.empty()) {
-                    ZYRFree(live.back());
-                    live.pop_back();
-                }
-            }
-            for (void* p : live)
-                ZYRFree(p);
-        };
-        std::thread t1(worker, 1), t2(worker, 2);
-        t1.join();
-        t2.join();
-        EXPECT_EQ(GetMemUsage(), before) << "level " << level;
-    }
 }
 
 TEST_F(ZYRMemTest, ConcurrentAllocationsNeverPassTheLimit) {
@@ -268,7 +235,7 @@ TEST_F(ZYRMemTest, ConcurrentAllocationsNeverPassTheLimit) {
     const unsigned long long used = GetMemUsage();
     // Room for exactly 100 blocks of about 4 MiB; four threads race for 50 each.
     const auto blockSize = static_cast<unsigned int>((kLimit - used) / 100 / 8 * 8);
-    std::vector<std::vector<void*>> got(4);
+    std::vector<void*> got[4];
     std::vector<std::thread> threads;
     for (auto& mine : got)
         threads.emplace_back([&mine, blockSize] {
@@ -278,10 +245,7 @@ TEST_F(ZYRMemTest, ConcurrentAllocationsNeverPassTheLimit) {
         });
     for (auto& t : threads)
         t.join();
-    size_t granted = 0;
-    for (const auto& mine : got)
-        granted += mine.size();
-    EXPECT_EQ(granted, 100u);
+    EXPECT_EQ(got[0].size() + got[1].size() + got[2].size() + got[3].size(), 100u);
     EXPECT_LE(GetMemUsage(), kLimit);
     for (const auto& mine : got)
         for (void* p : mine)
@@ -293,24 +257,24 @@ TEST_F(ZYRMemTest, ConcurrentAllocationsNeverPassTheLimit) {
 // followed out of the block (level 1 trusts it only behind a sound head guard, level 2 only
 // when the allocation map confirms it).
 TEST_F(ZYRMemTest, GuardCheckFindsDamageWithoutReadingPastTheBlock) {
-    const Thrown invalid =
-        frontError(ZYRPublic::kZYRErrorFatal, "ZYRCheckZYRMemAllocPtr:: ptr is invalid", 2012);
+    const Thrown invalid{ZYRPublic::kZYRErrorFatal, "ZYRCheckZYRMemAllocPtr:: ptr is invalid",
+                         "source/zyr/std/ZYRMem", 2012};
+    auto check = [](void* p) { return thrown([p] { ZYRDbgCheckZYRMemAllocPtr(p); }); };
     for (int level : {1, 2}) {
         SCOPED_TRACE(level);
         zyrtest::installFront(level);
         auto* one = static_cast<unsigned char*>(ZYRMalloc(0));
-        ASSERT_NE(one, nullptr);
         EXPECT_TRUE(aligned16(one));
         EXPECT_EQ(ZYRMemSize(one), 1u);
-        EXPECT_EQ(thrown([&] { ZYRDbgCheckZYRMemAllocPtr(one); }), Thrown{});
-        EXPECT_EQ(thrown([] { ZYRDbgCheckZYRMemAllocPtr(nullptr); }), Thrown{});
+        EXPECT_EQ(check(one), Thrown{});
+        EXPECT_EQ(check(nullptr), Thrown{});
         one[1] = 0; // the first byte of the tail guard
-        EXPECT_EQ(thrown([&] { ZYRDbgCheckZYRMemAllocPtr(one); }), invalid);
+        EXPECT_EQ(check(one), invalid);
         ZYRFree(one);
 
         auto* block = static_cast<unsigned char*>(ZYRMalloc(32));
         block[-1] ^= 0xFF; // head guard
-        EXPECT_EQ(thrown([&] { ZYRDbgCheckZYRMemAllocPtr(block); }), invalid);
+        EXPECT_EQ(check(block), invalid);
         block[-1] ^= 0xFF;
         uint32_t size;
         std::memcpy(&size, block - 16, sizeof size);
@@ -318,13 +282,12 @@ TEST_F(ZYRMemTest, GuardCheckFindsDamageWithoutReadingPastTheBlock) {
         const uint32_t wild = 0xFFFFFF00u; // reading the tail there would fault
         std::memcpy(block - 16, &wild, sizeof wild);
         block[-1] ^= level == 1 ? 0xFF : 0;
-        EXPECT_EQ(thrown([&] { ZYRDbgCheckZYRMemAllocPtr(block); }), invalid);
+        EXPECT_EQ(check(block), invalid);
         block[-1] ^= level == 1 ? 0xFF : 0;
         std::memcpy(block - 16, &size, sizeof size);
         block = static_cast<unsigned char*>(ZYRRealloc(block, 100));
         EXPECT_EQ(ZYRMemSize(block), 100u);
-        EXPECT_EQ(thrown([&] { ZYRDbgCheckZYRMemAllocPtr(block); }), Thrown{})
-            << "guards and map follow a resize";
+        EXPECT_EQ(check(block), Thrown{}) << "guards and map follow a resize";
         ZYRFree(block);
     }
 }
@@ -384,9 +347,7 @@ TEST_F(ZYRMemTest, TrackerCountsAndLeakReport) {
     ZYRFree(c);
     s = ZYRMemMgr_dbgMemState();
     EXPECT_EQ(std::tie(s.freeCount, s.currentBytes, s.peakBytes), std::make_tuple(3u, 0u, 312u));
-    const std::vector<std::string> after = leakReport();
-    ASSERT_EQ(after.size(), 3u);
-    EXPECT_EQ(after[1], "ZYRMem: Total Leaked: 0 bytes\n");
+    EXPECT_EQ(leakReport().at(1), "ZYRMem: Total Leaked: 0 bytes\n");
     zyrtest::installFront(0);
     s = ZYRMemMgr_dbgMemState();
     EXPECT_EQ(std::tie(s.allocCount, s.peakBytes), std::make_tuple(0u, 0u)) << "level 0: none";
@@ -410,7 +371,6 @@ TEST_F(ZYRMemTest, VirtualBlocksAreCountedAndDecommittedByWholePages) {
     EXPECT_EQ(VirtualMemAlloc(0), nullptr);
     const unsigned long long before = GetMemUsage();
     auto* block = static_cast<unsigned char*>(VirtualMemAlloc(4 * page + 1));
-    ASSERT_NE(block, nullptr);
     EXPECT_EQ(GetMemUsage(), before + 5ull * page) << "counted in whole pages";
     std::memset(block, 0xAB, 5 * page);
     // Every page the range touches goes: pages 0 to 3 here.
@@ -427,7 +387,6 @@ TEST_F(ZYRMemTest, VirtualBlocksAreCountedAndDecommittedByWholePages) {
 
     zyrtest::installFront(2);
     block = static_cast<unsigned char*>(VirtualMemAlloc(3 * page));
-    ASSERT_NE(block, nullptr);
     EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 3 * page);
     VirtualMemDecommit(block, block + page, 1);
     EXPECT_EQ(ZYRMemMgr_dbgMemState().currentBytes, 2 * page);
@@ -453,15 +412,10 @@ TEST_F(ZYRMemTest, StatusKeepsTheReserveBack) {
     EXPECT_LE(info.availablePhysical, info.totalPhysical);
     EXPECT_GT(info.totalVirtual, 0u);
     EXPECT_LE(info.availableForAllocation, ZYRGetMemLimit() - ZYRGetMemReserve());
-    // Usage at the limit: nothing is left to hand out.
-    ZYRSetMemLimit(kLimit);
-    DisableMemUsageCheck();
-    void* filler = ZYRMalloc(static_cast<unsigned int>(kLimit - GetMemUsage()));
-    ASSERT_NE(filler, nullptr);
+    void* filler = fillToLimit();
     VirtualMemStatus(&info);
-    EXPECT_EQ(info.availableForAllocation, 0u);
+    EXPECT_EQ(info.availableForAllocation, 0u) << "usage at the limit: nothing to hand out";
     ZYRFree(filler);
-    EnableMemUsageCheck();
     ZYRSetTestAvailablePhysicalMemory(false);
     VirtualMemStatus(&info);
     EXPECT_EQ(info.availablePhysical, info.totalPhysical);
@@ -504,4 +458,73 @@ TEST_F(ZYRMemTest, CgroupCapIsTheProcessesOwnGroup) {
     tZYRVirtualMemoryInfo info{};
     VirtualMemStatus(&info);
     EXPECT_LE(info.totalVirtual, detail::cgroupMemoryLimit("/proc/self/cgroup", "/sys/fs/cgroup"));
+}
+
+TEST_F(CZYRErrorStkTest, OrderFilterUniquenessAndTheRawInterface) {
+    report(u"a");
+    report(u"b");
+    EXPECT_EQ(fetch(), u"ba");
+    EXPECT_EQ(fetch(), u"<none>") << "fetching empties the stack";
+    report(u"c");
+    report(u"ab");
+    report(u"");
+    EXPECT_EQ(fetch(u"xxabyy"), u"c") << "the filter skips messages it contains";
+    report(u"same", true);
+    report(u"same", true);
+    std::thread([] { report(u"same", true); }).join();
+    EXPECT_EQ(fetch(), u"samesame") << "unique per thread";
+    uint32_t ids[2] = {};
+    for (int i = 0; i < 2; ++i)
+        std::thread([&ids, i] {
+            ids[i] = ZYRGetCurrentThreadId();
+            report(i == 0 ? u"1" : u"2");
+        }).join();
+    EXPECT_EQ(fetch(), ids[0] < ids[1] ? u"12" : u"21") << "threads in identifier order";
+    report(std::u16string(2000, u'x').c_str());
+    EXPECT_EQ(fetch().size(), 1024u) << "messages and results are cut at 1024";
+    report(std::u16string(700, u'a').c_str());
+    report(std::u16string(700, u'b').c_str());
+    EXPECT_EQ(fetch(), std::u16string(700, u'b') + std::u16string(324, u'a'));
+
+    // The raw interface leaves the length alone when nothing is found.
+    C_Error err;
+    I_ErrorStk* raw = createErrorStk(err);
+    char16_t buffer[1025] = u"";
+    unsigned short length = 77;
+    EXPECT_FALSE(raw->getErrorMessage(buffer, &length));
+    EXPECT_EQ(length, 77);
+    raw->reportError(3, u"xyz", 0);
+    EXPECT_TRUE(raw->getErrorMessage(buffer, &length));
+    EXPECT_EQ(length, 3);
+    EXPECT_EQ(std::u16string(buffer), u"xyz");
+    report(u"lost");
+    TerminateErrorStk();
+    EXPECT_EQ(fetch(), u"<none>") << "a new stack starts empty";
+}
+
+TEST_F(CZYRErrorStkTest, RefusedAllocationsLeaveOneNotice) {
+    TerminateErrorStk(); // the very first notice also builds the stack
+    ZYRSetMemLimit(kLimit);
+    const auto tooMuch = static_cast<unsigned int>(kLimit - GetMemUsage() + 8);
+    EXPECT_EQ(ZYRMalloc(tooMuch), nullptr);
+    EXPECT_EQ(ZYRMalloc(tooMuch), nullptr);
+    EXPECT_EQ(fetch(), u"Insufficient Memory.\n") << "one unique notice for repeated refusals";
+}
+
+TEST_F(CZYRErrorStkTest, OutOfMemoryNoticeFromAnyThreadIsSafeAgainstTerminate) {
+    // Usage at the limit, so that every small request is refused without a large block.
+    void* filler = fillToLimit();
+    std::atomic<bool> refusing{true};
+    std::thread renderer([&] {
+        for (int i = 0; i < 20000; ++i)
+            EXPECT_EQ(ZYRMalloc(64), nullptr);
+        refusing = false;
+    });
+    while (refusing)
+        TerminateErrorStk();
+    renderer.join();
+    TerminateErrorStk();
+    EXPECT_EQ(ZYRMalloc(64), nullptr);
+    EXPECT_EQ(fetch(), u"Insufficient Memory.\n");
+    ZYRFree(filler);
 }

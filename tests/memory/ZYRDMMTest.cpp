@@ -24,38 +24,30 @@ using ZYRPublic::eFlushMemorySeverityUrgent;
 
 namespace {
 
-// A cache that reports a size and answers flush requests as told.
-class FakeClient : public I_FlushableMemoryClient {
-public:
-    FakeClient(const char* name, unsigned int size, bool answer = false)
-        : name_(name), size_(size), answer_(answer) {}
-
+// A cache that reports a size, counts how often it is asked for it, and answers flush
+// requests as told (no answer: it frees nothing).
+struct FakeClient : I_FlushableMemoryClient {
+    FakeClient(const char* name, unsigned int size, std::function<bool(unsigned int)> answer = {})
+        : name(name), size(size), answer(std::move(answer)) {}
     bool flushMemory(unsigned int bytesNeeded, unsigned int reserved,
                      eFlushMemorySeverity severity) override {
         EXPECT_EQ(reserved, 0u);
         requests.push_back(bytesNeeded);
         severities.push_back(severity);
-        const bool freed = answerFor ? answerFor(bytesNeeded) : answer_;
-        if (freed && onFlush)
-            onFlush();
-        return freed;
+        return answer && answer(bytesNeeded);
     }
-    unsigned int getFlushableMemorySize() override { return size_; }
-    const char* getClientName() override { return name_; }
+    unsigned int getFlushableMemorySize() override { return ++sizeQueries, size; }
+    const char* getClientName() override { return name; }
 
+    const char* name;
+    unsigned int size;
+    std::function<bool(unsigned int)> answer;
     std::vector<unsigned int> requests;
     std::vector<eFlushMemorySeverity> severities;
-    std::function<bool(unsigned int)> answerFor;
-    std::function<void()> onFlush;
-
-private:
-    const char* name_;
-    unsigned int size_;
-    bool answer_;
+    unsigned int sizeQueries = 0;
 };
 
-class FakeQueue : public ZYRPublic::I_SurfaceQueue {
-public:
+struct FakeQueue : ZYRPublic::I_SurfaceQueue {
     bool synchronize(bool noWait) override {
         EXPECT_FALSE(noWait);
         ++calls;
@@ -66,6 +58,8 @@ public:
     int calls = 0;
     std::function<void()> onSync;
 };
+
+const auto yes = [](unsigned int) { return true; };
 
 class ZYRDMMTest : public ::testing::Test {
 protected:
@@ -138,8 +132,11 @@ TEST_F(ZYRDMMTest, NormalFlushAsksOnlyClientsLargeEnoughLargestFirst) {
     EXPECT_EQ(large.requests, std::vector<unsigned int>{40});
     EXPECT_TRUE(middle.requests.empty());
     EXPECT_TRUE(small.requests.empty());
+    // Sizes are asked afresh at each of the sort's 3 comparisons and for each of 3 clients,
+    // then before and after the flush, at the next client, and for the status line.
+    EXPECT_EQ(small.sizeQueries + large.sizeQueries + middle.sizeQueries, 10u);
 
-    middle.answerFor = [](unsigned int) { return true; };
+    middle.answer = yes;
     EXPECT_TRUE(ZYRFlushMemory(nullptr, 40, eFlushMemorySeverityUrgent));
     EXPECT_EQ(large.requests.size(), 2u);
     EXPECT_EQ(middle.requests.size(), 1u);
@@ -177,7 +174,7 @@ TEST_F(ZYRDMMTest, RequesterIsNeverAskedAndNinthClientIsIgnored) {
 
 TEST_F(ZYRDMMTest, LadderDoublesTheDemandThenTriesOneUrgentFlush) {
     FakeClient cache("cache", 1u << 30);
-    cache.answerFor = [](unsigned int need) { return need < 800; };
+    cache.answer = [](unsigned int need) { return need < 800; };
     add(cache);
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(100), nullptr);
@@ -200,7 +197,7 @@ TEST_F(ZYRDMMTest, LadderDoublesTheDemandThenTriesOneUrgentFlush) {
 }
 
 TEST_F(ZYRDMMTest, ClientThatLiesCannotKeepTheLadderGoing) {
-    FakeClient liar("liar", ~0u, true);
+    FakeClient liar("liar", ~0u, yes);
     add(liar);
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(64), nullptr);
@@ -208,8 +205,7 @@ TEST_F(ZYRDMMTest, ClientThatLiesCannotKeepTheLadderGoing) {
 }
 
 TEST_F(ZYRDMMTest, SuccessfulFlushLetsTheRetrySucceed) {
-    FakeClient cache("cache", 4096, true);
-    cache.onFlush = [this] { host_.failAll = false; };
+    FakeClient cache("cache", 4096, [this](unsigned int) { return !(host_.failAll = false); });
     add(cache);
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(100, &cache), nullptr) << "the requester is the only client: skipped";
@@ -228,7 +224,7 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
         host_.failAll = false;
     };
     RegisterSurfaceQueueInstance(&queue);
-    FakeClient cache("cache", 1 << 30, true);
+    FakeClient cache("cache", 1 << 30, yes);
     add(cache);
     host_.failAll = true;
     void* p = dmmMalloc(1000);
@@ -236,6 +232,9 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
     EXPECT_EQ(queue.calls, 1);
     EXPECT_TRUE(cache.requests.empty());
     ZYRFree(p);
+    void* more = ZYRMalloc(4000);
+    queue.onSync = [&] { ZYRFree(more); };
+    EXPECT_FALSE(ArrangeMemoryBySyncRendererThread(4000, true)) << "the drop must exceed the need";
     EXPECT_TRUE(has(closeLog(), "---- Memory allocation succeed after SyncRendererThread for "
                                 "Client : <TEST> , [memory needed = 1000 bytes ]  \n"));
 }
@@ -268,7 +267,7 @@ TEST_F(ZYRDMMTest, WhatTheRendererThreadFreesCountsAsADrop) {
 TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
     FakeQueue queue;
     RegisterSurfaceQueueInstance(&queue);
-    FakeClient cache("cache", 1 << 30, true);
+    FakeClient cache("cache", 1 << 30, yes);
     add(cache);
     host_.failAll = true;
     std::thread([this] {
@@ -311,7 +310,7 @@ TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
 }
 
 TEST_F(ZYRDMMTest, ThreadSafeFlushUsesItsOwnListAndStoredSizes) {
-    FakeClient everywhere("everywhere", 100, true), mainOnly("mainOnly", 500, true);
+    FakeClient everywhere("everywhere", 100, yes), mainOnly("mainOnly", 500, yes);
     add(everywhere, true);
     add(mainOnly);
     EXPECT_TRUE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
@@ -367,7 +366,7 @@ TEST_F(ZYRDMMTest, OversizedJovBlockIsRefusedSilently) {
 }
 
 TEST_F(ZYRDMMTest, TumaLadderFlushesThenGivesUp) {
-    FakeClient cache("cache", 1 << 30, true);
+    FakeClient cache("cache", 1 << 30, yes);
     add(cache);
     host_.failAll = true;
     EXPECT_EQ(DMM_TUMAAlloc(nullptr, 64), nullptr);
@@ -404,7 +403,7 @@ TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
     std::promise<void> flushing, release;
     std::shared_future<void> released = release.get_future().share();
     FakeClient slow("slow", 1000), other("other", 23);
-    slow.answerFor = [&](unsigned int) {
+    slow.answer = [&](unsigned int) {
         flushing.set_value();
         released.wait();
         return false;
