@@ -343,10 +343,17 @@ int32_t clamp32(i128 v) {
     return v > kMax ? kMax : v < kMin ? kMin : static_cast<int32_t>(v);
 }
 
+// The exact results, saturated; a division by zero saturates by the sign of the rest.
 int32_t refFixedMulDiv(int32_t a, int32_t b, int32_t c, bool rounded) {
     if (c == 0)
         return ((a < 0) + (b < 0)) % 2 ? kMin : kMax;
     return clamp32(rounded ? nearest(i128{a} * b, c) : i128{a} * b / c);
+}
+
+int32_t refDiv(int32_t a, int32_t b, int shift, bool rounded) {
+    if (b == 0)
+        return a < 0 ? kMin : kMax;
+    return clamp32(rounded ? nearest(i128{a} << shift, b) : (i128{a} << shift) / b);
 }
 
 int32_t refPFloatToFixed(float x) {
@@ -361,20 +368,18 @@ int32_t toFixed(float x) {
     return PFloatToFixed(&x);
 }
 
-// Rows of {a, b, expected}.
-template <size_t N>
-void expectAll(const char* name, int32_t (*f)(int32_t, int32_t), const int32_t (&rows)[N][3]) {
-    for (const auto& r : rows)
-        EXPECT_EQ(f(r[0], r[1]), r[2]) << name << "(" << r[0] << ", " << r[1] << ")";
-}
+// Signs and zeros, halves, one unit either side of each extreme, and past faults: products of
+// more than 53 bits and quotients near a half that a double would round the wrong way, and
+// 65535 * 65537 / 2 = 2^31 - 0.5 and 641 * 6700417 / 2 = 2^31 + 0.5.
+constexpr int32_t kSpecial[] = {
+    0,          1,          -1,         2,          3,           -5,         kOne,       -kOne,
+    kOne + 1,   3 * kOne,   -3 * kOne,  0x18000,    kFrac,       -kFrac,     kFrac + 1,  kFrac - 1,
+    0x20000000, 0x1FFFFFFF, kMin,       kMax,       kMin + 1,    kMax - 1,   0x7FFF,     0x8000,
+    -0x8000,    -0x8001,    0x7FFF0000, 0x3172c8f0, -0x3172c8f0, 0x2a92a8b3, 0x57046cea, 0x72bbc2b1,
+    65535,      -65535,     65537,      641,        -641,        6700417};
 
-// Operands of every scale: full range, a random bit length, small values and the extremes.
+// Operands of every scale: full range, a random bit length, small values and the specials.
 int32_t operand(std::mt19937_64& rng) {
-    static constexpr int32_t special[] = {
-        0,         1,          -1,         2,       3,         kOne,     -kOne,
-        kOne + 1,  3 * kOne,   -3 * kOne,  0x18000, kFrac,     -kFrac,   kFrac + 1,
-        kFrac - 1, 0x20000000, 0x1FFFFFFF, kMin,    kMax,      kMin + 1, kMax - 1,
-        0x7FFF,    0x8000,     -0x8000,    -0x8001, 0x7FFF0000};
     const uint64_t r = rng();
     const auto high = static_cast<int32_t>(r >> 32);
     switch (r % 4) {
@@ -385,86 +390,55 @@ int32_t operand(std::mt19937_64& rng) {
     case 2:
         return high >> 14;
     default:
-        return special[(r >> 32) % std::size(special)];
+        return kSpecial[(r >> 32) % std::size(kSpecial)];
     }
 }
 
-// The random sweep below meets every pair of the special operands, the extremes among them;
-// these rows are the cases it cannot find: division by zero and products or quotients near a
-// half that a double would round the wrong way.
-TEST(ZYRFixedTest, ProductsAndQuotientsRoundAndSaturate) {
-    // clang-format off
-    const int32_t fracmulRows[][3] = {
-        {0x3172c8f0, 0x2a92a8b3, 551855119}, {-0x3172c8f0, 0x2a92a8b3, -551855119},
-    };
-    const int32_t tFixedDivRows[][3] = {{-5, 0, kMin}, {kMin, 0, kMin}, {0, 0, kMax}, {5, 0, kMax}};
-    const int32_t fixratioRows[][3] = {
-        {-5, 0, kMin}, {kMin, 0, kMin}, {0, 0, kMax}, {5, 0, kMax},
-        {0x57046cea, 0x72bbc2b1, 814358052},
-    };
-    // clang-format on
-    expectAll("fracmul", fracmul, fracmulRows);
-    expectAll("TFixedDiv", TFixedDiv, tFixedDivRows);
-    expectAll("fixratio", fixratio, fixratioRows);
+// Every function on one pair or triple of operands against exact arithmetic.
+::testing::AssertionResult exact(int32_t a, int32_t b, int32_t c, bool rounded) {
+    const i128 p = i128{a} * b;
+    if (FixedMul(a, b) != clamp32(nearest(p, 1 << 16)) ||
+        fracmul(a, b) != clamp32(nearest(p, 1 << 30)) ||
+        TFixedDiv(a, b) != refDiv(a, b, 16, false) || fixratio(a, b) != refDiv(a, b, 30, true) ||
+        FixedMulDiv(a, b, c, rounded) != refFixedMulDiv(a, b, c, rounded))
+        return ::testing::AssertionFailure()
+               << a << ", " << b << ", " << c << (rounded ? " rounded" : "");
+    return ::testing::AssertionSuccess();
 }
 
-TEST(ZYRFixedTest, FixedMulDivSignsRoundingAndOverflow) {
-    EXPECT_EQ(FixedMulDiv(0x40000000, 0x40000000, 0x40000000, false), 0x40000000);
-    // Rows of {a, b, c, rounded, expected}: halves, division by zero, the extremes;
-    // 65535 * 65537 / 2 is 2^31 - 0.5 (fits truncated, overflows once rounded), 641 * 6700417 / 2
-    // is 2^31 + 0.5.
-    // clang-format off
-    const int32_t rows[][5] = {
-        {7, 1, -2, 1, -4}, {-7, -1, -2, 0, -3}, {5, 1, 3, 1, 2}, {4, 1, 3, 1, 1},
-        {1, 1, 0, 0, kMax}, {-1, 1, 0, 1, kMin}, {-1, -1, 0, 0, kMax}, {0, 0, 0, 0, kMax},
-        {kMax, 1, 1, 0, kMax}, {0x40000000, 2, 1, 0, kMax}, {kMin, 1, 1, 0, kMin},
-        {kMin, -1, 1, 0, kMax}, {kMin, kMin, kMin, 0, kMin}, {65535, 65537, 2, 0, kMax},
-        {-65535, 65537, 2, 0, kMin + 1}, {-65535, 65537, 2, 1, kMin}, {-641, 6700417, 2, 0, kMin},
-        {641, 6700417, 2, 0, kMax},
-    };
-    // clang-format on
-    for (const auto& r : rows)
-        EXPECT_EQ(FixedMulDiv(r[0], r[1], r[2], r[3] != 0), r[4])
-            << r[0] << " * " << r[1] << " / " << r[2] << (r[3] ? " rounded" : "");
+TEST(ZYRFixedTest, EverySpecialCombinationIsExact) {
+    // A few known answers anchor the reference itself.
+    EXPECT_EQ(fracmul(0x3172c8f0, 0x2a92a8b3), 551855119);
+    EXPECT_EQ(fixratio(0x57046cea, 0x72bbc2b1), 814358052);
+    EXPECT_EQ(FixedMul(0x00018000, 0x00018000), 0x00024000);
+    EXPECT_EQ(TFixedDiv(0x00010000, 0x00030000), 0x5555);
+    EXPECT_EQ(FixedMulDiv(-65535, 65537, 2, false), kMin + 1);
+    EXPECT_EQ(FixedMulDiv(-65535, 65537, 2, true), kMin);
+    for (const int32_t a : kSpecial)
+        for (const int32_t b : kSpecial)
+            for (const int32_t c : kSpecial)
+                for (const bool rounded : {false, true})
+                    ASSERT_TRUE(exact(a, b, c, rounded));
 }
 
 TEST(ZYRFixedTest, PFloatToFixedRoundsAndSaturates) {
     const float half = 0.5f / 65536;
     const float inf = std::numeric_limits<float>::infinity();
-    const struct {
-        float x;
-        int32_t want;
-    } cases[] = {
-        // clang-format off
-        {1.5f, 0x00018000}, {-0.5f, static_cast<int32_t>(0xFFFF8000)}, {-0.0f, 0},
-        {32768.0f, kMax}, {-32768.0f, kMin}, {1e10f, kMax}, {-1e10f, kMin},
-        {std::nextafter(32768.0f, 0.0f), 0x7FFFFF80}, {std::nextafter(-32768.0f, 0.0f), -0x7FFFFF80},
-        {std::nextafter(-32768.0f, -inf), kMin}, {half, 1}, {-half, -1},
-        {std::nextafter(half, 0.0f), 0}, {-std::nextafter(half, 0.0f), 0},
-        // 2^23 + 1 units is exact and must not round to an even neighbour.
-        {8388609.0f / 65536, 8388609}, {-8388609.0f / 65536, -8388609},
-        {inf, kMax}, {-inf, kMin}, {std::numeric_limits<float>::quiet_NaN(), 0},
-        // clang-format on
-    };
-    for (const auto& c : cases)
-        EXPECT_EQ(toFixed(c.x), c.want) << "PFloatToFixed(" << c.x << ")";
+    EXPECT_EQ(toFixed(1.5f), 0x00018000);
+    EXPECT_EQ(toFixed(std::nextafter(32768.0f, 0.0f)), 0x7FFFFF80);
+    // 2^23 + 1 units is exact and must not round to an even neighbour.
+    for (const float x :
+         {-0.5f, -0.0f, 32768.0f, -32768.0f, 1e10f, -1e10f, std::nextafter(32768.0f, 0.0f),
+          std::nextafter(-32768.0f, 0.0f), std::nextafter(-32768.0f, -inf), half, -half,
+          std::nextafter(half, 0.0f), -std::nextafter(half, 0.0f), 8388609.0f / 65536,
+          -8388609.0f / 65536, inf, -inf, std::numeric_limits<float>::quiet_NaN()})
+        EXPECT_EQ(toFixed(x), refPFloatToFixed(x)) << "PFloatToFixed(" << x << ")";
 }
 
 TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
     std::mt19937_64 rng(20240611);
     for (int i = 0; i < 1000000; ++i) {
-        const int32_t a = operand(rng), b = operand(rng), c = operand(rng);
-        const i128 p = i128{a} * b;
-        ASSERT_EQ(FixedMul(a, b), clamp32(nearest(p, 1 << 16))) << a << " * " << b;
-        ASSERT_EQ(fracmul(a, b), clamp32(nearest(p, 1 << 30))) << a << " * " << b;
-        if (b != 0) {
-            ASSERT_EQ(TFixedDiv(a, b), clamp32((i128{a} << 16) / b)) << a << " / " << b;
-            ASSERT_EQ(fixratio(a, b), clamp32(nearest(i128{a} << 30, b))) << a << " / " << b;
-        }
-        const bool rounded = (i & 1) != 0;
-        ASSERT_EQ(FixedMulDiv(a, b, c, rounded), refFixedMulDiv(a, b, c, rounded))
-            << a << " * " << b << " / " << c << (rounded ? " rounded" : "");
-
+        ASSERT_TRUE(exact(operand(rng), operand(rng), operand(rng), (i & 1) != 0));
         // Half arbitrary bit patterns (NaNs, infinities, subnormals), half ordinary values.
         const uint64_t r = rng();
         const float x = (i & 1) ? std::bit_cast<float>(static_cast<uint32_t>(r))
