@@ -5,6 +5,7 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "Kelvrin.h"
@@ -42,8 +43,7 @@ extern "C" {
 // The test side: take the recorded calls (and forget them), and set the behaviour.
 KELVRIN_API void RecordingTakeCalls(std::vector<std::string>& out) {
     const std::lock_guard guard(callsLock);
-    out = std::move(calls);
-    calls.clear();
+    out = std::exchange(calls, {});
 }
 KELVRIN_API void RecordingSetDelay(int ms) {
     delayMs = ms;

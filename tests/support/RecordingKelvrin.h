@@ -26,8 +26,7 @@ public:
         take_(calls);
         return calls;
     }
-    // Each call sleeps this long before it is recorded.
-    void setDelay(int ms) { setDelay_(ms); }
+    void setDelay(int ms) { setDelay_(ms); } // each call sleeps this long before it is recorded
     void refuseSessions(bool refuse) { refuse_(refuse); }
     int callsStarted() { return started_(); }
     // Waits (up to 10 s) until `count` calls were recorded since the last take.
@@ -43,20 +42,18 @@ public:
     }
 
 private:
-    RecordingKelvrin() {
-        handle_ = dlopen(ZYRSTD_RECORDING_KELVRIN, RTLD_NOW | RTLD_GLOBAL);
+    RecordingKelvrin() : handle_(dlopen(ZYRSTD_RECORDING_KELVRIN, RTLD_NOW | RTLD_GLOBAL)) {
         if (!handle_)
             throw std::runtime_error(dlerror());
-        take_ = symbol<void (*)(std::vector<std::string>&)>("RecordingTakeCalls");
-        setDelay_ = symbol<void (*)(int)>("RecordingSetDelay");
-        refuse_ = symbol<void (*)(bool)>("RecordingRefuseSessions");
-        started_ = symbol<int (*)()>("RecordingCallsStarted");
+        symbol(take_, "RecordingTakeCalls");
+        symbol(setDelay_, "RecordingSetDelay");
+        symbol(refuse_, "RecordingRefuseSessions");
+        symbol(started_, "RecordingCallsStarted");
     }
-    template <class F> F symbol(const char* name) {
-        auto* f = reinterpret_cast<F>(dlsym(handle_, name));
+    template <class F> void symbol(F& f, const char* name) {
+        f = reinterpret_cast<F>(dlsym(handle_, name));
         if (!f)
             throw std::runtime_error(name);
-        return f;
     }
 
     void* handle_ = nullptr;
