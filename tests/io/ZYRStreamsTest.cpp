@@ -188,14 +188,13 @@ TEST(ZYRStreamsTest, WrappersForwardAndCount) {
     ZYRStd::CZYRBaseStream s(kZYRStreamRead | kZYRStreamWrite, 16, nullptr);
     ASSERT_TRUE(s.isValid());
     EXPECT_EQ(s.write("abc", 1, 3), 3u);
-    s.setPos(0);
-    char out[3];
-    EXPECT_EQ(s.read(out, 1, 3), 3u);
-    EXPECT_EQ(std::string(out, 3), "abc");
-    EXPECT_EQ(s.getCapacity(), 16u);
-    EXPECT_EQ(s.getAccessMode(), kZYRStreamRead | kZYRStreamWrite);
+    s.setPos(1);
+    s.setEOF();
+    EXPECT_EQ(s.getPos(), 3u);
+    s.reOpen(kZYRStreamRead | kZYRStreamAppend);
+    EXPECT_EQ(s.getAccessMode(), kZYRStreamRead | kZYRStreamAppend);
     ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
-    EXPECT_EQ(s.write(out, 1, 20, err), 0u);
+    EXPECT_EQ(s.write("x", 1, 20, err), 0u);
     EXPECT_EQ(err, ZYRPublic::kZYRErrorInvalidData);
     EXPECT_FALSE(s.isShared());
     {
