@@ -298,6 +298,13 @@ TEST_P(FileStreamTest, TemporaryFiles) {
     EXPECT_FALSE(exists(otherPath));
 
     if (!GetParam()) {
+        // Natively: at most three characters of the prefix, six random ones and ".TMP".
+        EXPECT_EQ(path.size() - fx_.dir_.path().size(), 1u + 3 + 6 + 4) << path;
+        EXPECT_EQ(path.substr(path.size() - 4), ".TMP");
+        const auto bare = CZYRFileSys::createTmpFileStream(
+            CZYRFileName((fx_.dir_.path() + "/").c_str()), nullptr, kZYRStreamWrite);
+        EXPECT_EQ(utf8(bare->getFilePath()).size() - fx_.dir_.path().size(), 1u + 6 + 4)
+            << "no prefix, and one separator";
         const CZYRFileName nowhere(fx_.dir_.file("no/such/dir").c_str());
         expectOpFailed([&] { CZYRFileSys::createTmpFileStream(nowhere, u"x", kZYRStreamWrite); },
                        "File rename failed");
@@ -335,6 +342,9 @@ TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
     EXPECT_TRUE(fx.open(path, kZYRStreamRead)->isOpen()) << "the narrow procedure stands in";
     fx.record_.pathToDIPath = nullptr;
     expectOpFailed([&] { fx.open(path, kZYRStreamRead); }, "pathFromDIPath not implemented");
+    fx.record_.tempFile = nullptr;
+    expectError([&] { CZYRFileSys::createTmpFileStream(CZYRFileName(path.c_str()), u"t", 0); },
+                ZYRPublic::kZYRErrorInvalidFuncCall, "tempFile proc not defined");
     // A path the host cannot turn into a DI path gives no stream.
     fx.record_ = ZYRHostKit::posixFileProcs();
     EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true));
@@ -585,7 +595,15 @@ TEST_F(FileOperationsTest, MappedStreams) {
         char buf[100];
         EXPECT_EQ(window.read(buf, 1, 100), 100u);
         EXPECT_EQ(std::string(buf, 100), content.substr(4099, 100));
+        window.setPos(5);
+        window.setEOF();
+        EXPECT_EQ(window.getPos(), 100u);
         EXPECT_EQ(window.getSize(), 100u);
+        ASSERT_EQ(::truncate(path.c_str(), 4099 + 10), 0);
+        EXPECT_EQ(window.getSize(), 10u) << "only what is left of a file that shrank";
+        ASSERT_EQ(::truncate(path.c_str(), 4000), 0);
+        EXPECT_EQ(window.getSize(), 0u);
+        writeFile(path, content);
     }
 
     expectOpFailed(
