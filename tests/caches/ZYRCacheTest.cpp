@@ -652,7 +652,7 @@ bool allZero(const unsigned char* p, unsigned int n) {
     return true;
 }
 
-// The mask the design describes, one pixel at a time: every pixel of the whole source bytes
+// The mask built one pixel at a time: every pixel of the whole source bytes
 // of a row (padding pixels of the last byte included) lands in mask order, the rest is 0.
 std::vector<unsigned char> referenceMask(const std::vector<unsigned char>& src, unsigned int width,
                                          unsigned int srcRowBytes, unsigned int height,
