@@ -23,19 +23,21 @@ std::atomic_ref<unsigned int> countOf(const unsigned int* count) {
 } // namespace
 
 void ZYRIncrementRefCnt_ThreadSafe(unsigned int* count) {
-    countOf(count).fetch_add(1, std::memory_order_relaxed);
+    auto word = countOf(count);
+    detail::RefCountOps::increment(word);
 }
 
 unsigned int ZYRDecrementRefCnt_ThreadSafe(unsigned int* count) {
-    return countOf(count).fetch_sub(1, std::memory_order_acq_rel) - 1;
+    auto word = countOf(count);
+    return detail::RefCountOps::decrement(word);
 }
 
 bool ZYRIsShared_ThreadSafe(const unsigned int* count) {
-    return countOf(count).load(std::memory_order_acquire) > 1;
+    return detail::RefCountOps::value(countOf(count)) > 1;
 }
 
 unsigned int ZYRPeekValue_ThreadSafe(const unsigned int* count) {
-    return countOf(count).load(std::memory_order_acquire);
+    return detail::RefCountOps::value(countOf(count));
 }
 
 void* czyrsmartptralloc(unsigned int size) {

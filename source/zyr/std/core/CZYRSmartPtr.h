@@ -26,30 +26,20 @@ class ZYRSTD_API CZYRPublicRefCountBase : public CZYRClientBase {
 public:
     CZYRPublicRefCountBase() noexcept = default;
     CZYRPublicRefCountBase(const CZYRPublicRefCountBase& other) noexcept
-        : CZYRClientBase(), count_(other.count_.load(std::memory_order_relaxed)) {}
-    CZYRPublicRefCountBase& operator=(const CZYRPublicRefCountBase& other) noexcept {
-        count_.store(other.count_.load(std::memory_order_relaxed), std::memory_order_relaxed);
-        return *this;
-    }
+        : CZYRClientBase(), count_(other.count_) {}
+    CZYRPublicRefCountBase& operator=(const CZYRPublicRefCountBase&) noexcept = default;
     ~CZYRPublicRefCountBase() override;
 
-    void addRef() const noexcept { count_.fetch_add(1, std::memory_order_relaxed); }
+    void addRef() const noexcept { count_.increment(); }
     // True exactly for the call that took the count from 1 to 0; the owner deletes.
-    [[nodiscard]] bool release() const noexcept {
-        return count_.fetch_sub(1, std::memory_order_acq_rel) == 1;
-    }
+    [[nodiscard]] bool release() const noexcept { return count_.decrement() == 0; }
     // A count of 0 also answers true.
-    bool isShared() const noexcept { return count_.load(std::memory_order_acquire) != 1; }
-    unsigned int debugGetRefCount() const noexcept {
-        return count_.load(std::memory_order_acquire);
-    }
-    const unsigned int* debugGetRefCountAddr() const noexcept {
-        static_assert(sizeof(std::atomic<unsigned int>) == sizeof(unsigned int));
-        return reinterpret_cast<const unsigned int*>(&count_);
-    }
+    bool isShared() const noexcept { return count_.value() != 1; }
+    unsigned int debugGetRefCount() const noexcept { return count_.value(); }
+    const unsigned int* debugGetRefCountAddr() const noexcept { return count_.address(); }
 
 private:
-    mutable std::atomic<unsigned int> count_{1};
+    detail::RefCountWord count_;
 };
 
 // Sole owner; deletes its object through the object's virtual destructor.
