@@ -1,8 +1,12 @@
-// Error statuses, exceptions and the boundary between them; and every allocation of a
-// realistic workload failing in turn: nothing may crash, leak, leave the accounting off or post
-// a notice, and each kind of caller reports its failure with the record hosts know it by.
+// Error statuses, exceptions and the boundary between them; every allocation of a realistic
+// workload failing in turn: nothing may crash, leak, leave the accounting off or post a notice,
+// and each kind of caller reports its failure with the record hosts know it by; and the
+// start-up hooks, host procedures and process-exit routines.
 #include <gtest/gtest.h>
 
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
 #include <memory>
 #include <set>
 #include <stdexcept>
@@ -40,6 +44,24 @@ template <class Body> Fields thrown(Body body) {
         return fields(e);
     }
     return {};
+}
+
+// Sets (null: removes) an environment variable the tests do not otherwise use, and removes it
+// again at the end.
+struct EnvGuard {
+    EnvGuard(const char* name, const char* value) : name(name) {
+        value ? ::setenv(name, value, 1) : ::unsetenv(name);
+    }
+    ~EnvGuard() { ::unsetenv(name); }
+    const char* name;
+};
+
+ZYRFactory::IZYRFactory* const kFakeFactory = reinterpret_cast<ZYRFactory::IZYRFactory*>(0x1000);
+ZYRFactory::IZYRFactory* factoryA() {
+    return kFakeFactory;
+}
+ZYRFactory::IZYRFactory* factoryB() {
+    return nullptr;
 }
 
 int handlerCalls = 0;
@@ -224,3 +246,110 @@ TEST_P(FaultInjectionTest, EveryAllocationMayFail) {
 
 // Plain and guarded fronts.
 INSTANTIATE_TEST_SUITE_P(StatisticsLevels, FaultInjectionTest, ::testing::Values(0, 1));
+
+TEST(ZYRStdInitTest, MemoryStatLevelComesFromTheEnvironment) {
+    const struct {
+        const char* value;
+        int level;
+    } cases[] = {{nullptr, 0}, {"1", 1}, {"3", 3}, {"verbose", 0}, {"", 0}};
+    for (const auto& c : cases) {
+        {
+            EnvGuard env("ZYR_MEMORY_STAT", c.value);
+            ZYRStdInit_ZYRMemMgrSet(nullptr);
+            EXPECT_EQ(ZYRGetMemStatLevel(), c.level) << (c.value ? c.value : "(unset)");
+            void* p = ZYRMalloc(0);
+            EXPECT_EQ(p != nullptr, c.level != 0) << "only the guarded front serves 0 bytes";
+            ZYRFree(p);
+        }
+        zyrtest::installFront(0);
+    }
+}
+
+TEST(ZYRStdInitTest, HostRecordIsCopiedAndNullKeepsTheLimit) {
+    zyrtest::FailingHost host;
+    tZYRMemMgr record = host.record();
+    ZYRStdInit_ZYRMemMgrSet(&record);
+    EXPECT_GT(ZYRGetMemLimit(), 0u) << "a host record sets the limit from the machine";
+    record.clientData = nullptr; // the library's copy must not follow
+    EXPECT_EQ(ZYRStdInit_ZYRMemMgrGet()->clientData, &host);
+    void* p = ZYRMalloc(8);
+    EXPECT_EQ(host.calls, 1u);
+    ZYRFree(p);
+
+    ZYRSetMemLimit(500 * 1024 * 1024);
+    ZYRStdInit_ZYRMemMgrSet(nullptr);
+    EXPECT_EQ(ZYRGetMemLimit(), 500u * 1024 * 1024) << "a null record leaves the limit alone";
+    EXPECT_NE(ZYRStdInit_ZYRMemMgrGet()->allocProc, nullptr);
+    EXPECT_EQ(ZYRStdInit_ZYRMemMgrGet()->clientData, nullptr);
+    zyrtest::installFront(0);
+}
+
+TEST(ZYRStdInitTest, FactoryProcedureIsSetOnceAndWorkerIdentifierStartsAtOne) {
+    const std::string kSource = "source/zyr/std/ZYRStdInit";
+    EXPECT_EQ(thrown([] { ZYRGetFactory(); }),
+              Fields(kZYRErrorFatal, "ZYRFactory Proc not set in ZYRStd", kSource, 35, false));
+    ZYRStdInit_SetZYRFactoryProc(factoryA);
+    EXPECT_EQ(ZYRGetFactory(), kFakeFactory);
+    EXPECT_EQ(thrown([] { ZYRStdInit_SetZYRFactoryProc(factoryB); }),
+              Fields(kZYRErrorFatal, "Default filsSys already set", kSource, 56, false));
+    EXPECT_EQ(ZYRGetFactory(), kFakeFactory) << "the first procedure stays";
+    ZYRStdInit_SetZYRFactoryProc(nullptr);
+    ZYRStdInit_SetZYRFactoryProc(factoryB);
+    EXPECT_EQ(ZYRGetFactory(), nullptr);
+    ZYRStdInit_SetZYRFactoryProc(nullptr);
+
+    EXPECT_EQ(ZYRGetWorkerID(), 1u);
+    ZYRStdInit_ZYRSetWorkerID(7);
+    EXPECT_EQ(ZYRGetWorkerID(), 7u);
+    ZYRSetWorkerID(1);
+    EXPECT_EQ(ZYRGetWorkerID(), 1u);
+}
+
+// The log opens only where ZYR_DMM_LOG names a file that can be made with a path of at most
+// 259 characters, and starts empty.
+TEST(ZYRStdInitTest, DmmLogOpensOnlyWhenNamed) {
+    zyrtest::TempDir dir;
+    const std::string base = dir.path() + "/" + std::string(100, 'd') + "/";
+    std::filesystem::create_directories(base);
+    auto sized = [&](size_t n) { return base + std::string(n - base.size(), 'f'); };
+    const std::pair<std::string, const char*> cases[] = {{"", ""},
+                                                         {dir.path() + "/missing/dir/dmm.log", ""},
+                                                         {sized(260), "old"},
+                                                         {sized(259), "line\n"}};
+    tZYRMemMgr any{};
+    for (const auto& [named, expected] : cases) {
+        std::ofstream(named) << "old";
+        EnvGuard env("ZYR_DMM_LOG", named.empty() ? nullptr : named.c_str());
+        ZYRStdInit_ZYRDMMEnv_set(&any);
+        LogDMMInfo("line\n");
+        ZYRStdInit_ZYRDMMEnv_set(nullptr);
+        EXPECT_EQ(zyrtest::readFile(named), expected) << named;
+    }
+}
+
+using ZYRStdInitDeathTest = ::testing::Test;
+
+// Both exit routines write a line to standard output and, for an error, one to standard error,
+// then abort. Death tests only see stderr, so a child copies its stdout there first.
+TEST(ZYRStdInitDeathTest, ExitRoutinesPrintTheirLinesAndAbort) {
+    EXPECT_STREQ(ZYRExceptionCodeName(0x80000001), "EXCEPTION_GUARD_PAGE");
+    EXPECT_STREQ(ZYRExceptionCodeName(0xC00000FD), "EXCEPTION_STACK_OVERFLOW");
+    EXPECT_DEATH(ZYRSEHExitProcess(0xC0000005, nullptr, 7),
+                 "\n\n\t\\*\\*\\* ZYRSEHExitProcess \\(, 7, EXCEPTION_ACCESS_VIOLATION, "
+                 "0xC0000005\\)\\*\\*\\*\n\n");
+    EXPECT_DEATH(ZYRSEHExitProcess(0xC0000007, "f.cpp", 3),
+                 "ZYRSEHExitProcess \\(f.cpp, 3, UNKNOWN, 0xC0000007\\)");
+    EXPECT_DEATH(ZYRExitProcess(CZYRError(kZYRErrorBadParam, "bad", "src", 4), "f", 9),
+                 "\n\n\t\\*\\*\\* ZYRExitProcess \\(6, bad, src, 4\\)\\*\\*\\*\n\n");
+    const CZYRError none(kZYRErrorNoError, nullptr, nullptr, 0);
+    EXPECT_EXIT(ZYRExitProcess(none, "f", 9), ::testing::KilledBySignal(SIGABRT), "^$");
+
+    auto withStdoutOnStderr = [](auto exit) {
+        ::dup2(2, 1);
+        exit();
+    };
+    EXPECT_DEATH(withStdoutOnStderr([] { ZYRSEHExitProcess(0xC0000005, nullptr, 7); }),
+                 "\n\n\t\\*\\*\\* ZYRSEHExitProcess \\(, 7\\)\\*\\*\\*\n\n");
+    EXPECT_DEATH(withStdoutOnStderr([&] { ZYRExitProcess(none, nullptr, 12); }),
+                 "\n\n\t\\*\\*\\* ZYRExitProcess \\(, 12\\)\\*\\*\\*\n\n");
+}

@@ -2,11 +2,9 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <fstream>
 #include <functional>
 #include <future>
 #include <memory>
-#include <sstream>
 #include <thread>
 #include <vector>
 
@@ -15,7 +13,6 @@
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/core/ZYRStdInit.h"
 #include "zyr/std/core/ZYRThread.h"
-#include "zyr/std/memory/CZYRStdAllocator.h"
 #include "zyr/std/memory/ZYRDMM.h"
 
 using namespace ZYRStd;
@@ -92,10 +89,7 @@ protected:
     // Closes the log and returns everything written to it.
     std::string closeLog() {
         ZYRStdInit_ZYRDMMEnv_set(nullptr);
-        std::ifstream in(logPath_, std::ios::binary);
-        std::stringstream text;
-        text << in.rdbuf();
-        return text.str();
+        return zyrtest::readFile(logPath_);
     }
 
     zyrtest::FailingHost host_;

@@ -28,7 +28,6 @@ namespace {
 struct Supplier {
     std::map<void*, unsigned int> live;
     unsigned int allocCalls = 0;
-    unsigned int freeCalls = 0;
     unsigned long long freedBytes = 0;
     unsigned int failEvery = 0; // fail every n-th call
     bool failAll = false;
@@ -44,7 +43,6 @@ struct Supplier {
     }
     static void free(void* block, void* data) {
         auto* self = static_cast<Supplier*>(data);
-        ++self->freeCalls;
         const auto found = self->live.find(block);
         if (found == self->live.end()) {
             ADD_FAILURE() << "supplier got back a block it never handed out (or twice)";
@@ -69,19 +67,6 @@ VariableSizeAllocator makeAllocator(Supplier& s, unsigned int initialPages, unsi
 char* alloc(VariableSizeAllocator& a, unsigned int size) {
     unsigned int obtained = 0;
     return static_cast<char*>(a.allocate(size, obtained));
-}
-
-// Runs `body`, which must fail for want of memory with `message` from the given line.
-template <class Body> void expectOutOfMemory(Body body, const char* message, int line) {
-    try {
-        body();
-        ADD_FAILURE() << "no error; expected \"" << message << "\"";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);
-        EXPECT_STREQ(e.getMessage(), message);
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRPool");
-        EXPECT_EQ(e.getSrcLineNumber(), line);
-    }
 }
 
 uint32_t word(const void* at) {
@@ -242,7 +227,7 @@ TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
                     uint32_t blockSize = pageSize;
                     uint32_t best = UINT32_MAX;
                     for (const auto& [h, free] : before.free)
-                        if (free >= n)
+                        if (!large && free >= n)
                             best = std::min(best, free);
                     if (best != UINT32_MAX) {
                         const auto& list = lists.at(best);
@@ -412,7 +397,7 @@ TEST(VariableSizeAllocatorTest, Boundaries) {
     EXPECT_EQ(b.Free(p), 0u);
     EXPECT_EQ(b.Free(q), 0u);
     EXPECT_EQ(t.allocCalls, 1u);
-    EXPECT_EQ(t.freeCalls, 0u);
+    EXPECT_EQ(t.freedBytes, 0u);
     EXPECT_EQ(problems(b), "");
 }
 
@@ -504,9 +489,15 @@ TEST(ZYRFixedSizePoolTest, ChunksFreeListAndFailure) {
 TEST(ZYRStdAllocatorFixedSizePoolTest, RunsPagesAndFailure) {
     ZYRStdAllocatorFixedSizePool pool(16, 100);
     EXPECT_EQ(pool.Alloc(0), nullptr);
-    // 8 GiB: no page can hold it.
-    expectOutOfMemory([&] { (void)pool.SureAlloc(1u << 29); },
-                      "ZYRStdAllocatorFixedSizePool allocation failed", 173);
+    try {
+        (void)pool.SureAlloc(1u << 29); // 8 GiB: no page can hold it
+        ADD_FAILURE() << "no error";
+    } catch (const CZYRError& e) {
+        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);
+        EXPECT_STREQ(e.getMessage(), "ZYRStdAllocatorFixedSizePool allocation failed");
+        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/ZYRPool");
+        EXPECT_EQ(e.getSrcLineNumber(), 173);
+    }
 
     tZYRVirtualMemoryInfo info{};
     VirtualMemStatus(&info);
