@@ -21,11 +21,15 @@ using ZYRPublic::eFlushMemorySeverityUrgent;
 
 namespace {
 
-// A cache that reports a size, counts how often it is asked for it, and answers flush
-// requests as told (no answer: it frees nothing).
+// A cache, registered for its lifetime, that reports a size, counts how often it is asked for
+// it, and answers flush requests as told (no answer: it frees nothing).
 struct FakeClient : I_FlushableMemoryClient {
-    FakeClient(const char* name, unsigned int size, std::function<bool(unsigned int)> answer = {})
-        : name(name), size(size), answer(std::move(answer)) {}
+    FakeClient(const char* name, unsigned int size, std::function<bool(unsigned int)> answer = {},
+               bool threadSafe = false)
+        : name(name), size(size), answer(std::move(answer)) {
+        RegisterFlushableMemoryClient(this, threadSafe);
+    }
+    ~FakeClient() override { UnregisterFlushableMemoryClient(this); }
     bool flushMemory(unsigned int bytesNeeded, unsigned int reserved,
                      eFlushMemorySeverity severity) override {
         EXPECT_EQ(reserved, 0u);
@@ -70,8 +74,6 @@ protected:
         ZYRStdInit_ZYRDMMEnv_set(&any);
     }
     void TearDown() override {
-        for (FakeClient* client : registered_)
-            UnregisterFlushableMemoryClient(client);
         RegisterSurfaceQueueInstance(nullptr);
         tOEMFlushCB none{nullptr, nullptr};
         ZYRStdInit_OEMFlushCBSet(&none);
@@ -79,11 +81,6 @@ protected:
         ::unsetenv("ZYR_DMM_LOG");
         SetCZYRThreadSpecificPtr(nullptr);
         zyrtest::installFront(0);
-    }
-
-    void add(FakeClient& client, bool threadSafe = false) {
-        RegisterFlushableMemoryClient(&client, threadSafe);
-        registered_.push_back(&client);
     }
 
     // Closes the log and returns everything written to it.
@@ -96,7 +93,6 @@ protected:
     tZYRMemMgr record_{};
     zyrtest::TempDir dir_;
     std::string logPath_;
-    std::vector<FakeClient*> registered_;
 };
 
 // A DMM allocation for client "TEST" at normal severity.
@@ -119,9 +115,6 @@ bool has(const std::string& text, const std::string& what) {
 
 TEST_F(ZYRDMMTest, NormalFlushAsksOnlyClientsLargeEnoughLargestFirst) {
     FakeClient small("small", 10), large("large", 50), middle("middle", 30);
-    add(small);
-    add(large);
-    add(middle);
     EXPECT_FALSE(ZYRFlushMemory(nullptr, 40, eFlushMemorySeverityNormal));
     EXPECT_EQ(large.requests, std::vector<unsigned int>{40});
     EXPECT_TRUE(middle.requests.empty());
@@ -153,10 +146,8 @@ TEST_F(ZYRDMMTest, NormalFlushAsksOnlyClientsLargeEnoughLargestFirst) {
 
 TEST_F(ZYRDMMTest, RequesterIsNeverAskedAndNinthClientIsIgnored) {
     std::vector<std::unique_ptr<FakeClient>> clients;
-    for (unsigned int i = 0; i < 10; ++i) {
+    for (unsigned int i = 0; i < 10; ++i)
         clients.push_back(std::make_unique<FakeClient>("c", 100 + i));
-        add(*clients.back());
-    }
     // clients[9] is the largest and the requester; clients[8] is the ninth eligible one.
     EXPECT_FALSE(ZYRFlushMemory(clients[9].get(), 1, eFlushMemorySeverityUrgent));
     EXPECT_TRUE(clients[9]->requests.empty());
@@ -169,7 +160,6 @@ TEST_F(ZYRDMMTest, RequesterIsNeverAskedAndNinthClientIsIgnored) {
 TEST_F(ZYRDMMTest, LadderDoublesTheDemandThenTriesOneUrgentFlush) {
     FakeClient cache("cache", 1u << 30);
     cache.answer = [](unsigned int need) { return need < 800; };
-    add(cache);
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(100), nullptr);
     EXPECT_EQ(cache.requests, (std::vector<unsigned int>{100, 200, 400, 800, 100}));
@@ -192,7 +182,6 @@ TEST_F(ZYRDMMTest, LadderDoublesTheDemandThenTriesOneUrgentFlush) {
 
 TEST_F(ZYRDMMTest, ClientThatLiesCannotKeepTheLadderGoing) {
     FakeClient liar("liar", ~0u, yes);
-    add(liar);
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(64), nullptr);
     EXPECT_LE(liar.requests.size(), 40u);
@@ -200,7 +189,6 @@ TEST_F(ZYRDMMTest, ClientThatLiesCannotKeepTheLadderGoing) {
 
 TEST_F(ZYRDMMTest, SuccessfulFlushLetsTheRetrySucceed) {
     FakeClient cache("cache", 4096, [this](unsigned int) { return !(host_.failAll = false); });
-    add(cache);
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(100, &cache), nullptr) << "the requester is the only client: skipped";
     void* p = dmmMalloc(100);
@@ -219,7 +207,6 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
     };
     RegisterSurfaceQueueInstance(&queue);
     FakeClient cache("cache", 1 << 30, yes);
-    add(cache);
     host_.failAll = true;
     void* p = dmmMalloc(1000);
     ASSERT_NE(p, nullptr);
@@ -262,7 +249,6 @@ TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
     FakeQueue queue;
     RegisterSurfaceQueueInstance(&queue);
     FakeClient cache("cache", 1 << 30, yes);
-    add(cache);
     host_.failAll = true;
     std::thread([this] {
         EXPECT_EQ(dmmMalloc(10), nullptr);
@@ -304,9 +290,7 @@ TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
 }
 
 TEST_F(ZYRDMMTest, ThreadSafeFlushUsesItsOwnListAndStoredSizes) {
-    FakeClient everywhere("everywhere", 100, yes), mainOnly("mainOnly", 500, yes);
-    add(everywhere, true);
-    add(mainOnly);
+    FakeClient everywhere("everywhere", 100, yes, true), mainOnly("mainOnly", 500, yes);
     EXPECT_TRUE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
     EXPECT_TRUE(mainOnly.requests.empty());
     EXPECT_EQ(everywhere.requests.size(), 1u);
@@ -361,7 +345,6 @@ TEST_F(ZYRDMMTest, OversizedJovBlockIsRefusedSilently) {
 
 TEST_F(ZYRDMMTest, TumaLadderFlushesThenGivesUp) {
     FakeClient cache("cache", 1 << 30, yes);
-    add(cache);
     host_.failAll = true;
     EXPECT_EQ(DMM_TUMAAlloc(nullptr, 64), nullptr);
     EXPECT_EQ(cache.requests, (std::vector<unsigned int>{64, 128}));
@@ -402,8 +385,6 @@ TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
         released.wait();
         return false;
     };
-    add(slow);
-    add(other);
     std::thread flusher([] {
         SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("flusher", true));
         ZYRFlushMemory(nullptr, 10, eFlushMemorySeverityNormal);

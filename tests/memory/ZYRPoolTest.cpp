@@ -457,7 +457,7 @@ TEST(FixedSizeAllocatorTest, PoolsSlotsAndSupplier) {
     EXPECT_TRUE(t.live.empty());
 }
 
-TEST(ZYRFixedSizePoolTest, ChunksFreeListAndFailure) {
+TEST(ZYRFixedSizePoolTest, ChunksAndFreeList) {
     {
         ZYRFixedSizePool pool(1, 3);
         EXPECT_EQ(pool.elementSize(), 8u) << "room for the free-list link";
