@@ -260,7 +260,11 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
     } vendors[] = {
         {"Caf\xc3\xa9 \xf0\x9f\x98\x80 Chips Incorporated", u"Caf\u00e9 \U0001F600 Chips Incor"},
         {"123456789012345678\xf0\x9f\x98\x80", u"123456789012345678"},
-        {"a\xff\xc3(\xe2\x82", u"a\uFFFD\uFFFD(\uFFFD\uFFFD"}};
+        {"a\xff\xc3(\xe2\x82", u"a\uFFFD\uFFFD(\uFFFD\uFFFD"},
+        // U+D7FF and U+E000 around the surrogates, which are refused; U+10FFFF is
+        // the last code point.
+        {"\xed\x9f\xbf\xed\xa0\x80\xed\xbf\xbf\xee\x80\x80\xf4\x8f\xbf\xbf\xf4\x90\x80\x80",
+         u"\uD7FF\uFFFD\uFFFD\uFFFD\uFFFD\uFFFD\uFFFD\uE000\U0010FFFF\uFFFD\uFFFD\uFFFD\uFFFD"}};
     for (const auto& v : vendors) {
         put(root.path(), "proc/cpuinfo",
             "processor\t: 0\nvendor_id\t: " + v.vendor +
