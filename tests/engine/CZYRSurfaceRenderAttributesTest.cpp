@@ -147,12 +147,20 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
     EXPECT_EQ(attempt(makeSurface(3, C_SmartPtr<ZYRPublic::I_Job>()), full),
               invalid("miss job", 46));
     EXPECT_EQ(attempt(C_SmartPtr<ZYRPublic::I_Surface>(), full), invalid("miss job", 46));
-    // An error recorded by any step of the walk is thrown.
+    // An error recorded by a step of the walk is thrown at once, not when the step it broke
+    // is missed later.
+    const auto fail = [](auto& link, auto& next) {
+        link.failWith = ZYRPublic::kZYRErrorTypeCheck;
+        next.reset();
+    };
     for (int step = 0; step < 3; ++step) {
         auto surface = makeSurface(3, job);
-        (step == 0   ? surface->failWith
-         : step == 1 ? surface->owner->failWith
-                     : surface->owner->parent->failWith) = ZYRPublic::kZYRErrorTypeCheck;
+        if (step == 0)
+            fail(*surface, surface->owner);
+        if (step == 1)
+            fail(*surface->owner, surface->owner->parent);
+        if (step == 2)
+            fail(*surface->owner->parent, surface->owner->parent->job);
         EXPECT_EQ(attempt(surface, full), "14: getter failed (fake:1)") << "step " << step;
     }
 
