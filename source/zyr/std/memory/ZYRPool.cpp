@@ -9,6 +9,7 @@
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/core/ZYRVirtualMem.h"
 #include "zyr/std/memory/ZYRDMM.h"
+#include "zyr/std/memory/internal/ZYRPoolBlocks.h"
 
 #if defined(__SANITIZE_ADDRESS__)
 #include <sanitizer/asan_interface.h>
@@ -126,6 +127,23 @@ uintptr_t address(const void* p) {
 
 // ---- VariableSizeAllocator ------------------------------------------------------------
 
+static_assert(VariableSizeAllocator::kMinBlockSize == ((sizeof(FreeBlock) + 7) & ~7u),
+              "the smallest block must hold the free-tree node, rounded up to 8 bytes");
+
+// The free tree keyed by size, and the bins: free sizes below kBinLimit that are multiples
+// of 8 head their lists from a bin with a presence bit instead of a tree node, so best fit
+// is a bit scan, and filing or taking a block of such a size needs no tree search or
+// rebalancing.
+struct VariableSizeAllocator::FreeIndex : ZYRStd::CZYRClientBase {
+    static constexpr unsigned int kBinSlots = kBinLimit / 8;
+    ZYRStd::redblack_tree<FreeBlock, unsigned int> tree;
+    FreeBlock* binHead[kBinSlots] = {};
+    uint64_t binPresent[kBinSlots / 64] = {};
+    // Tree sizes below kBinLimit (the last block of a page whose size is not a multiple of
+    // 8); while there are any, small best-fit lookups also search the tree.
+    unsigned int unbinnedSmallSizes = 0;
+};
+
 VariableSizeAllocator::VariableSizeAllocator(const char* name, unsigned int initialPages,
                                              unsigned int reservedCount, unsigned int pageSize,
                                              ZYRStd::tZYRPoolAllocProc alloc,
@@ -133,7 +151,7 @@ VariableSizeAllocator::VariableSizeAllocator(const char* name, unsigned int init
     : initialPages_(initialPages), reservedCount_(reservedCount), pageSize_(pageSize),
       alloc_(usesDefaultSupplier(alloc, free) ? defaultSupplierAlloc : alloc),
       free_(usesDefaultSupplier(alloc, free) ? defaultSupplierFree : free), userData_(userData),
-      log_(std::getenv("ZYR_DMM_LOG") != nullptr) {
+      log_(std::getenv("ZYR_DMM_LOG") != nullptr), index_(std::make_unique<FreeIndex>()) {
     std::memset(name_, 0, sizeof name_);
     if (name)
         std::strncpy(name_, name, sizeof name_ - 1);
@@ -154,7 +172,7 @@ VariableSizeAllocator::~VariableSizeAllocator() {
         ZYRStd::UpdateClientMaxMemoryStat(
             name_, static_cast<unsigned int>(std::min<unsigned long long>(peakHeld_, UINT32_MAX)));
     // The nodes live in pages that the clients may still use; they are not ours to touch.
-    ForgetAllNodes();
+    index_->tree.ForgetAllNodes();
     ZYRStd::ZYRFree(pages_);
 }
 
@@ -282,11 +300,11 @@ void* VariableSizeAllocator::allocate(unsigned int size, unsigned int& obtained)
         (!below || below->key() < restSize)) {
         // No free size in the tree lies between the node's predecessor and the rest, so the
         // rest can take the node's place without a search or rebalancing.
-        ReplaceNode(head, ::new (static_cast<void*>(rest + 8)) FreeBlock());
+        index_->tree.ReplaceNode(head, ::new (static_cast<void*>(rest + 8)) FreeBlock());
         if (blockSize < kBinLimit)
-            --unbinnedSmallSizes_;
+            --index_->unbinnedSmallSizes;
         if (restSize < kBinLimit)
-            ++unbinnedSmallSizes_;
+            ++index_->unbinnedSmallSizes;
         return h + 8;
     }
     if (headLeaves)
@@ -393,17 +411,17 @@ void VariableSizeAllocator::fileBlock(unsigned char* h, unsigned int size) {
     FreeBlock* head;
     ZYRStd::tree_search_state<FreeBlock> state;
     if (isBinned(size)) {
-        head = binHead_[size / 8];
+        head = index_->binHead[size / 8];
         if (!head) {
-            binHead_[size / 8] = block;
-            binPresent_[size / 512] |= uint64_t{1} << (size / 8 % 64);
+            index_->binHead[size / 8] = block;
+            index_->binPresent[size / 512] |= uint64_t{1} << (size / 8 % 64);
             return;
         }
-    } else if (SetSearchState(state, size)) {
+    } else if (index_->tree.SetSearchState(state, size)) {
         head = state.found;
     } else {
-        InsertNodeReference(state, block);
-        unbinnedSmallSizes_ += size < kBinLimit;
+        index_->tree.InsertNodeReference(state, block);
+        index_->unbinnedSmallSizes += size < kBinLimit;
         return;
     }
     FreeBlock* after = head->nextSameSize();
@@ -417,11 +435,11 @@ void VariableSizeAllocator::fileBlock(unsigned char* h, unsigned int size) {
 
 void VariableSizeAllocator::dropHead(FreeBlock* head, unsigned int size) {
     if (isBinned(size)) {
-        binHead_[size / 8] = nullptr;
-        binPresent_[size / 512] &= ~(uint64_t{1} << (size / 8 % 64));
+        index_->binHead[size / 8] = nullptr;
+        index_->binPresent[size / 512] &= ~(uint64_t{1} << (size / 8 % 64));
     } else {
-        UnlinkNode(head);
-        unbinnedSmallSizes_ -= size < kBinLimit;
+        index_->tree.UnlinkNode(head);
+        index_->unbinnedSmallSizes -= size < kBinLimit;
     }
 }
 
@@ -444,9 +462,9 @@ void VariableSizeAllocator::unfile(unsigned char* h) {
     const uint32_t size = sizeOf(h);
     if (isBinned(size)) {
         after->setPrevSameSize(nullptr);
-        binHead_[size / 8] = after;
+        index_->binHead[size / 8] = after;
     } else {
-        ReplaceNode(block, after);
+        index_->tree.ReplaceNode(block, after);
     }
 }
 
@@ -457,13 +475,13 @@ void VariableSizeAllocator::RemoveBlock(BlkHeader* header) {
 FreeBlock* VariableSizeAllocator::bestFit(unsigned int n, FreeBlock*& below) const {
     below = nullptr;
     if (n >= kBinLimit)
-        return GetMinGTOrEqNode(n, below);
-    const unsigned int slot = nextSetBit(binPresent_, n / 8, kBinSlots);
-    FreeBlock* binned = slot < kBinSlots ? binHead_[slot] : nullptr;
+        return index_->tree.GetMinGTOrEqNode(n, below);
+    const unsigned int slot = nextSetBit(index_->binPresent, n / 8, FreeIndex::kBinSlots);
+    FreeBlock* binned = slot < FreeIndex::kBinSlots ? index_->binHead[slot] : nullptr;
     // The tree holds small sizes only when pages end in blocks that are not multiples of 8.
-    if (binned && unbinnedSmallSizes_ == 0)
+    if (binned && index_->unbinnedSmallSizes == 0)
         return binned;
-    FreeBlock* inTree = GetMinGTOrEqNode(n, below);
+    FreeBlock* inTree = index_->tree.GetMinGTOrEqNode(n, below);
     return binned && (!inTree || slot * 8 < inTree->key()) ? binned : inTree;
 }
 
@@ -478,8 +496,9 @@ unsigned int VariableSizeAllocator::GetPtrSize(void* p) const {
 
 bool VariableSizeAllocator::isFiled(const unsigned char* h, unsigned int size) const {
     const FreeBlock* wanted = nodeAt(h);
-    for (const FreeBlock* b = isBinned(size) ? binHead_[size / 8] : FindNode(size); b;
-         b = b->nextSameSize())
+    for (const FreeBlock* b = isBinned(size) ? index_->binHead[size / 8]
+                                             : index_->tree.FindNode(size);
+         b; b = b->nextSameSize())
         if (b == wanted)
             return true;
     return false;
@@ -509,25 +528,25 @@ const char* VariableSizeAllocator::checkSizeList(const FreeBlock* head, unsigned
 
 const char* VariableSizeAllocator::checkInvariants() const {
     unsigned long long treeNodes = 0;
-    if (const char* why = checkTree(&treeNodes))
+    if (const char* why = index_->tree.checkTree(&treeNodes))
         return why;
 
     // Bounds every list walk, so that a cycle is reported rather than followed forever.
     const unsigned long long maxBlocks = held_ / (kMinBlockSize + 8) + 1;
     unsigned long long filed = 0;
     unsigned int smallInTree = 0;
-    for (auto it = begin(); it != end(); ++it) {
+    for (auto it = index_->tree.begin(); it != index_->tree.end(); ++it) {
         if (isBinned(it->key()))
             return "a size that belongs in a bin is in the tree";
         smallInTree += it->key() < kBinLimit;
         if (const char* why = checkSizeList(it.get(), filed, maxBlocks))
             return why;
     }
-    if (smallInTree != unbinnedSmallSizes_)
+    if (smallInTree != index_->unbinnedSmallSizes)
         return "the count of small sizes in the tree is wrong";
-    for (unsigned int slot = 0; slot < kBinSlots; ++slot) {
-        const FreeBlock* head = binHead_[slot];
-        if (((binPresent_[slot / 64] >> (slot % 64)) & 1) != (head != nullptr))
+    for (unsigned int slot = 0; slot < FreeIndex::kBinSlots; ++slot) {
+        const FreeBlock* head = index_->binHead[slot];
+        if (((index_->binPresent[slot / 64] >> (slot % 64)) & 1) != (head != nullptr))
             return "a bin's bit disagrees with its list";
         if (!head)
             continue;
@@ -738,6 +757,37 @@ ZYRFixedSizePool::ZYRFixedSizePool(unsigned int elementSize, unsigned int elemen
 
 ZYRFixedSizePool::~ZYRFixedSizePool() {
     FlushAll();
+}
+
+namespace {
+// Free elements are off limits to AddressSanitizer builds.
+void poison([[maybe_unused]] void* element, [[maybe_unused]] unsigned int bytes) {
+#if defined(__SANITIZE_ADDRESS__)
+    __asan_poison_memory_region(element, bytes);
+#endif
+}
+void unpoison([[maybe_unused]] void* element, [[maybe_unused]] unsigned int bytes) {
+#if defined(__SANITIZE_ADDRESS__)
+    __asan_unpoison_memory_region(element, bytes);
+#endif
+}
+} // namespace
+
+void* ZYRFixedSizePool::Alloc() {
+    void* element = freeList_;
+    if (!element)
+        return allocFromChunks();
+    unpoison(element, elementSize_);
+    std::memcpy(&freeList_, element, sizeof freeList_);
+    return element;
+}
+
+void ZYRFixedSizePool::Free(void* p) {
+    if (!p)
+        return;
+    std::memcpy(p, &freeList_, sizeof freeList_);
+    freeList_ = p;
+    poison(p, elementSize_);
 }
 
 void* ZYRFixedSizePool::allocFromChunks() {

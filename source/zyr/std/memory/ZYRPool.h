@@ -2,16 +2,11 @@
 #pragma once
 
 #include <cstdint>
-#include <cstring>
-
-#if defined(__SANITIZE_ADDRESS__)
-#include <sanitizer/asan_interface.h>
-#endif
+#include <memory>
 
 #include "ZYRStdExport.h"
 #include "zyr/std/core/CZYRClientBase.h"
 #include "zyr/std/memory/I_VariableSizeAllocator.h"
-#include "zyr/std/memory/redblack_tree.h"
 
 namespace ZYRStd {
 
@@ -23,45 +18,23 @@ using tZYRPoolFreeProc = void (*)(void* block, void* userData);
 
 } // namespace ZYRStd
 
-// The boundary tag in front of every block of a VariableSizeAllocator page.
-struct BlkHeader {
-    // Size of the previous block in the page (0 for the first); bit 0 set while this block
-    // is free.
-    unsigned int prevSize;
-    // Bytes of this block's user area.
-    unsigned int size;
-};
-
-// Built in place at a free block's user pointer; its key is the size word just in front of
-// it. The free blocks of one size form a list: its head is a node of the free tree (or, for
-// small sizes, sits in a bin), and the others hang after it. A list member is not in the
-// tree, so it keeps its list predecessor in the left link and says so with the owner flag.
-class FreeBlock : public ZYRStd::redblack_node<unsigned int, FreeBlock, ZYRStd::ZYRRBParent> {
-public:
-    unsigned int key() const {
-        unsigned int size;
-        std::memcpy(&size, reinterpret_cast<const unsigned char*>(this) - 4, sizeof size);
-        return size;
-    }
-    bool inSizeList() const { return ownerFlag(); }
-    FreeBlock* nextSameSize() const { return next_; }
-    void setNextSameSize(FreeBlock* next) { next_ = next; }
-    FreeBlock* prevSameSize() const { return left(); }
-    void setPrevSameSize(FreeBlock* prev) { setLeft(prev); }
-
-private:
-    FreeBlock* next_ = nullptr;
-};
+// The pools' block records; they live in the library, hosts only pass them back.
+struct BlkHeader;
+class FreeBlock;
+struct DMMPoolBlock;
+struct DMMPoolControl;
+namespace ZYRStd {
+struct ZYRStdAllocatorFixedSizePoolPage;
+}
 
 // A best-fit allocator over pages with boundary tags, a free tree keyed by size and bins for
 // small sizes. Requests above the page size get a block of their own ("large" blocks). Not
 // thread-safe: the owning client serialises its use.
 class ZYRSTD_API VariableSizeAllocator : public ZYRStd::I_VariableSizeAllocator,
-                                         public ZYRStd::redblack_tree<FreeBlock, unsigned int>,
                                          public ZYRStd::CZYRClientBase {
 public:
-    // The node must fit the smallest block.
-    static constexpr unsigned int kMinBlockSize = (sizeof(FreeBlock) + 7) & ~7u;
+    // The smallest block: room for the free-tree node built in a free block.
+    static constexpr unsigned int kMinBlockSize = 32;
     // Page bytes beyond the usable size: 8-byte page word pair, first header, end sentinel.
     static constexpr unsigned int kPageOverhead = 24;
     // Large blocks up to this request are kept for reuse when freed.
@@ -143,32 +116,12 @@ private:
     unsigned int pageCapacity_ = 0;
     unsigned long long liveLargeBytes_ = 0;
 
-    // Free sizes below kBinLimit that are multiples of 8 head their lists from a bin with a
-    // presence bit instead of a tree node: best fit is then a bit scan, and filing or taking
-    // a block of such a size needs no tree search or rebalancing.
+    // Free sizes below kBinLimit that are multiples of 8 head their lists from a bin instead
+    // of a tree node (see FreeIndex).
     static constexpr unsigned int kBinLimit = 4096;
-    static constexpr unsigned int kBinSlots = kBinLimit / 8;
-    FreeBlock* binHead_[kBinSlots] = {};
-    uint64_t binPresent_[kBinSlots / 64] = {};
-    // Tree sizes below kBinLimit (the last block of a page whose size is not a multiple of
-    // 8); while there are any, small best-fit lookups also search the tree.
-    unsigned int unbinnedSmallSizes_ = 0;
-};
-
-// One slot of a FixedSizeAllocator pool; while free it links the pool's free list.
-struct DMMPoolBlock {
-    DMMPoolBlock* next;
-};
-
-// The header at the start of every FixedSizeAllocator pool; the slots follow it.
-struct DMMPoolControl {
-    DMMPoolControl* nextPool;
-    DMMPoolBlock* freeList;
-    unsigned char* end; // one past the pool
-    unsigned int freeSlots;
-    unsigned int slots;
-    unsigned int stride; // bytes from one slot to the next
-    unsigned int poolBytes;
+    // The free tree and the bins, kept apart from the allocator's record.
+    struct FreeIndex;
+    std::unique_ptr<FreeIndex> index_;
 };
 
 // Pools of equal slots. The first pool has room for slotsPerPool slots of slotBytes bytes
@@ -217,26 +170,12 @@ public:
     ZYRFixedSizePool(const ZYRFixedSizePool&) = delete;
     ZYRFixedSizePool& operator=(const ZYRFixedSizePool&) = delete;
 
-    // Null when no chunk could be had. The free-list paths are inline: a pool exists to
-    // make these two calls cheap.
-    void* Alloc() {
-        void* element = freeList_;
-        if (!element)
-            return allocFromChunks();
-        unpoison(element);
-        std::memcpy(&freeList_, element, sizeof freeList_);
-        return element;
-    }
+    // Null when no chunk could be had.
+    void* Alloc();
     // Throws kZYRErrorOutOfMemory instead of returning null.
     void* SureAlloc();
     // Null is ignored.
-    void Free(void* p) {
-        if (!p)
-            return;
-        std::memcpy(p, &freeList_, sizeof freeList_);
-        freeList_ = p;
-        poison(p);
-    }
+    void Free(void* p);
     // Gives every chunk back; elements handed out become invalid.
     void FlushAll();
 
@@ -246,32 +185,11 @@ private:
     struct Chunk;
 
     void* allocFromChunks();
-    // Free elements are off limits to AddressSanitizer builds.
-    void poison(void* element) const {
-#if defined(__SANITIZE_ADDRESS__)
-        __asan_poison_memory_region(element, elementSize_);
-#else
-        (void)element;
-#endif
-    }
-    void unpoison(void* element) const {
-#if defined(__SANITIZE_ADDRESS__)
-        __asan_unpoison_memory_region(element, elementSize_);
-#else
-        (void)element;
-#endif
-    }
 
     unsigned int elementSize_;
     unsigned int elementsPerChunk_;
     Chunk* chunks_ = nullptr; // newest first
     void* freeList_ = nullptr;
-};
-
-struct ZYRStdAllocatorFixedSizePoolPage {
-    ZYRStdAllocatorFixedSizePoolPage* next;
-    unsigned int freeElements;
-    unsigned int elements;
 };
 
 // A bump pool of element runs on virtual-memory pages; runs are only given back all at
