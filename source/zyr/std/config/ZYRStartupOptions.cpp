@@ -242,7 +242,6 @@ void ruleRecord_sharedCache(sDLCacheOptions* options, const char* value) {
 }
 
 #define ZYR_APPLY_plain(field, reading, value) store.field = ZYR_READ_##reading(value)
-#define ZYR_APPLY_getRule(field, reading, value) ZYR_APPLY_plain(field, reading, value)
 #define ZYR_APPLY_setRule(field, reading, value) rule_##field(value)
 #define ZYR_APPLY_bothRules(field, reading, value) rule_##field(value)
 #define ZYR_APPLY_RECORD_plain(options, field, reading, value)                                     \
@@ -382,7 +381,6 @@ sSLDLOptions& ZYRGetSLDLOptions() {
         return store.field;                                                                        \
     }
 #define ZYR_GETTER_setRule(type, getter, field) ZYR_GETTER_plain(type, getter, field)
-#define ZYR_GETTER_getRule(type, getter, field)
 #define ZYR_GETTER_bothRules(type, getter, field)
 #define ZYR_STORE_KEY(setter, key, field, type, value, reading, rule, getter)                      \
     ZYR_GETTER_##rule(type, getter, field)
