@@ -1,18 +1,16 @@
-// The caches: the generic hash cache (head table and refused arguments, a random run of
-// look-ups, inserts, removals, sweeps and traversals against a model, the chain limits,
-// running out of pool entries, relocation) and the mask cache (sizes and zeroing, bit-order
-// conversion against a per-pixel reference, the reserved mask and its limits, running
-// without memory), each with every allocation failing in turn.
+// The generic hash cache against a model of its rules, and the mask cache against a per-pixel
+// reference; both with every allocation failing in turn.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
-#include <functional>
+#include <memory>
 #include <random>
 #include <set>
 #include <stdexcept>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "TestSupport.h"
@@ -28,21 +26,20 @@ using namespace ZYRStd;
 namespace {
 
 constexpr const char* kMaskSource = "source/zyr/std/CZYRMaskCache";
+constexpr const char* kSource = "source/zyr/std/ZYRCache";
+constexpr const char* kHeader = "source/zyr/std/IZYRCache";
 
-// An assertion from `source`, at `line` when one is given.
-void expectAssertion(const std::function<void()>& action, const char* source = kMaskSource,
-                     int line = 0) {
-    try {
-        action();
-        ADD_FAILURE() << "no assertion from " << source << ":" << line;
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorAssertionFailed);
-        EXPECT_STREQ(e.getMessage(), "assertion failed");
-        EXPECT_STREQ(e.getSrcFileName(), source);
-        if (line) {
-            EXPECT_EQ(e.getSrcLineNumber(), line);
-        }
-    }
+// The error `call` raises: `type`, `message`, from `source` (at `line` unless 0).
+template <class Call>
+void expectError(Call call, int type, const char* message, const char* source, int line = 0) {
+    std::string got = zyrtest::thrown(call);
+    if (!line && got.rfind(':') != std::string::npos)
+        got = got.substr(0, got.rfind(':')) + ":0)";
+    EXPECT_EQ(got, zyrtest::describe(type, message, source, line));
+}
+template <class Call>
+void expectAssertion(Call call, const char* source = kMaskSource, int line = 0) {
+    expectError(call, ZYRPublic::kZYRErrorAssertionFailed, "assertion failed", source, line);
 }
 
 // Runs `workload` once to count its allocations, then once with each of them failing: each
@@ -58,23 +55,20 @@ template <class Workload> void failEachAllocation(Workload workload) {
     EXPECT_EQ(GetMemUsage(), before);
     const unsigned int callsPerRun = host.calls;
     EXPECT_GT(callsPerRun, 3u);
-    for (unsigned int failing = 1; failing <= callsPerRun; ++failing) {
+    for (host.failAt = 1; host.failAt <= callsPerRun; ++host.failAt) {
         host.calls = 0;
-        host.failAt = failing;
         try {
             workload();
         } catch (const CZYRError& e) {
-            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory) << "allocation " << failing;
+            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory) << host.failAt;
         } catch (const std::logic_error& e) {
-            ADD_FAILURE() << e.what() << " when allocation " << failing << " failed";
+            ADD_FAILURE() << e.what() << " when allocation " << host.failAt << " failed";
         }
-        host.failAt = 0;
-        ASSERT_EQ(GetMemUsage(), before) << "allocation " << failing << " failed";
+        ASSERT_EQ(GetMemUsage(), before) << "allocation " << host.failAt << " failed";
     }
+    host.failAt = 0;
     zyrtest::installFront(0);
 }
-
-// ---- the generic cache ------------------------------------------------------------------------
 
 struct Entry : _t_Nlink {
     uint64_t key;
@@ -85,6 +79,8 @@ uint64_t valueFor(uint64_t key) {
     return key * 2654435761u + 17;
 }
 
+using Keys = std::vector<uint64_t>;
+
 // Keys hash to themselves, so a test picks a key's chain as key mod H.
 class TestCache final : public IZYRCache {
 public:
@@ -94,7 +90,6 @@ public:
           pool(sizeof(Entry), entriesPerChunk) {
         hcSetPool(&pool);
     }
-    // Every test's cache is consistent at its end.
     ~TestCache() { EXPECT_TRUE(checkInvariants()) << "invariants broken"; }
 
     unsigned int hash(void* key) override {
@@ -128,81 +123,60 @@ public:
         return entry;
     }
     Entry* find(uint64_t key) { return static_cast<Entry*>(hcGetCachedEntry(&key)); }
-    // A pool entry for `key` that is not in the cache.
-    Entry* loose(uint64_t key) {
-        auto* entry = static_cast<Entry*>(pool.Alloc());
-        entry->key = key;
-        entry->value = valueFor(key);
-        return entry;
-    }
     _t_HashHead* head(unsigned int index) { return hcGetTopHashTable() + index; }
-    // The keys of a chain, front first.
-    std::vector<uint64_t> chain(unsigned int index) {
-        std::vector<uint64_t> keys;
-        _t_HashHead* h = head(index);
-        for (_t_Nlink* e = h->next; e != h; e = e->next)
+    Keys chain(unsigned int index) { // front first
+        Keys keys;
+        for (_t_Nlink* e = head(index)->next; e != head(index); e = e->next)
             keys.push_back(static_cast<Entry*>(e)->key);
         return keys;
     }
 
     ZYRFixedSizePool pool;
     std::set<uint64_t> kept;
-    bool keepAll = false;
-    bool recycle = false;
-    std::vector<uint64_t> offered;
+    bool keepAll = false, recycle = false;
+    Keys offered;
     std::vector<void*> reports;
 };
 
-using Keys = std::vector<uint64_t>;
-
-constexpr const char* kSource = "source/zyr/std/ZYRCache";
-constexpr const char* kHeader = "source/zyr/std/IZYRCache";
-
 TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
-    struct Case {
-        int32_t entries;
-        unsigned char chainLength;
-        int32_t heads;
-        unsigned char chainLimit;
-    };
-    for (const Case& c : {Case{100, 4, 37, 17}, Case{10, 10, 3, 20}, Case{1000000, 2, 32771, 184},
-                          Case{3, 1, 3, 6}, Case{10000000, 1, 32771, 255}, Case{42, 42, 3, 84}}) {
-        TestCache cache(c.entries, 1, c.chainLength);
-        EXPECT_EQ(cache.hcGetNumHeads(), c.heads) << c.entries << "/" << int(c.chainLength);
-        EXPECT_TRUE(cache.ValidateHashCtrl());
-        EXPECT_EQ(cache.hcGetBotHashTable(), cache.hcGetTopHashTable() + (c.heads - 1));
+    // entries, chain length, heads, chain limit
+    for (const auto& [n, l, heads, limit] : {std::tuple{100, 4, 37, 17},
+                                             {10, 10, 3, 20},
+                                             {1000000, 2, 32771, 184},
+                                             {3, 1, 3, 6},
+                                             {10000000, 1, 32771, 255},
+                                             {42, 42, 3, 84}}) {
+        TestCache cache(n, 1, static_cast<unsigned char>(l));
+        EXPECT_EQ(std::tuple(cache.hcGetNumHeads(), cache.ValidateHashCtrl(), cache.hcMemUsed()),
+                  std::tuple(heads, true, heads * 16u + sizeof(IZYRCache)));
+        EXPECT_EQ(cache.hcGetBotHashTable(), cache.hcGetTopHashTable() + (heads - 1));
         EXPECT_EQ(cache.hcGetToBeCleaned(), cache.hcGetTopHashTable());
-        EXPECT_EQ(cache.hcMemUsed(), c.heads * 16u + sizeof(IZYRCache));
-        for (int32_t i = 0; i < c.heads; ++i) {
+        for (int32_t i = 0; i < heads; ++i) {
             const _t_HashHead* h = cache.head(i);
-            ASSERT_EQ(h->next, h) << "an empty chain points at its own head";
-            ASSERT_EQ(h->count + h->touched, 0);
-            ASSERT_EQ(h->chainLimit, c.chainLimit);
+            ASSERT_EQ(std::tuple(h->next, h->count + h->touched, h->chainLimit),
+                      std::tuple(h, 0, limit)); // an empty chain points at its own head
         }
     }
-    expectAssertion([] { TestCache(100, 4, 43); }, kSource, 92);
-    expectAssertion([] { TestCache(41, 4, 42); }, kSource, 92);   // fewer entries than L
-    expectAssertion([] { TestCache(100, 101, 4); }, kSource, 92); // quota above the entries
-    expectAssertion([] { TestCache(100, 4, 0); }, kSource, 92);   // would divide by zero
+    // Chain length above 42, fewer entries than L, quota above the entries, L of 0.
+    for (const auto& [n, r, l] : {std::tuple{100, 4, 43}, {41, 4, 42}, {100, 101, 4}, {100, 4, 0}})
+        expectAssertion([&] { TestCache(n, r, static_cast<unsigned char>(l)); }, kSource, 92);
 
     struct Unusable final : IZYRCache {
         unsigned int hash(void*) override { return 0; }
         bool match(_t_Nlink*, void*) override { return false; }
     } unusable;
-    EXPECT_FALSE(unusable.ValidateHashCtrl());
-    EXPECT_TRUE(unusable.checkInvariants());
+    EXPECT_TRUE(!unusable.ValidateHashCtrl() && unusable.checkInvariants());
     uint64_t key = 1;
     EXPECT_THROW(unusable.hcGetCachedEntry(&key), CZYRError) << "no table to look in";
     EXPECT_THROW(unusable.hcGetEntry(&key, true), CZYRError);
-    EXPECT_EQ(unusable.hcScavenger(5, nullptr), 0);
-    EXPECT_EQ(unusable.hcRemoveLastEntries(5, nullptr), 0);
+    EXPECT_EQ(unusable.hcScavenger(5, nullptr) + unusable.hcRemoveLastEntries(5, nullptr), 0);
     EXPECT_EQ(unusable.hcTraverse(nullptr, nullptr), kHCSuccess);
 }
 
 // The cache's rules written out plainly over vectors of keys, front first.
 struct Model {
     struct Chain {
-        std::vector<uint64_t> keys;
+        Keys keys;
         unsigned int touched = 0;
     };
     std::vector<Chain> chains;
@@ -223,12 +197,8 @@ struct Model {
         if (found == c.keys.end())
             return false;
         const auto position = static_cast<unsigned int>(found - c.keys.begin()) + 1;
-        c.keys.erase(found);
-        c.keys.insert(c.keys.begin(), key);
-        if (position == 1)
-            c.touched = std::max(c.touched, 1u);
-        else if (position > c.touched)
-            ++c.touched;
+        std::rotate(c.keys.begin(), found, found + 1);
+        c.touched = position == 1 ? std::max(c.touched, 1u) : c.touched + (position > c.touched);
         return true;
     }
     // Entries past the touched prefix are offered in order; the kept ones stay.
@@ -240,8 +210,7 @@ struct Model {
                 survivors.push_back(c.keys[i]);
         }
         const auto dropped = static_cast<int32_t>(c.keys.size() - survivors.size());
-        c.keys = survivors;
-        c.touched = 0;
+        c = Chain{survivors, 0};
         current -= dropped;
         return dropped;
     }
@@ -264,10 +233,10 @@ struct Model {
         while (target >= 1) {
             int32_t pass = 0;
             for (size_t i = 0; i < chains.size() && dropped + pass < target; ++i) {
-                if (chains[i].keys.empty())
-                    continue;
-                chains[i].touched = static_cast<unsigned>(chains[i].keys.size() - 1);
-                pass += cleanup(chains[i]);
+                if (!chains[i].keys.empty()) {
+                    chains[i].touched = static_cast<unsigned>(chains[i].keys.size() - 1);
+                    pass += cleanup(chains[i]);
+                }
             }
             dropped += pass;
             if (dropped >= target || pass == 0)
@@ -283,34 +252,27 @@ struct Model {
                 --skip;
             } else if (scavenge(release) == 0) {
                 skip = release;
-                if (current > 8 * chainLength) {
-                    size_t longest = 0;
-                    for (const Chain& c : chains)
-                        longest = std::max(longest, c.keys.size());
-                    if (longest > 250 || (longest > size_t(8 * chainLength) && !force))
-                        return false;
-                }
+                size_t longest = 0;
+                for (const Chain& c : chains)
+                    longest = std::max(longest, c.keys.size());
+                if (current > 8 * chainLength &&
+                    (longest > 250 || (longest > size_t(8 * chainLength) && !force)))
+                    return false;
             }
         }
         peak = std::max(peak, ++current);
         return true;
     }
     void link(uint64_t key) {
-        Chain& c = chainOf(key);
-        c.keys.insert(c.keys.begin(), key);
-        ++c.touched;
+        chainOf(key).keys.insert(chainOf(key).keys.begin(), key);
+        ++chainOf(key).touched;
     }
     bool remove(uint64_t key) {
-        if (!lookup(key))
+        if (!lookup(key) || (offered.push_back(key), kept.count(key)))
             return false;
-        offered.push_back(key);
-        if (kept.count(key))
-            return false;
-        Chain& c = chainOf(key);
-        c.keys.erase(c.keys.begin());
-        --c.touched;
-        --current;
-        return true;
+        chainOf(key).keys.erase(chainOf(key).keys.begin());
+        --chainOf(key).touched;
+        return --current, true;
     }
     // Visits every entry, releasing those with key % 5 == drop, until the key `stop`.
     RetCode traverse(uint64_t drop, uint64_t stop, std::vector<std::pair<uint64_t, bool>>& seen) {
@@ -321,14 +283,10 @@ struct Model {
                 seen.emplace_back(key, touched);
                 if (key == stop)
                     return 7;
-                if (key % 5 != drop) {
-                    ++i;
+                if (key % 5 != drop && ++i)
                     continue;
-                }
                 c.keys.erase(c.keys.begin() + static_cast<std::ptrdiff_t>(i));
-                if (touched && c.touched > 0)
-                    --c.touched;
-                c.touched = std::min<unsigned int>(c.touched, c.keys.size());
+                c.touched = std::min<unsigned>(c.touched - (touched && c.touched), c.keys.size());
                 --current;
             }
         }
@@ -350,34 +308,23 @@ RetCode traverseStep(_t_HashHead* head, bool touched, _t_Nlink* previous, void* 
     v->seen.emplace_back(entry->key, touched);
     if (entry->key == v->stop)
         return 7;
-    if (entry->key % 5 == v->drop) {
+    if (entry->key % 5 == v->drop)
         v->cache->hcReleaseEntry(head, touched, previous, entry);
-        return kHCStayOnPrevious;
-    }
-    return entry->key % 5 == (v->drop + 1) % 5 ? kHCStayOnPrevious : kHCSuccess;
+    return entry->key % 5 == v->drop || entry->key % 5 == (v->drop + 1) % 5 ? kHCStayOnPrevious
+                                                                            : kHCSuccess;
 }
 
 ::testing::AssertionResult sameState(TestCache& cache, const Model& model) {
-    if (!cache.checkInvariants())
-        return ::testing::AssertionFailure() << "invariants broken";
-    if (cache.GetCurrEntries() != model.current || cache.GetMaxEntries() != model.peak)
-        return ::testing::AssertionFailure()
-               << "current " << cache.GetCurrEntries() << " vs " << model.current;
-    if (cache.hcGetToBeCleaned() != cache.head(static_cast<unsigned>(model.cursor)))
-        return ::testing::AssertionFailure() << "sweep cursor differs";
-    if (cache.offered != model.offered)
-        return ::testing::AssertionFailure() << "entries offered to the flush differ";
-    if (cache.reports.size() != model.reports)
-        return ::testing::AssertionFailure() << "reports differ";
-    for (size_t i = 0; i < model.chains.size(); ++i) {
-        const auto index = static_cast<unsigned int>(i);
-        if (cache.chain(index) != model.chains[i].keys)
+    if (!cache.checkInvariants() || cache.GetCurrEntries() != model.current ||
+        cache.GetMaxEntries() != model.peak || cache.offered != model.offered ||
+        cache.hcGetToBeCleaned() != cache.head(static_cast<unsigned>(model.cursor)) ||
+        cache.reports.size() != model.reports)
+        return ::testing::AssertionFailure() << "counts, cursor, flushes or reports differ";
+    for (unsigned int i = 0; i < model.chains.size(); ++i)
+        if (cache.chain(i) != model.chains[i].keys ||
+            cache.head(i)->touched != model.chains[i].touched ||
+            cache.head(i)->count != model.chains[i].keys.size())
             return ::testing::AssertionFailure() << "chain " << i << " differs";
-        if (cache.head(index)->touched != model.chains[i].touched)
-            return ::testing::AssertionFailure() << "touched count of chain " << i << " differs";
-        if (cache.head(index)->count != model.chains[i].keys.size())
-            return ::testing::AssertionFailure() << "count of chain " << i << " differs";
-    }
     return ::testing::AssertionSuccess();
 }
 
@@ -396,16 +343,11 @@ TEST(ZYRCacheTest, RandomRunMatchesAModel) {
             if (random() % 4 == 0)
                 key = (random() % 40) * static_cast<uint64_t>(cache.hcGetNumHeads());
             const unsigned int action = random() % 100;
-            std::string what;
             if (action < 40) {
-                what = "look-up";
                 Entry* found = cache.find(key);
                 ASSERT_EQ(found != nullptr, model.lookup(key)) << "step " << step;
-                if (found) {
-                    ASSERT_EQ(found->value, valueFor(key));
-                }
+                ASSERT_TRUE(!found || found->value == valueFor(key));
             } else if (action < 70) {
-                what = "insert";
                 const auto& keys = model.chainOf(key).keys;
                 if (keys.size() >= 250 || std::count(keys.begin(), keys.end(), key) != 0)
                     continue;
@@ -421,35 +363,29 @@ TEST(ZYRCacheTest, RandomRunMatchesAModel) {
                     --model.current;
                 }
             } else if (action < 80) {
-                what = "remove";
                 ASSERT_EQ(cache.hcRemoveEntry(&key, &context), model.remove(key)) << step;
             } else if (action < 88) {
-                what = "sweep";
                 const auto count = static_cast<int32_t>(random() % 10);
                 ASSERT_EQ(cache.hcScavenger(count, &context), model.scavenge(count));
             } else if (action < 91) {
-                what = "last entries";
                 const auto count = static_cast<int32_t>(random() % 6);
                 ASSERT_EQ(cache.hcRemoveLastEntries(count, &context), model.removeLast(count));
             } else if (action < 93) {
-                what = "traverse";
                 Visit visit{&cache, random() % 5, random() % keySpace, {}};
                 std::vector<std::pair<uint64_t, bool>> seen;
                 ASSERT_EQ(cache.hcTraverse(traverseStep, &visit),
                           model.traverse(visit.drop, visit.stop, seen));
                 ASSERT_EQ(visit.seen, seen) << "step " << step;
             } else if (action < 97) {
-                what = "keep";
                 if (cache.kept.erase(key) == 0)
                     cache.kept.insert(key);
                 model.kept = cache.kept;
             } else {
-                what = "recycle";
                 cache.recycle = !cache.recycle;
                 cache.hcEmptyRecycler();
             }
             ASSERT_TRUE(sameState(cache, model))
-                << "after " << what << " at step " << step << " (seed " << seed << ")";
+                << "after action " << action << " at step " << step << " (seed " << seed << ")";
             cache.offered.clear();
             model.offered.clear();
         }
@@ -483,12 +419,10 @@ TEST(ZYRCacheTest, OverlongChainsAreRefused) {
     for (uint64_t i = 0; i < 20; ++i)
         ASSERT_NE(crowded.add(i * 37), nullptr);
     EXPECT_EQ(crowded.add(20 * 37), nullptr);
-    EXPECT_EQ(crowded.GetCurrEntries(), 20);
     EXPECT_NE(crowded.add(21 * 37), nullptr) << "a skipped sweep measures nothing either";
     EXPECT_EQ(crowded.add(22 * 37), nullptr);
     EXPECT_NE(crowded.add(23 * 37, true), nullptr);
     EXPECT_EQ(crowded.GetCurrEntries(), 22);
-
     // Beyond 250 entries in a chain even a forced request fails.
     TestCache nearlyFull(251, 1, 1); // 257 heads
     nearlyFull.keepAll = true;
@@ -507,15 +441,10 @@ TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
         for (uint64_t k = 0; k < 4; ++k)
             ASSERT_NE(cache.add(k), nullptr);
         host.failAll = true;
-
-        // Nothing flushable: refused, and no count moves.
-        cache.keepAll = true;
+        cache.keepAll = true; // nothing flushable: refused, and no count moves
         EXPECT_EQ(cache.add(4), nullptr);
-        EXPECT_EQ(cache.GetCurrEntries(), 4);
-        EXPECT_EQ(cache.GetMaxEntries(), 4);
-
-        // Untouched entries are swept to make room.
-        cache.keepAll = false;
+        EXPECT_EQ(std::pair(cache.GetCurrEntries(), cache.GetMaxEntries()), std::pair(4, 4));
+        cache.keepAll = false; // untouched entries are swept to make room
         cache.find(0);
         cache.find(1);
         cache.offered.clear();
@@ -523,11 +452,10 @@ TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
         EXPECT_EQ(cache.offered, (Keys{2, 3}));
         EXPECT_EQ(cache.GetCurrEntries(), 3);
         ASSERT_NE(cache.add(5), nullptr); // the last element freed by the sweep
-
         // All used: the sweep only resets the prefixes, so the quota of 2 goes from the
         // ends of the first chains instead.
-        for (uint64_t k : {0u, 1u})
-            cache.find(k);
+        cache.find(0);
+        cache.find(1);
         cache.offered.clear();
         ASSERT_NE(cache.add(6), nullptr);
         EXPECT_EQ(cache.offered, (Keys{0, 1}));
@@ -543,28 +471,23 @@ TEST(ZYRCacheTest, FreeControlUpdatesAndBrokenTables) {
     TestCache cache(100, 4, 4);
     for (uint64_t k = 0; k < 40; ++k)
         cache.add(k);
-    EXPECT_EQ(cache.hcUpdateCacheSize(100, 4), kHCSuccess);
-    EXPECT_EQ(cache.head(0)->chainLimit, 17) << "same values: nothing changes";
-    EXPECT_EQ(cache.hcUpdateCacheSize(100, 5), kHCSuccess);
-    EXPECT_EQ(cache.head(0)->chainLimit, 255) << "a new chain length alone is a change";
-    EXPECT_EQ(cache.hcUpdateCacheSize(200, 5), kHCSuccess);
-    EXPECT_EQ(cache.GetNumEntries(), 200);
-    EXPECT_EQ(cache.GetChainLength(), 5);
-    EXPECT_EQ(cache.hcGetNumHeads(), 37);
-    EXPECT_EQ(cache.head(36)->chainLimit, 255);
+    // Same values change nothing; a new chain length alone is a change.
+    for (const auto& [n, l, limit] : {std::tuple{100, 4, 17}, {100, 5, 255}, {200, 5, 255}}) {
+        EXPECT_EQ(cache.hcUpdateCacheSize(n, static_cast<unsigned char>(l)), kHCSuccess);
+        EXPECT_EQ(std::tuple(cache.GetNumEntries(), cache.GetChainLength(),
+                             cache.head(36)->chainLimit, cache.head(0)->chainLimit,
+                             cache.hcGetNumHeads()),
+                  std::tuple(n, l, limit, limit, 37));
+    }
     EXPECT_EQ(cache.hcUpdateHowManyToRelease(9), kHCSuccess);
     EXPECT_EQ(cache.GetAvailEntries(), 9);
-
     cache.kept = {3};
     EXPECT_EQ(cache.hcFreeCacheControl(), kHCEntriesRemain);
-    EXPECT_EQ(cache.hcCountEntries(), 1);
-    EXPECT_TRUE(cache.ValidateHashCtrl());
+    EXPECT_TRUE(cache.hcCountEntries() == 1 && cache.ValidateHashCtrl());
     cache.kept.clear();
     EXPECT_EQ(cache.hcFreeCacheControl(), kHCSuccess);
-    EXPECT_EQ(cache.GetCurrEntries(), 0);
-    EXPECT_EQ(cache.hcGetTopHashTable(), nullptr);
+    EXPECT_TRUE(cache.GetCurrEntries() == 0 && !cache.hcGetTopHashTable());
     EXPECT_FALSE(cache.ValidateHashCtrl());
-
     expectAssertion([&] { (void)cache.hcUpdateCacheSize(1, 1); }, kHeader, 539);
     expectAssertion([&] { (void)cache.hcUpdateHowManyToRelease(1); }, kHeader, 561);
     EXPECT_THROW((void)cache.hcFreeCacheControl(), CZYRError);
@@ -575,26 +498,22 @@ TEST(ZYRCacheTest, The255thEntryOfAChainIsAnAssertionAfterLinking) {
     for (uint64_t i = 0; i < 254; ++i)
         ASSERT_NE(cache.add(i * 1031), nullptr);
     expectAssertion([&] { cache.add(254 * 1031); }, kHeader, 551);
-    EXPECT_EQ(cache.head(0)->count, 255);
-    EXPECT_TRUE(IZYRCache::hcIsChainFull(cache.head(0)));
+    EXPECT_TRUE(cache.head(0)->count == 255 && IZYRCache::hcIsChainFull(cache.head(0)));
     EXPECT_TRUE(cache.checkInvariants()) << "linked and counted before the assertion";
-
     // Nothing more fits the 8-bit count: refused before linking.
     uint64_t key = 255 * 1031;
-    Entry* extra = cache.loose(key);
+    auto* extra = static_cast<Entry*>(cache.pool.Alloc());
+    *extra = Entry{{}, key, valueFor(key)};
     expectAssertion([&] { cache.hcInsertEntry(&key, extra); }, kHeader, 533);
     expectAssertion([&] { cache.hcLinkEntry(cache.head(0), extra); }, kHeader, 551);
-    EXPECT_EQ(cache.head(0)->count, 255);
-    EXPECT_EQ(cache.find(key), nullptr);
-    EXPECT_TRUE(cache.checkInvariants());
+    EXPECT_TRUE(cache.head(0)->count == 255 && !cache.find(key));
     cache.pool.Free(extra);
-
     uint64_t second = 1;
-    Entry* inserted = cache.loose(second);
+    auto* inserted = static_cast<Entry*>(cache.pool.Alloc());
+    *inserted = Entry{{}, second, valueFor(second)};
     cache.hcInsertEntry(&second, inserted);
     EXPECT_EQ(cache.find(1), inserted);
-    EXPECT_EQ(cache.GetCurrEntries(), 256);
-    EXPECT_EQ(cache.GetMaxEntries(), 256);
+    EXPECT_EQ(std::pair(cache.GetCurrEntries(), cache.GetMaxEntries()), std::pair(256, 256));
     EXPECT_EQ(cache.hcFreeCacheControl(), kHCSuccess);
 }
 
@@ -612,44 +531,35 @@ TEST(ZYRCacheTest, RelocationKeepsTheChainIntact) {
     EXPECT_EQ(cache.head(0)->next, &front) << "the head is the first entry's predecessor";
     EXPECT_EQ(cache.chain(0), (Keys{74, 37, 0}));
     EXPECT_TRUE(cache.checkInvariants());
-
-    expectAssertion([&] { IZYRCache::hcRelocateEntry(nullptr, &loose, 8); }, kSource, 172);
-    expectAssertion([&] { IZYRCache::hcRelocateEntry(&loose, &moved, 8); }, kSource, 172);
-    expectAssertion([&] { IZYRCache::hcRelocateEntry(&front, nullptr, 8); }, kSource, 172);
-    expectAssertion([&] { IZYRCache::hcRelocateEntry(&front, &loose, 0); }, kSource, 172);
+    for (const auto& [from, to, bytes] : {std::tuple<Entry*, Entry*, int>{nullptr, &loose, 8},
+                                          {&loose, &moved, 8},
+                                          {&front, nullptr, 8},
+                                          {&front, &loose, 0}})
+        expectAssertion([&] { IZYRCache::hcRelocateEntry(from, to, bytes); }, kSource, 172);
     // Put the entries back into pool memory before the pool sees them again.
     IZYRCache::hcRelocateEntry(&front, first, sizeof(Entry));
     IZYRCache::hcRelocateEntry(&moved, middle, sizeof(Entry));
     EXPECT_EQ(cache.chain(0), (Keys{74, 37, 0}));
 }
 
-// A cache's life: build, fill past capacity, look up, remove, tear down.
-void cacheWorkload() {
-    TestCache cache(50, 5, 3, 8);
-    for (uint64_t k = 0; k < 200; ++k) {
-        cache.add(k * 7);
-        cache.find(k * 7 / 2);
-        if (k % 5 == 0) {
-            uint64_t key = k * 3;
-            cache.hcRemoveEntry(&key, nullptr);
-        }
-        if (!cache.checkInvariants())
-            throw std::logic_error("invariants broken");
-    }
-    (void)cache.hcFreeCacheControl();
-}
-
 TEST(ZYRCacheTest, EveryAllocationMayFail) {
-    failEachAllocation(cacheWorkload);
+    failEachAllocation([] { // a cache's life: fill past capacity, look up, remove, tear down
+        TestCache cache(50, 5, 3, 8);
+        for (uint64_t k = 0; k < 200; ++k) {
+            cache.add(k * 7);
+            cache.find(k * 7 / 2);
+            uint64_t key = k * 3;
+            if (k % 5 == 0)
+                cache.hcRemoveEntry(&key, nullptr);
+            if (!cache.checkInvariants())
+                throw std::logic_error("invariants broken");
+        }
+        (void)cache.hcFreeCacheControl();
+    });
 }
-
-// ---- the mask cache ---------------------------------------------------------------------------
 
 bool allZero(const unsigned char* p, unsigned int n) {
-    for (unsigned int i = 0; i < n; ++i)
-        if (p[i])
-            return false;
-    return true;
+    return std::all_of(p, p + n, [](unsigned char c) { return c == 0; });
 }
 
 // The mask built one pixel at a time: every pixel of the whole source bytes
@@ -658,67 +568,49 @@ std::vector<unsigned char> referenceMask(const std::vector<unsigned char>& src, 
                                          unsigned int srcRowBytes, unsigned int height,
                                          bool fourBit) {
     const unsigned int bits = fourBit ? 4 * width : width;
-    const unsigned int maskRow = (bits + 31) / 32 * 4;
-    const unsigned int srcBytes = (bits + 7) / 8;
+    const unsigned int maskRow = (bits + 31) / 32 * 4, srcBytes = (bits + 7) / 8;
     std::vector<unsigned char> mask(size_t{maskRow} * height, 0);
     for (unsigned int y = 0; y < height; ++y) {
         const unsigned char* row = src.data() + size_t{y} * srcRowBytes;
         unsigned char* out = mask.data() + size_t{y} * maskRow;
-        if (fourBit) {
-            for (unsigned int x = 0; x < srcBytes * 2; ++x) {
-                const unsigned int pixel = (row[x / 2] >> (x % 2 ? 0 : 4)) & 0xF;
-                out[x / 2] |= static_cast<unsigned char>(pixel << (x % 2 ? 4 : 0));
-            }
-        } else {
-            for (unsigned int x = 0; x < srcBytes * 8; ++x)
-                if ((row[x / 8] >> (7 - x % 8)) & 1)
-                    out[x / 8] |= static_cast<unsigned char>(1u << (x % 8));
+        for (unsigned int x = 0; fourBit && x < srcBytes * 2; ++x) {
+            const unsigned int pixel = (row[x / 2] >> (x % 2 ? 0 : 4)) & 0xF;
+            out[x / 2] |= static_cast<unsigned char>(pixel << (x % 2 ? 4 : 0));
         }
+        for (unsigned int x = 0; !fourBit && x < srcBytes * 8; ++x)
+            if ((row[x / 8] >> (7 - x % 8)) & 1)
+                out[x / 8] |= static_cast<unsigned char>(1u << (x % 8));
     }
     return mask;
 }
 
-// Uses the front's limit so that virtual memory and the memory status run dry, and gives
-// the room back at the end.
-class ExhaustedMemory {
-public:
-    ExhaustedMemory() {
-        ZYRSetMemLimit(400ull << 20);
-        DisableMemUsageCheck();
-        const unsigned long long room = ZYRGetMemLimit() - GetMemUsage();
-        filler_ = ZYRMalloc(static_cast<unsigned int>(room));
-        EnableMemUsageCheck();
-    }
-    ~ExhaustedMemory() { ZYRFree(filler_); }
-    ExhaustedMemory(const ExhaustedMemory&) = delete;
-    ExhaustedMemory& operator=(const ExhaustedMemory&) = delete;
-    bool ok() const { return filler_ != nullptr; }
-
-private:
-    void* filler_;
-};
+// Uses the front's limit so that virtual memory and the memory status run dry, until the
+// returned block is freed.
+std::unique_ptr<void, void (*)(void*)> exhaustMemory() {
+    ZYRSetMemLimit(400ull << 20);
+    DisableMemUsageCheck();
+    void* filler = ZYRMalloc(static_cast<unsigned int>(ZYRGetMemLimit() - GetMemUsage()));
+    EnableMemUsageCheck();
+    return {filler, ZYRFree};
+}
 
 TEST(CZYRMaskCacheTest, RecordsZeroedReusedAndGrownWhileMemoryLasts) {
     const unsigned long long before = GetMemUsage();
     const unsigned long long page = CZYRMaskCache::VAR_ALLOC_PAGE_SIZE + 24ull;
+    unsigned long long current = 0, peak = 0;
     {
         CZYRMaskCache cache(4);
         ZYR_MaskRec* mask = cache.GetMaskRec(33, 2);
-        EXPECT_FALSE(cache.isReservedMask(mask));
-        EXPECT_EQ(mask->width, 33);
-        EXPECT_EQ(mask->height, 2);
+        EXPECT_TRUE(!cache.isReservedMask(mask) && mask->width == 33 && mask->height == 2);
         EXPECT_TRUE(allZero(mask->data, 16)) << "two rows of 8 bytes";
         std::memset(mask->data, 0xA5, 16);
         mask->flag = 9;
         cache.DeleteBitmapMask(mask);
         ZYR_MaskRec* again = cache.GetMaskRec(33, 2);
         EXPECT_EQ(again, mask) << "the record freed last comes back first";
-        EXPECT_TRUE(allZero(again->data, 16)) << "reused storage is zeroed again";
-        EXPECT_EQ(again->flag, 0);
+        EXPECT_TRUE(allZero(again->data, 16) && again->flag == 0) << "reused storage is zeroed";
         cache.DeleteBitmapMask(again);
         cache.DeleteBitmapMask(nullptr);
-
-        unsigned long long current = 0, peak = 0;
         cache.GetStats(current, peak);
         EXPECT_EQ(current, page) << "one initial page up to " << CZYRMaskCache::MIN_THRESHOLD;
         cache.DeleteBitmapMask(cache.GetMaskRec(2000, 600)); // above the page size
@@ -736,12 +628,11 @@ TEST(CZYRMaskCacheTest, RecordsZeroedReusedAndGrownWhileMemoryLasts) {
                 ASSERT_FALSE(cache.isReservedMask(masks.back()));
                 std::memset(masks.back()->data, i, 24);
             }
-            for (int i = 0; i < 10; ++i)
+            for (int i = 0; i < 10; ++i) {
                 EXPECT_EQ(masks[i]->data[23], i) << "masks must not share storage";
-            for (ZYR_MaskRec* m : masks)
-                cache.DeleteBitmapMask(m);
-            // Record arrays of 64 KiB and more come from virtual memory.
-            CZYRMaskCache many(3000);
+                cache.DeleteBitmapMask(masks[i]);
+            }
+            CZYRMaskCache many(3000); // record arrays of 64 KiB and more: virtual memory
             masks.clear();
             for (int i = 0; i < 3001; ++i) {
                 masks.push_back(many.GetMaskRec(8, 1));
@@ -751,15 +642,13 @@ TEST(CZYRMaskCacheTest, RecordsZeroedReusedAndGrownWhileMemoryLasts) {
                 many.DeleteBitmapMask(m);
         }
     }
-    {
-        CZYRMaskCache big(CZYRMaskCache::MIN_THRESHOLD + 1);
-        unsigned long long current = 0, peak = 0;
-        big.GetStats(current, peak);
-        EXPECT_EQ(current, 8ull * CZYRMaskCache::VAR_ALLOC_PAGE_SIZE + 24);
+    for (const auto& [records, bytes] : {std::pair{CZYRMaskCache::MIN_THRESHOLD + 1,
+                                                   8ull * CZYRMaskCache::VAR_ALLOC_PAGE_SIZE + 24},
+                                         std::pair{CZYRMaskCache::MIN_THRESHOLD + 0, page}}) {
+        CZYRMaskCache cache(records);
+        cache.GetStats(current, peak);
+        EXPECT_EQ(current, bytes) << records;
         EXPECT_EQ(peak, current);
-        CZYRMaskCache threshold(CZYRMaskCache::MIN_THRESHOLD);
-        threshold.GetStats(current, peak);
-        EXPECT_EQ(current, page);
     }
     EXPECT_EQ(GetMemUsage(), before) << "the destructor returns every block and chunk";
     expectAssertion([] { CZYRMaskCache none(0); });
@@ -769,32 +658,25 @@ TEST(CZYRMaskCacheTest, ConversionMatchesAPerPixelReference) {
     CZYRMaskCache cache(8);
     unsigned int size = 0;
     ZYR_MaskRec* mask = cache.CreateBitmapMask(nullptr, 0, 0, 5, size, false, false);
-    EXPECT_EQ(size, 0u);
-    EXPECT_EQ(mask->width + mask->height, 0);
+    EXPECT_EQ(size + mask->width + mask->height, 0u);
     cache.DeleteBitmapMask(mask);
-
     std::mt19937 random(77);
     for (int round = 0; round < 400; ++round) {
         const bool fourBit = random() % 2;
         const unsigned int width = 1 + random() % (round < 200 ? 80 : 700);
         const unsigned int height = 1 + random() % 24;
-        const unsigned int srcBytes = ((fourBit ? 4 : 1) * width + 7) / 8;
-        const unsigned int srcRowBytes = srcBytes + random() % 5;
+        const unsigned int srcRowBytes = ((fourBit ? 4 : 1) * width + 7) / 8 + random() % 5;
         const bool useReserved = random() % 4 == 0;
         std::vector<unsigned char> src(size_t{srcRowBytes} * height);
         for (unsigned char& b : src)
             b = static_cast<unsigned char>(random());
         mask = cache.CreateBitmapMask(src.data(), width, srcRowBytes, height, size, fourBit,
                                       useReserved);
-        const std::vector<unsigned char> expected =
-            referenceMask(src, width, srcRowBytes, height, fourBit);
-        ASSERT_EQ(size, expected.size());
-        ASSERT_EQ(cache.isReservedMask(mask), useReserved);
-        ASSERT_EQ(std::vector<unsigned char>(mask->data, mask->data + size), expected)
+        ASSERT_EQ(std::vector<unsigned char>(mask->data, mask->data + size),
+                  referenceMask(src, width, srcRowBytes, height, fourBit))
             << "width " << width << " height " << height << (fourBit ? " 4-bit" : " 1-bit");
-        ASSERT_EQ(mask->width, width);
-        ASSERT_EQ(mask->height, height);
-        ASSERT_EQ(mask->flag, 0);
+        ASSERT_EQ(cache.isReservedMask(mask), useReserved);
+        ASSERT_TRUE(mask->width == width && mask->height == height && mask->flag == 0);
         // Dirty storage for the next mask, whose padding must still come out zero.
         std::memset(mask->data, 0xFF, size);
         cache.DeleteBitmapMask(mask);
@@ -805,23 +687,20 @@ TEST(CZYRMaskCacheTest, ReservedMaskLimits) {
     CZYRMaskCache cache(8);
     std::vector<unsigned char> src(size_t{512} * 2001, 0xC3);
     unsigned int size = 0;
-    struct Case {
-        unsigned int width, height;
-        bool fourBit, reserved;
-        unsigned int bytes;
-    };
-    for (const Case& c :
-         {Case{1024, 1024, false, false, 131072}, // at the 1-bit limit
-          Case{1024, 1025, false, true, 131200}, Case{2000, 600, false, true, 151200},
-          Case{2000, 2000, false, true, 504000}, // fills the reserved mask
-          Case{1024, 1024, true, false, 524288}, // at the 4-bit limit
-          Case{1000, 1009, true, false, 504500}}) {
-        const unsigned int srcRow = c.fourBit ? c.width / 2 : (c.width + 7) / 8;
+    // width, height, 4-bit, reserved, bytes: the 1-bit limit, past it, filling the reserved
+    // mask, the 4-bit limit, below it
+    for (const auto& [width, height, fourBit, reserved, bytes] :
+         {std::tuple{1024u, 1024u, false, false, 131072u},
+          {1024u, 1025u, false, true, 131200u},
+          {2000u, 600u, false, true, 151200u},
+          {2000u, 2000u, false, true, 504000u},
+          {1024u, 1024u, true, false, 524288u},
+          {1000u, 1009u, true, false, 504500u}}) {
+        const unsigned int srcRow = fourBit ? width / 2 : (width + 7) / 8;
         ZYR_MaskRec* mask =
-            cache.CreateBitmapMask(src.data(), c.width, srcRow, c.height, size, c.fourBit, false);
-        EXPECT_EQ(size, c.bytes);
-        EXPECT_EQ(cache.isReservedMask(mask), c.reserved) << c.width << " x " << c.height;
-        EXPECT_EQ(mask->data[size - 1], c.fourBit ? 0x3C : (c.width % 32 ? 0 : 0xC3));
+            cache.CreateBitmapMask(src.data(), width, srcRow, height, size, fourBit, false);
+        EXPECT_EQ(std::tuple(size, cache.isReservedMask(mask), mask->data[size - 1]),
+                  std::tuple(bytes, reserved, fourBit ? 0x3C : (width % 32 ? 0 : 0xC3)));
         cache.DeleteBitmapMask(mask);
     }
     expectAssertion(
@@ -831,21 +710,17 @@ TEST(CZYRMaskCacheTest, ReservedMaskLimits) {
     expectAssertion([&] { cache.GetMaskRec(70000, 1); });
     expectAssertion([&] { cache.CreateBitmapMask(src.data(), 8, 1, 65536, size, false, true); });
     expectAssertion([&] { cache.CreateBitmapMask(nullptr, 8, 1, 1, size, false, false); });
-
     // Small masks still come from the reserved record when asked to.
     ZYR_MaskRec* reserved = cache.CreateBitmapMask(src.data(), 8, 1, 1, size, false, true);
     EXPECT_TRUE(cache.isReservedMask(reserved));
     cache.DeleteBitmapMask(reserved);
     EXPECT_EQ(reserved->data[0], 0xC3) << "deleting the reserved mask leaves it alone";
-
     // Moving a mask into the reserved record.
     ZYR_MaskRec* mask = cache.CreateBitmapMask(src.data(), 40, 5, 3, size, false, false);
     ASSERT_EQ(size, 24u);
     const std::vector<unsigned char> bytes(mask->data, mask->data + size);
     ZYR_MaskRec* moved = cache.FallbackToReservedMask(mask, size);
-    EXPECT_TRUE(cache.isReservedMask(moved));
-    EXPECT_EQ(moved->width, 40);
-    EXPECT_EQ(moved->height, 3);
+    EXPECT_TRUE(cache.isReservedMask(moved) && moved->width == 40 && moved->height == 3);
     EXPECT_EQ(std::vector<unsigned char>(moved->data, moved->data + size), bytes);
     EXPECT_EQ(cache.FallbackToReservedMask(moved, 5), moved);
     EXPECT_EQ(cache.GetMaskRec(8, 1), mask) << "the moved mask's record was freed";
@@ -862,29 +737,22 @@ TEST(CZYRMaskCacheTest, WithoutMemoryEveryRequestGetsTheReservedMask) {
     const unsigned long long before = GetMemUsage();
     {
         CZYRMaskCache cache(2);
-        const ExhaustedMemory exhausted;
-        ASSERT_TRUE(exhausted.ok());
-
-        // The initial page still serves small masks.
+        const auto exhausted = exhaustMemory();
+        ASSERT_TRUE(exhausted);
         ZYR_MaskRec* first = cache.GetMaskRec(100, 10);
-        EXPECT_FALSE(cache.isReservedMask(first));
-        // The supplier refuses a large block...
-        ZYR_MaskRec* large = cache.GetMaskRec(2000, 700);
-        EXPECT_TRUE(cache.isReservedMask(large));
-        EXPECT_EQ(large->width, 2000);
-        EXPECT_EQ(large->height, 700);
+        EXPECT_FALSE(cache.isReservedMask(first)) << "the initial page still serves";
+        ZYR_MaskRec* large = cache.GetMaskRec(2000, 700); // the supplier refuses the block
+        EXPECT_TRUE(cache.isReservedMask(large) && large->width == 2000 && large->height == 700);
         EXPECT_TRUE(allZero(large->data, 176400));
-        // ...and once the records are used up no new block is made.
+        // Once the records are used up no new block is made.
         ZYR_MaskRec* second = cache.GetMaskRec(100, 10);
         EXPECT_FALSE(cache.isReservedMask(second));
         unsigned int size = 0;
         std::vector<unsigned char> src(100, 0x80);
         ZYR_MaskRec* third = cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, false);
         EXPECT_TRUE(cache.isReservedMask(third));
-        EXPECT_EQ(third->data[0], 0x01);
-        EXPECT_EQ(third->data[4 * 99], 0x01);
+        EXPECT_TRUE(third->data[0] == 0x01 && third->data[4 * 99] == 0x01);
         expectAssertion([&] { cache.GetMaskRec(2000, 2001); });
-
         cache.DeleteBitmapMask(first);
         ZYR_MaskRec* reused = cache.GetMaskRec(50, 1);
         EXPECT_EQ(reused, first) << "a freed record serves without new memory";
@@ -893,21 +761,15 @@ TEST(CZYRMaskCacheTest, WithoutMemoryEveryRequestGetsTheReservedMask) {
     }
     EXPECT_EQ(GetMemUsage(), before);
     {
-        const ExhaustedMemory exhausted;
-        try {
-            CZYRMaskCache refused(2);
-            ADD_FAILURE() << "made without storage";
-        } catch (const CZYRError& e) {
-            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory);
-            EXPECT_STREQ(e.getMessage(), "failed to allocate mask cache storage");
-            EXPECT_STREQ(e.getSrcFileName(), kMaskSource);
-        }
+        const auto exhausted = exhaustMemory();
+        expectError([] { CZYRMaskCache refused(2); }, ZYRPublic::kZYRErrorOutOfMemory,
+                    "failed to allocate mask cache storage", kMaskSource);
     }
     EXPECT_EQ(GetMemUsage(), before) << "a refused construction keeps nothing";
 }
 
 TEST(CZYRMaskCacheTest, EveryHeapAllocationMayFail) {
-    const auto workload = [] {
+    failEachAllocation([] {
         CZYRMaskCache cache(3);
         std::vector<unsigned char> src(64 * 40, 0x5A);
         unsigned int size = 0;
@@ -919,8 +781,7 @@ TEST(CZYRMaskCacheTest, EveryHeapAllocationMayFail) {
         }
         for (ZYR_MaskRec* m : masks)
             cache.DeleteBitmapMask(m);
-    };
-    failEachAllocation(workload);
+    });
 }
 
 } // namespace

@@ -32,8 +32,6 @@ template <class Call> void expectBadParam(Call call, const char* message, const 
     }
 }
 
-// ---- matrices -------------------------------------------------------------------------------
-
 ::testing::AssertionResult near(const CZYRMatrix& got, const CZYRMatrix& want, double eps) {
     if (got.equal(want, eps))
         return ::testing::AssertionSuccess();
@@ -200,8 +198,6 @@ TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
     }
 }
 
-// ---- rectangles -----------------------------------------------------------------------------
-
 // Expected values in the constructor's order: left, bottom, right, top.
 ::testing::AssertionResult is(const CZYRRect& got, double l, double b, double r, double t) {
     const sZYRRect& g = got;
@@ -265,8 +261,6 @@ TEST(CZYRRectTest, IntersectionAndTouch) {
     }
 }
 
-// ---- sampled functions ----------------------------------------------------------------------
-
 struct Collect : IEncodedDataCBProc {
     bool encodedSample(int index, float value) override {
         EXPECT_EQ(index, static_cast<int>(values.size()));
@@ -311,8 +305,6 @@ TEST(CZYRSampledFuncTest, ResamplingRules) {
         },
         "invalid index", "source/zyr/std/CZYRMemBuffer");
 }
-
-// ---- fixed point ----------------------------------------------------------------------------
 
 constexpr int32_t kMin = std::numeric_limits<int32_t>::min();
 constexpr int32_t kMax = std::numeric_limits<int32_t>::max();

@@ -9,7 +9,6 @@
 #include <random>
 #include <set>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "zyr/std/core/ZYRMem.h"
@@ -328,27 +327,6 @@ TEST(CZYRDictTest, FinalizeIsDeepAndCloneIsNot) {
     trailing.set(3, CZYRUniString("x"));
     trailing.getImpl()->insert(3, err);
     EXPECT_EQ(trailing.clone().getLength(), 5u);
-}
-
-TEST(CZYRDictTest, FinalizedContainersAreReadFromSeveralThreads) {
-    CZYRDict dict;
-    for (unsigned int n = 0; n < 300; ++n)
-        dict.set(CZYRUniString(("k" + std::to_string(n)).c_str()), n);
-    dict.finalize();
-    std::vector<std::thread> readers;
-    std::vector<unsigned int> sums(2, 0);
-    for (int t = 0; t < 2; ++t)
-        readers.emplace_back([&dict, &sums, t] {
-            for (unsigned int n = 0; n < 300; ++n) {
-                unsigned int v = 0;
-                dict.get(CZYRUniString(("k" + std::to_string(n)).c_str()), &v);
-                sums[t] += v;
-            }
-        });
-    for (auto& r : readers)
-        r.join();
-    EXPECT_EQ(sums[0], 299u * 300 / 2);
-    EXPECT_EQ(sums[1], sums[0]);
 }
 
 TEST(CZYRDictTest, CyclesAndDeepNestingAreRefusedByFinalizeAndClone) {

@@ -321,8 +321,6 @@ TEST(CZYRUniStringTest, IcuAllocationFailureIsAnErrorNotACrash) {
     EXPECT_EQ(growErr.getError(), ZYRPublic::kZYRErrorOutOfMemory);
 }
 
-// ---- narrow strings and data buffers ---------------------------------------------------------
-
 TEST(CZYRStringTest, HashConversionsAndStreams) {
     EXPECT_EQ(CZYRString("ab").hashCode(), 3105u);
     const CZYRString withZero("a\0b", 3);
@@ -405,8 +403,6 @@ TEST(CZYRStringTest, DataBuffersKeepTheirOwnCopy) {
     EXPECT_THROW(CZYRDataBuffer("x", 1), CZYRError);
     zyrtest::installFront(0);
 }
-
-// ---- the common strings table and the dynamic cache --------------------------------------------
 
 TEST(CZYRCommonUniStringsTest, EveryAccessorAnswersItsOwnRowAndText) {
     IZYRCommonUniStrings* table = GetCommonUniStrings();
