@@ -15,6 +15,10 @@ namespace ZYRStd {
 
 namespace {
 
+// Hosts see these in the error records of this file.
+constexpr const char* kSource = "source/zyr/std/CZYRErrorStk";
+constexpr int kCreateLine = 146;
+
 constexpr unsigned int kMaxUnits = ZYRPublic::kZYRErrorMessageLength;
 
 size_t boundedLength(const char16_t* text) {
@@ -44,8 +48,7 @@ using RecordPtr = std::unique_ptr<sZYRErrorInfo, RecordFree>;
 RecordPtr newRecord(const sZYRErrorInfo& info) {
     RecordPtr record(static_cast<sZYRErrorInfo*>(std::malloc(sizeof(sZYRErrorInfo))));
     if (!record)
-        throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "Memory alloc failed",
-                        "source/zyr/std/CZYRErrorStk", __LINE__);
+        throw CZYRError(ZYRPublic::kZYRErrorOutOfMemory, "Memory alloc failed", kSource, __LINE__);
     record->errorCode = info.errorCode;
     copyBounded(record->message, info.message);
     record->next = nullptr;
@@ -134,14 +137,13 @@ sZYRErrorInfo ZYRMakeErrorInfo(short errorCode, const char16_t* message) {
 }
 
 I_ErrorStk* createErrorStk(ZYRPublic::I_Error& err) {
-    return ZYRErrorBoundary<I_ErrorStk*>(err, nullptr, "Error in ZYRStd::createErrorStk",
-                                         "source/zyr/std/CZYRErrorStk", 146, []() -> I_ErrorStk* {
-                                             std::lock_guard lock(processStackMutex);
-                                             if (!processStack)
-                                                 processStack =
-                                                     ::new (processStackStorage) IImp_ZYRErrorStk;
-                                             return processStack;
-                                         });
+    return ZYRErrorBoundary<I_ErrorStk*>(
+        err, nullptr, "Error in ZYRStd::createErrorStk", kSource, kCreateLine, []() -> I_ErrorStk* {
+            std::lock_guard lock(processStackMutex);
+            if (!processStack)
+                processStack = ::new (processStackStorage) IImp_ZYRErrorStk;
+            return processStack;
+        });
 }
 
 void TerminateErrorStk() {

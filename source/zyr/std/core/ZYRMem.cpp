@@ -30,6 +30,7 @@ namespace ZYRStd {
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/ZYRMem";
+constexpr int kInvalidPointerLine = 2012;
 constexpr uint32_t kGuardWord = 0xDEADBEEF;
 // Plain blocks carry the requested size in a 16-byte header so that any host allocator
 // works (there is no portable usable-size query) and the user pointer stays 16-aligned.
@@ -460,7 +461,7 @@ void ZYRDbgCheckZYRMemAllocPtr(void* p) {
         return;
     const auto invalid = [] {
         return CZYRError(ZYRPublic::kZYRErrorFatal, "ZYRCheckZYRMemAllocPtr:: ptr is invalid",
-                         kSource, 2012);
+                         kSource, kInvalidPointerLine);
     };
     // The tail guard sits at the header's size: that size is read only once the head guard
     // holds and, where the allocation map exists, once the map confirms it, so that a damaged

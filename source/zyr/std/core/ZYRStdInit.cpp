@@ -17,6 +17,8 @@ namespace ZYRStd {
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/ZYRStdInit";
+constexpr int kFileSysAlreadySetLine = 56;
+constexpr int kNoFactoryLine = 35;
 
 constinit unsigned int workerID = 1;
 constinit tZYRFactoryProc factoryProc = nullptr;
@@ -121,7 +123,8 @@ void ZYRStdInit_OEMFlushCBSet(tOEMFlushCB* cb) {
 
 void ZYRStdInit_SetZYRFactoryProc(tZYRFactoryProc proc) {
     if (factoryProc && proc)
-        throw CZYRError(ZYRPublic::kZYRErrorFatal, "Default filsSys already set", kSource, 56);
+        throw CZYRError(ZYRPublic::kZYRErrorFatal, "Default filsSys already set", kSource,
+                        kFileSysAlreadySetLine);
     factoryProc = proc;
 }
 
@@ -132,7 +135,7 @@ void ZYRStdInit_SetDefaultFileSysProc(tZYRDefaultFileSysProc proc) {
 ZYRFactory::IZYRFactory* ZYRGetFactory() {
     if (!factoryProc)
         throw CZYRError(ZYRPublic::kZYRErrorFatal, "ZYRFactory Proc not set in ZYRStd", kSource,
-                        35);
+                        kNoFactoryLine);
     return factoryProc();
 }
 

@@ -20,16 +20,22 @@ public:
         const std::size_t bytes = std::max<std::size_t>(n, 1) * sizeof(T);
         void* p = bytes > 0xFFFFFFFFu
                       ? nullptr
-                      : ZYRDMMMalloc(static_cast<unsigned int>(bytes), "CZYRSTDALLOCATOR", nullptr,
+                      : ZYRDMMMalloc(static_cast<unsigned int>(bytes), kClientName, nullptr,
                                      nullptr, nullptr, ZYRPublic::eFlushMemorySeverityNormal);
         if (!p)
-            throw CZYRBadAlloc("Mem error in ZYRStdAllocator", "source/zyr/std/CZYRStdAllocator",
-                               94);
+            throw CZYRBadAlloc("Mem error in ZYRStdAllocator", kSource, kAllocationLine);
         return static_cast<T*>(p);
     }
-    void deallocate(T* p, std::size_t) noexcept { ZYRDMMFree(p, "CZYRSTDALLOCATOR", nullptr); }
+    void deallocate(T* p, std::size_t) noexcept { ZYRDMMFree(p, kClientName, nullptr); }
 
     template <class U> bool operator==(const CZYRStdAllocator<U>&) const noexcept { return true; }
+
+private:
+    // The name the memory manager's log shows for these blocks.
+    static constexpr const char* kClientName = "CZYRSTDALLOCATOR";
+    // The record of a failed allocation, as hosts have always seen it.
+    static constexpr const char* kSource = "source/zyr/std/CZYRStdAllocator";
+    static constexpr int kAllocationLine = 94;
 };
 
 } // namespace ZYRStd
