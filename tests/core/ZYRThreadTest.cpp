@@ -56,13 +56,6 @@ private:
     CZYRPublicRefCountBase rc_;
 };
 
-zyrtest::FailingHost* failingHost = nullptr;
-int handlerCalls = 0;
-void recoveringHandler() {
-    ++handlerCalls;
-    failingHost->failAll = false;
-}
-
 } // namespace
 
 TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
@@ -71,11 +64,9 @@ TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
         auto* first = new TrackedRecord("renderer", true);
         SetCZYRThreadSpecificPtr(first);
         SetCZYRThreadSpecificPtr(first); // the same record again is kept
-        EXPECT_EQ(liveObjects, 1);
-        EXPECT_EQ(GetCZYRThreadSpecificPtr(), first);
+        EXPECT_TRUE(liveObjects == 1 && GetCZYRThreadSpecificPtr() == first);
         EXPECT_STREQ(first->getThreadName(), "renderer");
-        EXPECT_FLOAT_EQ(first->getZoom(), 1.0f);
-        EXPECT_TRUE(first->IsThisThreadBlockable());
+        EXPECT_TRUE(first->getZoom() == 1.0f && first->IsThisThreadBlockable());
         auto* second = new TrackedRecord("renderer", false);
         EXPECT_NE(second->getThreadId(), first->getThreadId());
         SetCZYRThreadSpecificPtr(second);
@@ -107,33 +98,31 @@ TEST(ZYRThreadTest, IdentifiersAreDistinctAcrossThreads) {
     for (const auto& make : makers) {
         std::vector<unsigned long long> ids[2];
         std::thread first([&] { std::generate_n(std::back_inserter(ids[0]), 1000, make); });
-        std::thread second([&] { std::generate_n(std::back_inserter(ids[1]), 1000, make); });
+        std::generate_n(std::back_inserter(ids[1]), 1000, make);
         first.join();
-        second.join();
         std::set<unsigned long long> all;
         for (const auto& list : ids) {
             EXPECT_TRUE(std::is_sorted(list.begin(), list.end(), std::less_equal<>()));
             all.insert(list.begin(), list.end());
         }
-        EXPECT_EQ(all.size(), 2000u);
-        EXPECT_GE(*all.begin(), 1u);
-        EXPECT_GT(make(), *all.rbegin());
+        EXPECT_TRUE(all.size() == 2000 && *all.begin() >= 1 && make() > *all.rbegin());
     }
-    EXPECT_EQ(CZYRClientRegistrar::makeID(nullptr), 2002u) << "client identifiers start at 1";
+    // Client identifiers start at 1; each run of this test takes 2001 of them.
+    EXPECT_EQ(CZYRClientRegistrar::makeID(nullptr) % 2002, 0u);
 }
 
 TEST(ZYRThreadTest, ClientBaseAllocatesThroughTheFrontAndTheNewHandler) {
     struct Object : CZYRClientBase {
         int payload[4];
     };
-    zyrtest::FailingHost host;
-    failingHost = &host;
+    static zyrtest::FailingHost host;
+    static int handlerCalls;
+    handlerCalls = 0;
     tZYRMemMgr record = host.record();
     zyrtest::installFront(0, &record);
     const unsigned long long before = GetMemUsage();
     auto* object = new Object;
-    EXPECT_EQ(ZYRMemSize(object), sizeof(Object));
-    EXPECT_EQ(GetMemUsage(), before + sizeof(Object));
+    EXPECT_TRUE(ZYRMemSize(object) == sizeof(Object) && GetMemUsage() == before + sizeof(Object));
     delete object;
     EXPECT_EQ(GetMemUsage(), before);
 
@@ -142,7 +131,10 @@ TEST(ZYRThreadTest, ClientBaseAllocatesThroughTheFrontAndTheNewHandler) {
     // A failing front: the new handler is called until it recovers (without one the fault
     // sweep sees ZYROutOfMemoryError).
     host.failAll = true;
-    const std::new_handler previous = std::set_new_handler(recoveringHandler);
+    const std::new_handler previous = std::set_new_handler([] {
+        ++handlerCalls;
+        host.failAll = false;
+    });
     object = new Object;
     std::set_new_handler(previous);
     EXPECT_EQ(handlerCalls, 1);
@@ -162,36 +154,25 @@ TEST(ZYRThreadTest, ClientRegistryNotifications) {
     EXPECT_FALSE(registry.allNotificationsReceived());
     registry.markNotification(5);
     EXPECT_TRUE(registry.allNotificationsReceived());
-    try {
-        registry.notificationReceived(3);
-        ADD_FAILURE() << "unknown identifiers are an error";
-    } catch (const CZYRError& e) {
-        EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorBadParam);
-        EXPECT_STREQ(e.getMessage(), "CZYRClientRegistry:: Unknown clientID");
-        EXPECT_STREQ(e.getSrcFileName(), "source/zyr/std/CZYRClientRegistry");
-        EXPECT_EQ(e.getSrcLineNumber(), 61);
-    }
+    EXPECT_EQ(zyrtest::thrown([&] { registry.notificationReceived(3); }),
+              "6: CZYRClientRegistry:: Unknown clientID (source/zyr/std/CZYRClientRegistry:61)");
 }
 
 TEST(CZYRSmartPtrTest, CountsOnBothSchemes) {
     auto* object = new Counted;
-    EXPECT_EQ(object->peekRefCnt(), 1);
-    EXPECT_FALSE(object->isShared());
+    EXPECT_TRUE(object->peekRefCnt() == 1 && !object->isShared());
     object->addRef();
     EXPECT_TRUE(object->isShared());
     object->release();
     EXPECT_EQ(object->peekRefCnt(), 1);
     object->release();
     EXPECT_EQ(liveObjects, 0);
-
     CZYRPublicRefCountBase rc;
     EXPECT_FALSE(rc.isShared());
     rc.addRef();
-    EXPECT_TRUE(rc.isShared());
-    EXPECT_FALSE(rc.release());
+    EXPECT_TRUE(rc.isShared() && !rc.release());
     EXPECT_TRUE(rc.release()) << "true exactly on the 1 -> 0 step";
-    EXPECT_EQ(*rc.debugGetRefCountAddr(), 0u);
-    EXPECT_TRUE(rc.isShared()) << "a count of 0 answers shared on the public base";
+    EXPECT_TRUE(*rc.debugGetRefCountAddr() == 0 && rc.isShared()) << "0 answers shared";
 
     alignas(4) unsigned int count = 1;
     EXPECT_FALSE(ZYRIsShared_ThreadSafe(&count));
@@ -201,9 +182,9 @@ TEST(CZYRSmartPtrTest, CountsOnBothSchemes) {
         for (int i = 0; i < 50000; ++i)
             ZYRDecrementRefCnt_ThreadSafe(&count);
     };
-    std::thread first(churn), second(churn);
-    first.join();
-    second.join();
+    std::thread other(churn);
+    churn();
+    other.join();
     EXPECT_EQ(ZYRPeekValue_ThreadSafe(&count), 100001u) << "counts must never tear";
     EXPECT_TRUE(ZYRIsShared_ThreadSafe(&count));
     count = 1;
@@ -237,8 +218,7 @@ TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
         EXPECT_EQ(a->peekRefCnt(), 2);
         CZYRSmartZYRRefPtr<Counted> c(new Counted);
         b = c;
-        EXPECT_EQ(a->peekRefCnt(), 1);
-        EXPECT_EQ(c->peekRefCnt(), 2);
+        EXPECT_TRUE(a->peekRefCnt() == 1 && c->peekRefCnt() == 2);
         a = c; // the first object's last reference goes
         EXPECT_EQ(liveObjects, 1);
     }
@@ -252,16 +232,17 @@ TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
             another = copy;
         }
     };
-    std::thread first(copies), second(copies);
-    first.join();
-    second.join();
+    std::thread other(copies);
+    copies();
+    other.join();
     EXPECT_EQ(shared->debugGetRefCount(), 1u) << "copies on two threads";
     shared.reset();
     EXPECT_EQ(liveObjects, 0);
 }
 
 TEST(CZYRSmartPtrTest, ContainerLendsACountAndUsesTheDeleter) {
-    static int deleted = 0;
+    static int deleted;
+    deleted = 0;
     struct Plain {
         int value = 4;
     };
@@ -272,11 +253,9 @@ TEST(CZYRSmartPtrTest, ContainerLendsACountAndUsesTheDeleter) {
                 ++deleted;
                 delete p;
             }));
-        EXPECT_GT(GetMemUsage(), before) << "the box comes from the front";
-        EXPECT_EQ(box->getObject()->value, 4);
+        EXPECT_TRUE(GetMemUsage() > before && box->getObject()->value == 4);
     }
-    EXPECT_EQ(deleted, 1);
-    EXPECT_EQ(GetMemUsage(), before);
+    EXPECT_TRUE(deleted == 1 && GetMemUsage() == before);
     void* one = czyrsmartptralloc(0);
     EXPECT_EQ(ZYRMemSize(one), 1u);
     czyrsmartptrfree(one);

@@ -61,6 +61,7 @@ struct FakeQueue : ZYRPublic::I_SurfaceQueue {
 };
 
 const auto yes = [](unsigned int) { return true; };
+using Block = std::unique_ptr<void, void (*)(void*)>;
 
 class ZYRDMMTest : public ::testing::Test {
 protected:
@@ -117,16 +118,14 @@ TEST_F(ZYRDMMTest, NormalFlushAsksOnlyClientsLargeEnoughLargestFirst) {
     FakeClient small("small", 10), large("large", 50), middle("middle", 30);
     EXPECT_FALSE(ZYRFlushMemory(nullptr, 40, eFlushMemorySeverityNormal));
     EXPECT_EQ(large.requests, std::vector<unsigned int>{40});
-    EXPECT_TRUE(middle.requests.empty());
-    EXPECT_TRUE(small.requests.empty());
+    EXPECT_TRUE(middle.requests.empty() && small.requests.empty());
     // Sizes are asked afresh at each of the sort's 3 comparisons and for each of 3 clients,
     // then before and after the flush, at the next client, and for the status line.
     EXPECT_EQ(small.sizeQueries + large.sizeQueries + middle.sizeQueries, 10u);
 
     middle.answer = yes;
     EXPECT_TRUE(ZYRFlushMemory(nullptr, 40, eFlushMemorySeverityUrgent));
-    EXPECT_EQ(large.requests.size(), 2u);
-    EXPECT_EQ(middle.requests.size(), 1u);
+    EXPECT_TRUE(large.requests.size() == 2 && middle.requests.size() == 1);
     EXPECT_TRUE(small.requests.empty()) << "the walk stops at the first success";
 
     const std::string log = closeLog();
@@ -150,8 +149,7 @@ TEST_F(ZYRDMMTest, RequesterIsNeverAskedAndNinthClientIsIgnored) {
         clients.push_back(std::make_unique<FakeClient>("c", 100 + i));
     // clients[9] is the largest and the requester; clients[8] is the ninth eligible one.
     EXPECT_FALSE(ZYRFlushMemory(clients[9].get(), 1, eFlushMemorySeverityUrgent));
-    EXPECT_TRUE(clients[9]->requests.empty());
-    EXPECT_TRUE(clients[8]->requests.empty());
+    EXPECT_TRUE(clients[9]->requests.empty() && clients[8]->requests.empty());
     for (unsigned int i = 0; i < 8; ++i)
         EXPECT_EQ(clients[i]->requests.size(), 1u) << i;
     EXPECT_EQ(count(closeLog(), "-- Too many flushable clients \n"), 1u);
@@ -191,9 +189,7 @@ TEST_F(ZYRDMMTest, SuccessfulFlushLetsTheRetrySucceed) {
     FakeClient cache("cache", 4096, [this](unsigned int) { return !(host_.failAll = false); });
     host_.failAll = true;
     EXPECT_EQ(dmmMalloc(100, &cache), nullptr) << "the requester is the only client: skipped";
-    void* p = dmmMalloc(100);
-    ASSERT_NE(p, nullptr);
-    ZYRDMMFree(p, "TEST", nullptr);
+    EXPECT_NE(Block(dmmMalloc(100), ZYRFree), nullptr);
     EXPECT_TRUE(has(closeLog(), "----  Memory allocation succeed after flushing for Client : "
                                 "<TEST> , [memory needed = 100 bytes ] \n"));
 }
@@ -208,11 +204,8 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
     RegisterSurfaceQueueInstance(&queue);
     FakeClient cache("cache", 1 << 30, yes);
     host_.failAll = true;
-    void* p = dmmMalloc(1000);
-    ASSERT_NE(p, nullptr);
-    EXPECT_EQ(queue.calls, 1);
-    EXPECT_TRUE(cache.requests.empty());
-    ZYRFree(p);
+    EXPECT_NE(Block(dmmMalloc(1000), ZYRFree), nullptr);
+    EXPECT_TRUE(queue.calls == 1 && cache.requests.empty());
     void* more = ZYRMalloc(4000);
     queue.onSync = [&] { ZYRFree(more); };
     EXPECT_FALSE(ArrangeMemoryBySyncRendererThread(4000, true)) << "the drop must exceed the need";
@@ -258,14 +251,14 @@ TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
         EXPECT_EQ(dmmMalloc(10), nullptr);
         EXPECT_FALSE(ZYRFlushMemory(nullptr, 10, eFlushMemorySeverityUrgent));
     }).join();
-    EXPECT_EQ(queue.calls, 0);
-    EXPECT_TRUE(cache.requests.empty());
+    EXPECT_TRUE(queue.calls == 0 && cache.requests.empty());
     EXPECT_EQ(count(closeLog(), "Memory can not be arranged for this thread \n"), 3u);
 }
 
 TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
     EXPECT_EQ(dmmMalloc(0), nullptr);
     static std::vector<unsigned int> oemRequests;
+    oemRequests.clear();
     tOEMFlushCB oem{[](unsigned int need, unsigned int reserved, eFlushMemorySeverity, void* data) {
                         EXPECT_EQ(reserved, 0u);
                         EXPECT_EQ(data, reinterpret_cast<void*>(0x42));
@@ -292,8 +285,7 @@ TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
 TEST_F(ZYRDMMTest, ThreadSafeFlushUsesItsOwnListAndStoredSizes) {
     FakeClient everywhere("everywhere", 100, yes, true), mainOnly("mainOnly", 500, yes);
     EXPECT_TRUE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
-    EXPECT_TRUE(mainOnly.requests.empty());
-    EXPECT_EQ(everywhere.requests.size(), 1u);
+    EXPECT_TRUE(mainOnly.requests.empty() && everywhere.requests.size() == 1);
     EXPECT_FALSE(ZYRFlushMemoryThreadSafe(&everywhere, 50, eFlushMemorySeverityNormal));
 
     UnregisterFlushableMemoryClient(&everywhere);
@@ -306,27 +298,31 @@ TEST_F(ZYRDMMTest, ThreadSafeFlushUsesItsOwnListAndStoredSizes) {
                     "memory (before call): <100 bytes> \t\t\t\t   \n"));
 }
 
+// Engine clients count per thread; an oversized JOV block is refused silently.
 TEST_F(ZYRDMMTest, EngineClientsCountPerThread) {
+    ZYRSetMemLimit(400ull << 20);
+    EXPECT_EQ(DMM_JOVAlloc(DMM_GetJOVAllocMaxSingleBlockSize() + 1), nullptr);
+    unsigned long long earlier = 0, peak = 0; // the peak lasts for the process
     DMM_SetMemoryClientThreadID(eZYRMemoryClientInterp, GetCZYRThreadSpecificPtr()->getThreadId());
+    DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &earlier);
     void* tuma = DMM_TUMAAlloc(nullptr, 100);
     void* jov = DMM_JOVAlloc(0);
-    ASSERT_NE(tuma, nullptr);
-    ASSERT_NE(jov, nullptr);
+    ASSERT_TRUE(tuma && jov);
     EXPECT_EQ(DMM_JOVMemSize(jov), 1u);
     void* other = nullptr;
     std::thread([&] { other = DMM_TUMAAlloc(nullptr, 50); }).join();
 
-    unsigned long long peak = 0;
-    EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &peak), 100u);
-    EXPECT_EQ(peak, 100u);
+    EXPECT_TRUE(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &peak) == 100 &&
+                peak == std::max(earlier, 100ull));
     EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientAll, nullptr), 150u);
-    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientInterp), 101u);
-    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientOthers), 50u);
-    EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientAll), 151u);
+    EXPECT_EQ((std::vector{DMM_GetCurrTUMAJOVMem(eZYRMemoryClientInterp),
+                           DMM_GetCurrTUMAJOVMem(eZYRMemoryClientOthers),
+                           DMM_GetCurrTUMAJOVMem(eZYRMemoryClientAll)}),
+              (std::vector<unsigned long long>{101, 50, 151}));
 
     tuma = DMM_TUMAReAlloc(nullptr, tuma, 300);
-    EXPECT_EQ(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &peak), 300u);
-    EXPECT_EQ(peak, 300u);
+    EXPECT_TRUE(DMM_GetCurrTUMAMem(eZYRMemoryClientInterp, &peak) == 300 &&
+                peak == std::max(earlier, 300ull));
 
     // Freed by the interpreter although another thread allocated it: "others" clamps at 0.
     DMM_TUMAFree(nullptr, other);
@@ -335,11 +331,6 @@ TEST_F(ZYRDMMTest, EngineClientsCountPerThread) {
     DMM_JOVFree(jov);
     EXPECT_EQ(DMM_GetCurrTUMAJOVMem(eZYRMemoryClientAll), 0u);
     DMM_SetMemoryClientThreadID(eZYRMemoryClientInterp, ~0ull);
-}
-
-TEST_F(ZYRDMMTest, OversizedJovBlockIsRefusedSilently) {
-    ZYRSetMemLimit(400ull << 20);
-    EXPECT_EQ(DMM_JOVAlloc(DMM_GetJOVAllocMaxSingleBlockSize() + 1), nullptr);
     EXPECT_EQ(closeLog(), "");
 }
 
@@ -400,8 +391,7 @@ TEST_F(ZYRDMMTest, ClientTotalsDoNotWaitBehindAFlush) {
     totals.wait();
     EXPECT_TRUE(answered) << "the totals waited behind the flush";
     GetClientsMemoryUsedAndMemoryLimit(flushable, limit, used);
-    EXPECT_EQ(flushable, 1023u);
-    EXPECT_EQ(used, GetMemUsage());
+    EXPECT_TRUE(flushable == 1023 && used == GetMemUsage());
     tZYRVirtualMemoryInfo info{};
     VirtualMemStatus(&info);
     EXPECT_EQ(limit, std::min<unsigned long long>(ZYRGetMemLimit(), info.totalPhysical));
