@@ -201,20 +201,13 @@ TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
         EXPECT_GT(own, 0u);
         EXPECT_GT(failures, own);
 
-        // The interface form reports the same failures as -1.
-        const C_SmartPtr<I_Dict> dict = options;
-        for (unsigned int failing = 1; failing <= calls + 6; ++failing) {
-            unsigned short** dirs = nullptr;
-            unsigned short** names = nullptr;
-            host.calls = 0;
-            host.failAt = failing;
-            const int32_t stored = ZYRSetDirListAndCacheFileList(dict, dirs, names);
-            host.failAt = 0;
-            EXPECT_TRUE(stored >= 0 || (!dirs && !names)) << "allocation " << failing;
-            take(dirs, stored < 0 ? 0 : static_cast<unsigned int>(stored));
-            take(names, names ? 4 : 0);
-            ASSERT_EQ(GetMemUsage(), baseline) << "allocation " << failing << " failed";
-        }
+        // The interface form reports a failure as -1 and hands nothing out.
+        unsigned short** dirs = nullptr;
+        unsigned short** names = nullptr;
+        host.failAll = true;
+        EXPECT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(options), dirs, names), -1);
+        host.failAll = false;
+        EXPECT_TRUE(!dirs && !names && GetMemUsage() == baseline);
     }
     ZYRSetZYRFontsDir(nullptr);
     ZYRSetFontCacheDir(nullptr);

@@ -287,12 +287,7 @@ TEST(ZYRStartupOptionsTest, FreshProcessState) {
     });
 }
 
-// Typed setters with rules of their own (the others store what they are given).
-TEST(ZYRStartupOptionsTest, TypedSetters) {
-    const char16_t folder[] = u"/var/log/analytics";
-    ZYRSetAnalyticsLogFolder(folder);
-    EXPECT_EQ(ZYRGetAnalyticsLogFolder(), folder) << "the pointer itself is kept";
-    ZYRSetAnalyticsLogFolder(nullptr);
+TEST(ZYRStartupOptionsTest, TypedSettersWithRulesOfTheirOwn) {
     ZYRSetMaxSurfacesOnQueue(1LL << 33);
     long long queue = 0;
     ZYRSetDefaultMaxSurfacesOnQueue(queue);

@@ -49,16 +49,16 @@ std::u16string drainErrorStack() {
     return CZYRErrorStk().getErrorMessage(text) ? text : u"";
 }
 
-// An enabled record of group `group` with the given key and value pairs.
-void setPairs(CZYRAnalyticsData&) {}
-template <class Value, class... Rest>
-void setPairs(CZYRAnalyticsData& r, const char* key, Value value, Rest... rest) {
+// An enabled record (or a dictionary) of group `group` with the given key and value pairs.
+template <class R> void setPairs(R&) {}
+template <class R, class Value, class... Rest>
+void setPairs(R& r, const char* key, Value value, Rest... rest) {
     r.set(CZYRUniString(key), value);
     setPairs(r, rest...);
 }
-template <class... Pairs> CZYRAnalyticsData record(const char* group, Pairs... pairs) {
+template <class R = CZYRAnalyticsData, class... Pairs> R record(const char* group, Pairs... pairs) {
     ZYRSetAnalyticsActive(true);
-    CZYRAnalyticsData r;
+    R r;
     if (group)
         r.set(CZYRUniString("DataGroupName"), CZYRUniString(group));
     setPairs(r, pairs...);
@@ -200,15 +200,11 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
 
 TEST_F(FarlampTest, DocumentFactsAndErrors) {
     start();
-    CZYRDict info;
-    info.set(CZYRUniString("DataGroupName"), CZYRUniString("PDFInfo"));
-    info.set(CZYRUniString("PDFMajorVersion"), 1u);
-    info.set(CZYRUniString("PDFMinorVersion"), int32_t{7});
-    info.set(CZYRUniString("PDFX"), true);
-    info.set(CZYRUniString("PDFCreatorApp"), CZYRUniString("Writer"));
-    info.set(CZYRUniString("PDFPreTrapped"), CZYRUniString("False"));
-    info.set(CZYRUniString("SecurityType"), 0u);
-    info.set(CZYRUniString("NumPages"), 12u);
+    using S = CZYRUniString;
+    CZYRDict info =
+        record<CZYRDict>("PDFInfo", "PDFMajorVersion", 1u, "PDFMinorVersion", int32_t{7}, "PDFX",
+                         true, "PDFCreatorApp", S("Writer"), "PDFPreTrapped", S("False"),
+                         "SecurityType", 0u, "NumPages", 12u);
     Farlamp::LogDict(info);
     EXPECT_EQ(recorder.take(), group(100, "PDFInfo",
                                      {"PDFVersion,1.7", "PDFX,1", "creatorApp,Writer",
@@ -252,17 +248,16 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
 
 TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
     start();
-    EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false), 1u);
-    EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false), 2u);
-    EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, true), 2u) << "peek";
+    for (const auto& [peek, count] : {std::pair{false, 1u}, {false, 2u}, {true, 2u}})
+        EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, peek), count) << peek;
     for (const auto type :
          {kZYRAnalyticsEventCachePlacedObject, // without its gate: not logged
           kZYRAnalyticsEventEnableCutContourProcessing, kZYRAnalyticsEventCutContourProcessed,
           kZYRAnalyticsEventHasTrapping, // counted only
           kZYRAnalyticsEventEnableLowResRasterization, kZYRAnalyticsEventZYREnableMTR})
         Farlamp::LogEvent(type, false);
-    EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(13), false), 0u);
-    EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(-1), false), 0u);
+    for (const int outside : {13, -1})
+        EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(outside), false), 0u);
     EXPECT_EQ(recorder.take(), Calls{}) << "counting logs nothing";
     Farlamp::LogEvent(kZYRAnalyticsEventAll, false);
     EXPECT_EQ(recorder.take(),

@@ -19,7 +19,6 @@ using ZYRPublic::C_SmartPtr;
 using ZYRPublic::eZYRErrorType;
 using ZYRPublic::I_Error;
 
-// The count protocol for any interface; the last release deletes.
 template <class Interface> using RefCounted = ZYRHostKit::Counted<Interface>;
 
 // A new object with its creator's reference adopted.
@@ -101,7 +100,6 @@ private:
 // Each getter hands out what its member holds; a null member means "not there".
 class FakeInterfaceSet : public RefCounted<ZYRPublic::I_OEMInterfaceSet> {
 public:
-    // One member and its getter for each interface of the set.
 #define ZYRTEST_SLOT(Name, member)                                                                 \
     C_SmartPtr<ZYRPublic::I_OEM##Name> member;                                                     \
     bool getOEM##Name(ZYRPublic::I_OEM##Name** o, I_Error&) override {                             \

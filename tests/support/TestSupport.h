@@ -46,7 +46,6 @@ std::string readFile(const std::string& path);
 void writeFile(const std::string& path, const std::string& bytes);
 
 class TempDir;
-
 struct Outcome {
     int exitCode = -1; // -1: the program did not start
     std::string out;
