@@ -403,6 +403,9 @@ TEST(CZYRStreamsFilterTest, ASCII85ArgumentsAndFailures) {
     filter.close();
     filter.close();
     EXPECT_EQ(contents(out), "5l~>\r\n");
+    const Stream byDestructor = sink();
+    CZYRStreamFilterASCII85{CZYRSmartZYRRefPtr<IZYRStream>(byDestructor)}.write("A", 1, 1);
+    EXPECT_EQ(contents(byDestructor), "5l~>\r\n") << "the destructor closes";
     EXPECT_FALSE(filter.getTargetStream());
     expectError([&] { filter.write("x", 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
                 "CZYRStreamFilterASCII85::write - stream invalid", kA85Source);
