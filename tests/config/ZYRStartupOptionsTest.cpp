@@ -241,8 +241,6 @@ TEST(ZYRStartupOptionsTest, DisplayListCacheRecord) {
     ZYRParseSLDLOptions(nullptr, "SLCompression", "9");
     ZYRSetDLCacheOptions(options);
     EXPECT_EQ(ZYRGetDLCacheOptions().maxDisk, most);
-    ZYRGetDLCacheOptions().maxDisk = 77; // the store copy is handed out by reference
-    EXPECT_EQ(ZYRGetDLCacheOptions().maxDisk, 77);
 }
 
 // The store copies and the once-only budget flag are process state: look at them fresh.

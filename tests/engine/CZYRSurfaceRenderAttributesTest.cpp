@@ -74,24 +74,23 @@ TEST(CZYRSurfaceRenderAttributesTest, DeviceValidationAndEquality) {
 
     // Each argument takes part in the comparison on its own.
     const std::function<void(Device&)> changes[] = {
-        [](Device& d) { d.components = 4; },
-        [](Device& d) { d.first = 9; },
-        [](Device& d) { d.xRes = 73; },
-        [](Device& d) { d.yRes = 145; },
-        [](Device& d) { d.rect = CZYRRect(0, 0, 10, 21); },
-        [](Device& d) { d.fourth = 2; },
-        [](Device& d) { d.block.value[2] = 513; },
-        [](Device& d) { d.firstFlag = true; },
-        [](Device& d) { d.second = 2; },
-        [](Device& d) { d.third = 2; },
-        [](Device& d) { d.secondFlag = true; },
-        [](Device& d) { d.thirdFlag = false; },
-        [](Device& d) { d.order.setValue(1); },
-        [](Device& d) { d.order = colorants(4); },
-        [](Device& d) { (d.order = colorants(2)).add("Other", 2); },
-        [](Device& d) { (d.order = colorants(2)).add("Yellow", 3); },
-        [](Device& d) { (d.array = CZYRArray()).set(0, 1u); },
-    };
+        [](auto& d) { d.components = 4; },
+        [](auto& d) { d.first = 9; },
+        [](auto& d) { d.xRes = 73; },
+        [](auto& d) { d.yRes = 145; },
+        [](auto& d) { d.rect = CZYRRect(0, 0, 10, 21); },
+        [](auto& d) { d.fourth = 2; },
+        [](auto& d) { d.block.value[2] = 513; },
+        [](auto& d) { d.firstFlag = true; },
+        [](auto& d) { d.second = 2; },
+        [](auto& d) { d.third = 2; },
+        [](auto& d) { d.secondFlag = true; },
+        [](auto& d) { d.thirdFlag = false; },
+        [](auto& d) { d.order.setValue(1); },
+        [](auto& d) { d.order = colorants(4); },
+        [](auto& d) { (d.order = colorants(2)).add("Other", 2); },
+        [](auto& d) { (d.order = colorants(2)).add("Yellow", 3); },
+        [](auto& d) { (d.array = CZYRArray()).set(0, 1u); }};
     const CZYRRasterDeviceAttributes base = Device().make();
     EXPECT_TRUE(base == Device().make());
     for (size_t i = 0; i < std::size(changes); ++i) {
@@ -259,15 +258,14 @@ TEST(CZYRSurfaceRenderAttributesTest, StrokeParams) {
     CZYRStrokeParams base;
     base.setDashedArray(dashes, 3);
     const std::function<void(CZYRStrokeParams&)> changes[] = {
-        [](CZYRStrokeParams& c) { c.setLineWidth(2); },
-        [](CZYRStrokeParams& c) { c.setMiterLimit(3); },
-        [](CZYRStrokeParams& c) { c.setDashedOffset(1); },
-        [](CZYRStrokeParams& c) { c.setStrokeAdjust(true); },
-        [&](CZYRStrokeParams& c) { c.setDashedArray(dashes, 2); },
-        [&](CZYRStrokeParams& c) { c.setDashedArray(other, 3); },
-        [](CZYRStrokeParams& c) { c.setLineCap(static_cast<eZYRLineCapType>(1)); },
-        [](CZYRStrokeParams& c) { c.setLineJoin(static_cast<eZYRLineJoinType>(1)); },
-    };
+        [](auto& c) { c.setLineWidth(2); },
+        [](auto& c) { c.setMiterLimit(3); },
+        [](auto& c) { c.setDashedOffset(1); },
+        [](auto& c) { c.setStrokeAdjust(true); },
+        [&](auto& c) { c.setDashedArray(dashes, 2); },
+        [&](auto& c) { c.setDashedArray(other, 3); },
+        [](auto& c) { c.setLineCap(static_cast<eZYRLineCapType>(1)); },
+        [](auto& c) { c.setLineJoin(static_cast<eZYRLineJoinType>(1)); }};
     for (size_t i = 0; i < std::size(changes); ++i) {
         CZYRStrokeParams changed(base);
         EXPECT_TRUE(changed == base);

@@ -203,9 +203,6 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
               "> !!!!!!!!!!62pEOD\r\n");
     EXPECT_EQ(zyrstd({"encode", "asciihex", "--prefix", "  ", in}).out,
               "  000000000000000041ff>\r\n");
-    fs::remove(in);
-    fs::remove(text);
-    fs::remove(back);
 
     const std::string out = dir_.file("out.txt");
     const std::string badA85 = file("bad.a85", std::string(100000, 'A') + "{~>");
@@ -219,17 +216,18 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
          "ASCIIHexDecode: invalid character 0x7A at offset 7"},
         {{"encode", "ascii85", badA85, dir_.file("no/such/dir/out")},
          "cannot create the output file"},
-        {{"encode"}, "usage: zyrstd"},
-        {{"encode", "base64"}, "usage: zyrstd"},
-        {{"encode", "asciihex", "--no-z"}, "usage: zyrstd"},
-        {{"encode", "ascii85", "--prefix", "abc"}, "usage: zyrstd"},
-        {{"encode", "ascii85", "--eod", "123456789012345"}, "usage: zyrstd"},
-        {{"decode", "ascii85", "--prefix", "a"}, "usage: zyrstd"},
-        {{"decode", "ascii85", "a", "b", "c"}, "usage: zyrstd"},
     };
     for (const auto& [args, err] : failures)
-        expectFailure(zyrstd(args), std::string(err) == "usage: zyrstd" ? 2 : 1, err);
-    EXPECT_EQ(listing(), (Args{"bad.a85", "bad.hex"})) << "no output, no temporary file";
+        expectFailure(zyrstd(args), 1, err);
+    for (const Args& args :
+         {Args{"encode"}, Args{"encode", "base64"}, Args{"encode", "asciihex", "--no-z"},
+          Args{"encode", "ascii85", "--prefix", "abc"},
+          Args{"encode", "ascii85", "--eod", "123456789012345"},
+          Args{"decode", "ascii85", "--prefix", "a"}, Args{"decode", "ascii85", "a", "b", "c"},
+          Args{"hwinfo", "--root"}})
+        expectFailure(zyrstd(args), 2, "usage: zyrstd");
+    EXPECT_EQ(listing(), (Args{"back.bin", "bad.a85", "bad.hex", "in.bin", "in.txt"}))
+        << "no output, no temporary file";
     // A failed decode leaves an existing output as it was.
     zyrtest::writeFile(out, "precious");
     EXPECT_EQ(zyrstd({"decode", "ascii85", badA85, out}).exitCode, 1);
@@ -274,5 +272,4 @@ TEST_F(ZyrstdToolTest, HwinfoPrintsTheReportsInUtf8) {
         err += "zyrstd: hwinfo: cannot read the " + std::string(what) + "\n";
     EXPECT_EQ(partial.err, err);
     expectFailure(zyrstd({"hwinfo", "--bogus"}), 2, "usage: zyrstd hwinfo [--root DIR]");
-    EXPECT_EQ(zyrstd({"hwinfo", "--root"}).exitCode, 2);
 }
