@@ -281,15 +281,21 @@ TEST(ZYRStdInitTest, DmmLogOpensOnlyWhenNamed) {
                                                          {dir.path() + "/missing/dir/dmm.log", ""},
                                                          {sized(260), "old"},
                                                          {sized(259), "line\n"}};
+    const auto openFiles = [] {
+        return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
+    };
+    const auto before = openFiles();
     tZYRMemMgr any{};
     for (const auto& [named, expected] : cases) {
         std::ofstream(named) << "old";
         EnvGuard env("ZYR_DMM_LOG", named.empty() ? nullptr : named.c_str());
         ZYRStdInit_ZYRDMMEnv_set(&any);
+        ZYRStdInit_ZYRDMMEnv_set(&any); // opening again closes the file first
         LogDMMInfo("line\n");
         ZYRStdInit_ZYRDMMEnv_set(nullptr);
         EXPECT_EQ(zyrtest::readFile(named), expected) << named;
     }
+    EXPECT_EQ(openFiles(), before) << "closing the log closes its file";
 }
 
 // Both exit routines write a line to standard output and, for an error, one to standard error,

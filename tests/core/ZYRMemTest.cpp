@@ -231,8 +231,10 @@ TEST_F(ZYRMemTest, GuardCheckFindsDamageWithoutReadingPastTheBlock) {
     for (int level : {1, 2}) {
         SCOPED_TRACE(level);
         zyrtest::installFront(level);
+        ZYRSetMemLimit(kLimit);
+        EXPECT_FALSE(grants(static_cast<unsigned int>(kLimit))) << "the limit holds here too";
         auto* one = static_cast<unsigned char*>(ZYRMalloc(0));
-        EXPECT_TRUE(aligned16(one) && ZYRMemSize(one) == 1);
+        ASSERT_TRUE(one && aligned16(one) && ZYRMemSize(one) == 1);
         EXPECT_EQ(check(one) + check(nullptr), "no errorno error");
         one[1] = 0; // the first byte of the tail guard
         EXPECT_EQ(check(one), invalid);

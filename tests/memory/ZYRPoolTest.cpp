@@ -363,6 +363,14 @@ TEST(VariableSizeAllocatorTest, Boundaries) {
     char* q = alloc(b, 127);
     EXPECT_EQ(b.GetPtrSize(p), 128u);
     EXPECT_EQ(b.Free(p) + b.Free(q), 0u);
+    // A long name is cut to 38 characters and ended, whatever the memory held before.
+    alignas(VariableSizeAllocator) unsigned char raw[sizeof(VariableSizeAllocator)];
+    std::memset(raw, 0xFF, sizeof raw);
+    VariableSizeAllocator* named = std::construct_at(reinterpret_cast<VariableSizeAllocator*>(raw),
+                                                     std::string(45, 'n').c_str(), 0, 0, 4096,
+                                                     Supplier::alloc, Supplier::free, &t);
+    EXPECT_EQ(std::string(named->name()), std::string(38, 'n'));
+    std::destroy_at(named);
     EXPECT_TRUE(t.allocCalls == 1 && t.freedBytes == 0);
     EXPECT_EQ(problems(b), "");
 }
