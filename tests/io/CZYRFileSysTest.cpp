@@ -4,6 +4,8 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <functional>
+#include <memory>
 #include <new>
 #include <set>
 #include <string>
@@ -121,21 +123,15 @@ TEST(CZYRFileSysTest, FileNameCountsAndForwards) {
     { CZYRFileName adopting(raw, false); }
     EXPECT_EQ(raw->peekRefCnt(), 1) << "adopting takes over a reference";
     {
-        CZYRFileName sharing(raw, true);
-        CZYRFileName copy(sharing);
+        CZYRFileName sharing(raw, true), copy(sharing), clone = copy.clone();
         EXPECT_EQ(raw->peekRefCnt(), 3);
-        EXPECT_TRUE(copy.getWStringPath() == ZYRStd::CZYRWString(u"/a/b/c.txt"));
-        EXPECT_FALSE(copy.isEmpty());
-        CZYRFileName clone = copy.clone();
-        EXPECT_NE(static_cast<ZYRFileName::IZYRFileName*>(clone), raw);
-        EXPECT_EQ(static_cast<ZYRFileName::IZYRFileName*>(clone)->peekRefCnt(), 1)
-            << "the clone's reference is adopted, not doubled";
+        EXPECT_TRUE(copy.getWStringPath() == ZYRStd::CZYRWString(u"/a/b/c.txt") && !copy.isEmpty());
+        auto* cloned = static_cast<ZYRFileName::IZYRFileName*>(clone);
+        EXPECT_TRUE(cloned != raw && cloned->peekRefCnt() == 1) << "adopted, not doubled";
     }
     EXPECT_EQ(raw->peekRefCnt(), 1);
     raw->release();
-
-    CZYRFileName pathless(new PathlessName, false);
-    EXPECT_TRUE(pathless.getWStringPath().empty());
+    EXPECT_TRUE(CZYRFileName(new PathlessName, false).getWStringPath().empty());
     CZYRFileName none;
     EXPECT_TRUE(none.isEmpty());
     expectError([&] { none.getWStringPath(); }, ZYRPublic::kZYRErrorInvalidObject, "Null object",
@@ -144,28 +140,22 @@ TEST(CZYRFileSysTest, FileNameCountsAndForwards) {
 
 TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
     zyrtest::TempDir dir;
-    // 245 characters in all is the longest accepted name.
-    std::string longest = dir.path() + "/";
-    longest += std::string(245 - longest.size(), 'd');
-    const std::string cache = dir.file("cache");
-    ZYRFileSys::IZYRFileSys* fs = ZYRFileSys::createDefaultFileSystem(
-        ZYRStd::CZYRUniString(longest.c_str()), ZYRStd::CZYRUniString(cache.c_str()), nullptr);
-    ASSERT_NE(fs, nullptr);
-    EXPECT_TRUE(exists(longest));
-    EXPECT_TRUE(exists(cache));
-    EXPECT_EQ(utf8(fs->getTempDirName()), longest);
-    EXPECT_EQ(utf8(fs->getDLCacheDirName()), cache);
-    delete fs;
-
-    // An empty text stands for a name not given.
+    // 245 characters in all is the longest accepted name; an empty text is a name not given.
+    const std::string longest = dir.path() + "/" + std::string(244 - dir.path().size(), 'd'),
+                      cache = dir.file("cache"), tooLong = longest + "x";
     auto create = [](const std::string& temp, const std::string& dl) {
         auto uni = [](const std::string& t) {
             return t.empty() ? ZYRStd::CZYRUniString() : ZYRStd::CZYRUniString(t.c_str());
         };
-        delete ZYRFileSys::createDefaultFileSystem(uni(temp), uni(dl), nullptr);
+        return std::unique_ptr<ZYRFileSys::IZYRFileSys>(
+            ZYRFileSys::createDefaultFileSystem(uni(temp), uni(dl), nullptr));
     };
-    create(longest, cache); // existing directories are fine
-    const std::string tooLong = longest + "x";
+    for (int twice = 0; twice < 2; ++twice) { // existing directories are fine
+        const auto fs = create(longest, cache);
+        EXPECT_TRUE(exists(longest) && exists(cache));
+        EXPECT_EQ(utf8(fs->getTempDirName()) + "|" + utf8(fs->getDLCacheDirName()),
+                  longest + "|" + cache);
+    }
     expectError([&] { create(tooLong, ""); }, ZYRPublic::kZYRErrorLimitCheck,
                 "temp dir filename too long");
     expectError([&] { create("", tooLong); }, ZYRPublic::kZYRErrorLimitCheck,
@@ -182,7 +172,6 @@ protected:
 TEST_P(FileStreamTest, OpenModesAndTransfers) {
     const std::string path = fx_.dir_.file("data.bin");
     writeFile(path, "0123456789");
-
     {
         auto s = fx_.open(path, kZYRStreamRead | kZYRStreamWrite);
         ASSERT_TRUE(s && s->isOpen());
@@ -190,33 +179,27 @@ TEST_P(FileStreamTest, OpenModesAndTransfers) {
         EXPECT_EQ(utf8(s->getFilePath()), path);
         char buf[4] = {};
         EXPECT_EQ(s->read(buf, 2, 2), 4u);
-        EXPECT_EQ(std::string(buf, 4), "0123");
-        EXPECT_EQ(s->getPos(), 4u);
+        EXPECT_EQ(std::string(buf, 4) + std::to_string(s->getPos()), "01234");
         EXPECT_EQ(s->write("AB", 1, 2), 2u);
         EXPECT_EQ(s->setPos(8), 8u);
         EXPECT_EQ(s->read(buf, 1, 4), 2u) << "a short read is the end of the file";
         s->setEOF();
         EXPECT_EQ(s->getPos(), 10u);
         s->setPos(3);
-        EXPECT_TRUE(s->truncate());
-        EXPECT_EQ(s->getSize(), 3u);
+        EXPECT_TRUE(s->truncate() && s->getSize() == 3);
         s->close();
         EXPECT_FALSE(s->isOpen());
     }
     EXPECT_EQ(readFile(path), "012");
-
     {
         auto s = fx_.open(path, kZYRStreamAppend);
-        ASSERT_TRUE(s->isOpen());
         EXPECT_EQ(s->write("xy", 1, 2), 2u);
         char c;
         EXPECT_THROW(s->read(&c, 1, 1), CZYRError);
     }
     EXPECT_EQ(readFile(path), "012xy") << "append writes at the end";
-
     {
         auto s = fx_.open(path, kZYRStreamWrite | kZYRStreamTruncate);
-        ASSERT_TRUE(s->isOpen());
         EXPECT_EQ(s->getSize(), 0u);
         s->write("new", 1, 3);
         s->reOpen(kZYRStreamRead);
@@ -225,28 +208,19 @@ TEST_P(FileStreamTest, OpenModesAndTransfers) {
         EXPECT_EQ(std::string(buf, 3), "new");
         EXPECT_EQ(s->getAccessMode(), kZYRStreamRead);
     }
-
-    if (!GetParam()) {
-        // What write-only means to a host file is the host's choice; natively it empties.
+    if (!GetParam()) { // what write-only means to a host file is the host's choice
         fx_.open(path, kZYRStreamWrite)->write("n", 1, 1);
         EXPECT_EQ(readFile(path), "n");
     }
-
-    const std::string created = fx_.dir_.file("created.bin");
-    fx_.open(created, kZYRStreamWrite | kZYRStreamTruncate)->write("abc", 1, 3);
-    EXPECT_EQ(readFile(created), "abc");
-
     const std::string temporary = fx_.dir_.file("gone.tmp");
     {
         auto s = fx_.open(temporary, kZYRStreamRead | kZYRStreamWrite | kZYRStreamDeleteOnClose);
-        ASSERT_TRUE(s->isOpen());
         s->write("x", 1, 1);
         EXPECT_TRUE(exists(temporary));
     }
     EXPECT_FALSE(exists(temporary)) << "deleted when its last handle closed";
-
-    fx_.open(created, kZYRStreamRead)->removeFile();
-    EXPECT_FALSE(exists(created));
+    fx_.open(path, kZYRStreamRead)->removeFile();
+    EXPECT_FALSE(exists(path));
 }
 
 TEST_P(FileStreamTest, FilesThatDoNotOpen) {
@@ -262,40 +236,34 @@ TEST_P(FileStreamTest, FilesThatDoNotOpen) {
     expectError([&] { missing->write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
                 "stream is not writable");
 
-    if (!GetParam()) {
-        EXPECT_FALSE(fx_.open(fx_.dir_.path(), kZYRStreamRead)->isOpen()) << "not a file";
-    }
+    EXPECT_TRUE(GetParam() || !fx_.open(fx_.dir_.path(), kZYRStreamRead)->isOpen())
+        << "a directory";
 }
 
 TEST_P(FileStreamTest, TemporaryFiles) {
-    auto s = CZYRFileSys::createTmpFileStream(CZYRFileName(fx_.dir_.path().c_str()), u"zyrtemp",
+    const std::string dir = fx_.dir_.path();
+    auto s = CZYRFileSys::createTmpFileStream(CZYRFileName(dir.c_str()), u"zyrtemp",
                                               kZYRStreamRead | kZYRStreamWrite);
     ASSERT_TRUE(s && s->isOpen());
     const std::string path = utf8(s->getFilePath());
-    EXPECT_EQ(path.rfind(fx_.dir_.path() + "/", 0), 0u) << path;
-    EXPECT_EQ(path.find("/zyr", fx_.dir_.path().size()), fx_.dir_.path().size()) << path;
-    EXPECT_TRUE(exists(path));
+    EXPECT_EQ(path.find(dir + "/zyr"), 0u) << path;
     EXPECT_EQ(s->getSize(), 0u);
     s->write("tmp", 1, 3);
     s->close();
     EXPECT_EQ(readFile(path), "tmp");
-
-    auto other = CZYRFileSys::createTmpFileStream(CZYRFileName(fx_.dir_.path().c_str()), u"zyr",
+    auto other = CZYRFileSys::createTmpFileStream(CZYRFileName(dir.c_str()), u"zyr",
                                                   kZYRStreamWrite | kZYRStreamDeleteOnClose);
-    ASSERT_TRUE(other && other->isOpen());
     const std::string otherPath = utf8(other->getFilePath());
     EXPECT_NE(otherPath, path) << "each temporary file is new";
     other->close();
     EXPECT_FALSE(exists(otherPath));
-
     if (!GetParam()) {
         // Natively: at most three characters of the prefix, six random ones and ".TMP".
-        EXPECT_EQ(path.size() - fx_.dir_.path().size(), 1u + 3 + 6 + 4) << path;
+        EXPECT_EQ(path.size() - dir.size(), 1u + 3 + 6 + 4) << path;
         EXPECT_EQ(path.substr(path.size() - 4), ".TMP");
-        const auto bare = CZYRFileSys::createTmpFileStream(
-            CZYRFileName((fx_.dir_.path() + "/").c_str()), nullptr, kZYRStreamWrite);
-        EXPECT_EQ(utf8(bare->getFilePath()).size() - fx_.dir_.path().size(), 1u + 6 + 4)
-            << "no prefix, and one separator";
+        const auto bare = CZYRFileSys::createTmpFileStream(CZYRFileName((dir + "/").c_str()),
+                                                           nullptr, kZYRStreamWrite);
+        EXPECT_EQ(utf8(bare->getFilePath()).size() - dir.size(), 1u + 6 + 4) << "one separator";
         const CZYRFileName nowhere(fx_.dir_.file("no/such/dir").c_str());
         expectOpFailed([&] { CZYRFileSys::createTmpFileStream(nowhere, u"x", kZYRStreamWrite); },
                        "File rename failed");
@@ -419,51 +387,44 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
     const std::string a = fx_.dir_.file("a.txt"), b = fx_.dir_.file("b.txt");
     writeFile(a, "alpha");
     EXPECT_TRUE(CZYRFileSys::fileExists(name("a.txt")));
-    EXPECT_FALSE(CZYRFileSys::fileExists(name("b.txt")));
-    EXPECT_FALSE(CZYRFileSys::fileExists(CZYRFileName("")));
-
+    EXPECT_FALSE(CZYRFileSys::fileExists(name("b.txt")) ||
+                 CZYRFileSys::fileExists(CZYRFileName("")));
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), true);
     EXPECT_EQ(readFile(b), "alpha");
-    expectOpFailed([&] { CZYRFileSys::copy(name("a.txt"), name("b.txt"), true); },
-                   "File copy failed");
     writeFile(a, "beta");
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), false);
     EXPECT_EQ(readFile(b), "beta");
-    expectOpFailed([&] { CZYRFileSys::copy(name("a.txt"), name("a.txt"), false); },
-                   "File copy failed");
-    EXPECT_EQ(readFile(a), "beta") << "copying a file onto itself must not empty it";
-    expectOpFailed([&] { CZYRFileSys::copy(name("none"), name("c.txt"), false); },
-                   "File copy failed");
-    EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::copy(CZYRFileName(""), name("c.txt"), false); // an empty path does nothing
-
-    expectOpFailed([&] { CZYRFileSys::rename(name("a.txt"), name("b.txt")); },
-                   "File rename failed");
-    EXPECT_EQ(readFile(b), "beta") << "an existing target is not replaced";
+    // Refused: an existing target when asked, a file onto itself, a missing source, an
+    // existing or missing rename, a missing file to delete.
+    const std::pair<std::function<void()>, const char*> refusals[] = {
+        {[&] { CZYRFileSys::copy(name("a.txt"), name("b.txt"), true); }, "File copy failed"},
+        {[&] { CZYRFileSys::copy(name("a.txt"), name("a.txt"), false); }, "File copy failed"},
+        {[&] { CZYRFileSys::copy(name("none"), name("c.txt"), false); }, "File copy failed"},
+        {[&] { CZYRFileSys::rename(name("a.txt"), name("b.txt")); }, "File rename failed"},
+        {[&] { CZYRFileSys::rename(name("none"), name("d.txt")); }, "File rename failed"},
+        {[&] { CZYRFileSys::remove(name("none"), false); }, "File delete failed"},
+        {[&] { CZYRFileSys::makeDirectory(name("no/such")); }, "Directory create failed"},
+        {[&] { CZYRFileSys::makeDirectory(CZYRFileName("")); },
+         "Directory create failed empty filename"},
+    };
+    for (const auto& [call, message] : refusals)
+        expectOpFailed(call, message);
+    EXPECT_EQ(readFile(a) + readFile(b), "betabeta") << "nothing emptied or replaced";
+    EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::rename(name("a.txt"), name("c.txt"));
-    EXPECT_FALSE(exists(a));
-    EXPECT_EQ(readFile(fx_.dir_.file("c.txt")), "beta");
-    expectOpFailed([&] { CZYRFileSys::rename(name("a.txt"), name("d.txt")); },
-                   "File rename failed");
-
+    EXPECT_EQ(std::to_string(exists(a)) + readFile(fx_.dir_.file("c.txt")), "0beta");
     CZYRFileSys::remove(name("c.txt"), false);
     EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::remove(name("c.txt"), true);
-    expectOpFailed([&] { CZYRFileSys::remove(name("c.txt"), false); }, "File delete failed");
-
     EXPECT_TRUE(CZYRFileSys::isSameFile(name("x"), name("x")));
     EXPECT_FALSE(
         CZYRFileSys::isSameFile(name("x"), CZYRFileName((fx_.dir_.path() + "/./x").c_str())))
         << "texts only, no normalisation";
-
-    CZYRFileSys::makeDirectory(name("sub"));
+    for (int twice = 0; twice < 2; ++twice) // the second time it exists: nothing to do
+        CZYRFileSys::makeDirectory(name("sub"));
     struct stat st;
-    ASSERT_EQ(::stat(fx_.dir_.file("sub").c_str(), &st), 0);
-    EXPECT_TRUE(S_ISDIR(st.st_mode));
-    CZYRFileSys::makeDirectory(name("sub")); // exists: nothing to do
-    expectOpFailed([&] { CZYRFileSys::makeDirectory(name("no/such")); }, "Directory create failed");
-    expectOpFailed([&] { CZYRFileSys::makeDirectory(CZYRFileName("")); },
-                   "Directory create failed empty filename");
+    EXPECT_TRUE(::stat(fx_.dir_.file("sub").c_str(), &st) == 0 && S_ISDIR(st.st_mode));
 }
 
 // Collects what an enumeration reports.
@@ -481,16 +442,13 @@ private:
 };
 
 TEST_F(FileOperationsTest, EnumDirectory) {
-    const std::string root = fx_.dir_.file("tree");
-    ::mkdir(root.c_str(), 0777);
-    ::mkdir((root + "/inner").c_str(), 0777);
-    writeFile(root + "/plain", "p");
-    writeFile(root + "/.hidden", "h");
-    writeFile(root + "/...", "dots"); // an ordinary name on POSIX
-    writeFile(root + "/locked", "l");
+    const std::string root = fx_.dir_.file("tree"), empty = fx_.dir_.file("empty");
+    for (const std::string& dir : {root, root + "/inner", empty})
+        ::mkdir(dir.c_str(), 0777);
+    for (const char* leaf : {"/plain", "/.hidden", "/...", "/locked"}) // "..." is ordinary here
+        writeFile(root + leaf, "x");
     ::chmod((root + "/locked").c_str(), 0444);
-
-    Collector plain, slashed;
+    Collector plain, slashed, first(1), none, ignored;
     EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(root.c_str()), plain));
     EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName((root + "/").c_str()), slashed));
     std::sort(plain.entries.begin(), plain.entries.end());
@@ -504,28 +462,14 @@ TEST_F(FileOperationsTest, EnumDirectory) {
         {root + "/plain", 0},
     };
     EXPECT_EQ(plain.entries, expected);
-
-    Collector first(1);
     EXPECT_FALSE(CZYRFileSys::enumDirectory(CZYRFileName(root.c_str()), first));
     EXPECT_EQ(first.entries.size(), 1u) << "false stops the enumeration";
-
-    const std::string empty = fx_.dir_.file("empty");
-    ::mkdir(empty.c_str(), 0777);
-    Collector none;
     EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(empty.c_str()), none));
     EXPECT_TRUE(none.entries.empty());
-
-    Collector ignored;
     expectOpFailed([&] { CZYRFileSys::enumDirectory(name("missing"), ignored); },
                    "Directory enum failed");
     expectOpFailed([&] { CZYRFileSys::enumDirectory(CZYRFileName(""), ignored); },
                    "Directory create failed empty filename");
-    if (::geteuid() != 0) {
-        ::chmod(empty.c_str(), 0);
-        expectOpFailed([&] { CZYRFileSys::enumDirectory(name("empty"), ignored); },
-                       "Directory enum failed");
-        ::chmod(empty.c_str(), 0700);
-    }
 }
 
 TEST_F(FileOperationsTest, MappedStreams) {
@@ -534,79 +478,50 @@ TEST_F(FileOperationsTest, MappedStreams) {
     for (size_t i = 0; i < content.size(); ++i)
         content[i] = static_cast<char>('a' + i % 26);
     writeFile(path, content);
-
+    unsigned long long offset = 1;
+    unsigned int length = 1;
+    char c;
     {
         ZYRStd::CZYRMemMapFStream whole(name("mapped.bin"), kZYRStreamRead, 0, 0);
-        ASSERT_TRUE(whole.isMapped());
-        EXPECT_TRUE(whole.isOpen());
-        EXPECT_EQ(whole.getSize(), content.size());
-        EXPECT_EQ(whole.getCapacity(), content.size());
+        ASSERT_TRUE(whole.isMapped() && whole.isOpen());
+        EXPECT_EQ(std::pair(whole.getSize(), whole.getCapacity()), std::pair(10000ull, 10000ull));
         std::string back(content.size(), '\0');
         EXPECT_EQ(whole.read(back.data(), 1, 20000), content.size());
         EXPECT_EQ(back, content);
         expectError([&] { whole.write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
                     "stream is not writable", "source/zyr/std/IImpZYRMemStream");
-
         whole.close();
         EXPECT_FALSE(whole.isMapped());
-        char c;
         expectOpFailed([&] { whole.read(&c, 1, 1); }, "file stm not mapped");
-        ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;
-        EXPECT_EQ(whole.read(&c, 1, 1, err), 0u);
-        EXPECT_EQ(err, ZYRPublic::kZYRErrorFileOpFailed);
-        EXPECT_EQ(whole.getSize(), 0u);
-        EXPECT_EQ(whole.getCapacity(), 0u);
-        unsigned long long offset = 1;
-        unsigned int length = 1;
-        EXPECT_EQ(whole.getMapAttributes(offset, length), nullptr);
-        EXPECT_EQ(offset, 0u);
-        EXPECT_EQ(length, 0u);
-
+        EXPECT_EQ(std::tuple(whole.getSize(), whole.getCapacity(),
+                             whole.getMapAttributes(offset, length), offset, length),
+                  std::tuple(0u, 0u, nullptr, 0u, 0u));
         whole.reOpen(kZYRStreamRead);
         ASSERT_TRUE(whole.isMapped()) << "a closed stream maps again on reOpen";
-        EXPECT_EQ(whole.read(&c, 1, 1), 1u);
-        EXPECT_EQ(c, 'a');
+        EXPECT_TRUE(whole.read(&c, 1, 1) == 1 && c == 'a');
     }
-
     {
         // Not on a page boundary: the stream starts at the requested byte anyway.
         ZYRStd::CZYRMemMapFStream window(name("mapped.bin"), kZYRStreamRead, 4099, 100);
-        unsigned long long offset = 0;
-        unsigned int length = 0;
         const char* base = static_cast<const char*>(window.getMapAttributes(offset, length));
-        EXPECT_EQ(offset, 4099u);
-        EXPECT_EQ(length, 100u);
+        EXPECT_EQ(std::pair(offset, length), std::pair(4099ull, 100u));
         EXPECT_EQ(std::string(base, 100), content.substr(4099, 100));
-        char buf[100];
-        EXPECT_EQ(window.read(buf, 1, 100), 100u);
-        EXPECT_EQ(std::string(buf, 100), content.substr(4099, 100));
-        window.setPos(5);
-        window.setEOF();
-        EXPECT_EQ(window.getPos(), 100u);
-        EXPECT_EQ(window.getSize(), 100u);
         ASSERT_EQ(::truncate(path.c_str(), 4099 + 10), 0);
         EXPECT_EQ(window.getSize(), 10u) << "only what is left of a file that shrank";
         ASSERT_EQ(::truncate(path.c_str(), 4000), 0);
         EXPECT_EQ(window.getSize(), 0u);
-        writeFile(path, content);
     }
-
     expectOpFailed(
-        [&] { ZYRStd::CZYRMemMapFStream past(name("mapped.bin"), kZYRStreamRead, 9990, 100); },
+        [&] { ZYRStd::CZYRMemMapFStream past(name("mapped.bin"), kZYRStreamRead, 3990, 100); },
         "error mapping view of file");
-
     {
         // A writable view past the end grows the file; the bytes reach it.
         ZYRStd::CZYRMemMapFStream out(name("grown.bin"), kZYRStreamRead | kZYRStreamWrite, 100, 8);
-        ASSERT_TRUE(out.isMapped());
         EXPECT_EQ(out.getSize(), 8u) << "readable: the whole window is the content";
         out.write("ABCDEFGH", 1, 8);
         out.flush();
     }
-    const std::string grown = readFile(fx_.dir_.file("grown.bin"));
-    ASSERT_EQ(grown.size(), 108u);
-    EXPECT_EQ(grown.substr(100), "ABCDEFGH");
-
+    EXPECT_EQ(readFile(fx_.dir_.file("grown.bin")), std::string(100, '\0') + "ABCDEFGH");
     writeFile(fx_.dir_.file("empty.bin"), "");
     expectOpFailed([&] { ZYRStd::CZYRMemMapFStream e(name("empty.bin"), kZYRStreamRead, 0, 0); },
                    "Error mapping empty file");
@@ -615,106 +530,72 @@ TEST_F(FileOperationsTest, MappedStreams) {
 }
 
 // A scripted system call: each step is the result of one call (with errno for -1).
-struct Script {
-    std::vector<std::pair<ssize_t, int>> steps;
-    size_t calls = 0;
-    ssize_t next() {
-        if (calls >= steps.size())
-            return ADD_FAILURE() << "called again after the script ended", -1;
-        const auto [result, error] = steps[calls++];
-        errno = error;
-        return result;
-    }
-};
-Script* script = nullptr;
-ssize_t scriptedRead(int, void*, size_t) {
-    return script->next();
-}
-ssize_t scriptedWrite(int, const void*, size_t) {
-    return script->next();
+std::vector<std::pair<ssize_t, int>> steps;
+size_t calls = 0;
+ssize_t scripted() {
+    if (calls >= steps.size())
+        return ADD_FAILURE() << "called again after the script ended", -1;
+    return errno = steps[calls].second, steps[calls++].first;
 }
 
 TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
-    struct Case {
-        bool write;
-        std::vector<std::pair<ssize_t, int>> steps;
-        size_t done;
-        int error;
-        const char* why;
-    };
-    const Case cases[] = {
-        {true, {{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}, 10, 0, "interrupts are retried"},
-        {true, {{3, 0}, {0, 0}}, 3, EIO, "a write that moves nothing must not be retried for ever"},
-        {true, {{2, 0}, {-1, ENOSPC}}, 2, ENOSPC, "the failure's errno"},
-        {true, {{-1, 0}}, 0, EIO, "a failure without errno"},
-        {false, {{-1, EINTR}, {7, 0}, {0, 0}}, 7, 0, "the end of the file is no error"},
-        {false, {{5, 0}, {-1, EBADF}}, 5, EBADF, "the failure's errno"},
+    // Interrupts are retried; a write that moves nothing must not be retried for ever; the
+    // failure's errno, or EIO without one; the end of the file is no error.
+    const std::tuple<bool, std::vector<std::pair<ssize_t, int>>, size_t, int> cases[] = {
+        {true, {{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}, 10, 0},
+        {true, {{3, 0}, {0, 0}}, 3, EIO},
+        {true, {{2, 0}, {-1, ENOSPC}}, 2, ENOSPC},
+        {true, {{-1, 0}}, 0, EIO},
+        {false, {{-1, EINTR}, {7, 0}, {0, 0}}, 7, 0},
+        {false, {{5, 0}, {-1, EBADF}}, 5, EBADF},
     };
     char buf[10] = {};
-    for (const Case& c : cases) {
-        Script s{c.steps};
-        script = &s;
-        const auto t = c.write ? ZYRStd::posixio::writeFully(3, buf, 10, scriptedWrite)
-                               : ZYRStd::posixio::readFully(3, buf, 10, scriptedRead);
-        EXPECT_EQ(t.done, c.done) << c.why;
-        EXPECT_EQ(t.error, c.error) << c.why;
-        EXPECT_EQ(s.calls, s.steps.size()) << c.why;
+    for (const auto& [write, script, done, error] : cases) {
+        steps = script;
+        calls = 0;
+        const auto t = write ? ZYRStd::posixio::writeFully(
+                                   3, buf, 10, [](int, const void*, size_t) { return scripted(); })
+                             : ZYRStd::posixio::readFully(
+                                   3, buf, 10, [](int, void*, size_t) { return scripted(); });
+        EXPECT_EQ(std::tuple(t.done, t.error, calls), std::tuple(done, error, steps.size()));
     }
-    script = nullptr;
 }
 
 // The host kit's procedures, noting which DI paths and path texts the host has handed out
 // and not yet been given back.
-struct DIPathLedger {
-    static inline ZYRPublic::_t_ZYRPDLFileSysRec real{};
-    static inline std::set<void*> outstanding;
-
-    static void* wPathToDIPath(const char16_t* path, int reserved) {
-        void* diPath = real.wPathToDIPath(path, reserved);
-        if (diPath)
-            outstanding.insert(diPath);
-        return diPath;
-    }
-    static char16_t* diPathToWPath(void* diPath, int reserved) {
-        char16_t* text = real.diPathToWPath(diPath, reserved);
-        if (text)
-            outstanding.insert(text);
-        return text;
-    }
-    static void free(void* p) {
-        outstanding.erase(p);
-        real.free(p);
-    }
-};
+ZYRPublic::_t_ZYRPDLFileSysRec real{};
+std::set<void*> outstanding;
+template <class T> T* noted(T* p) {
+    return p ? outstanding.insert(p), p : p;
+}
 
 TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     FileSysFixture fx(true);
     const std::string path = fx.dir_.file("host.txt");
     writeFile(path, "host");
-    DIPathLedger::real = fx.record_;
-    fx.record_.wPathToDIPath = DIPathLedger::wPathToDIPath;
-    fx.record_.diPathToWPath = DIPathLedger::diPathToWPath;
-    fx.record_.free = DIPathLedger::free;
-
+    real = fx.record_;
+    fx.record_.wPathToDIPath = [](const char16_t* p, int r) {
+        return noted(real.wPathToDIPath(p, r));
+    };
+    fx.record_.diPathToWPath = [](void* p, int r) { return noted(real.diPathToWPath(p, r)); };
+    fx.record_.free = [](void* p) { outstanding.erase(p), real.free(p); };
     zyrtest::FailingHost host;
     ZYRStd::tZYRMemMgr memory = host.record();
     zyrtest::installFront(0, &memory);
     fx.open(path, kZYRStreamRead);
     const unsigned int callsPerOpen = host.calls;
-    ASSERT_GT(callsPerOpen, 1u);
-    ASSERT_TRUE(DIPathLedger::outstanding.empty());
-    for (unsigned int failing = 1; failing <= callsPerOpen; ++failing) {
+    ASSERT_TRUE(callsPerOpen > 1 && outstanding.empty());
+    for (host.failAt = 1; host.failAt <= callsPerOpen; ++host.failAt) {
         host.calls = 0;
-        host.failAt = failing;
         try {
             fx.open(path, kZYRStreamRead);
         } catch (const ZYRStd::CZYRError&) {
         } catch (const std::bad_alloc&) {
         }
-        host.failAt = 0;
-        EXPECT_TRUE(DIPathLedger::outstanding.empty()) << "allocation " << failing << " failed";
-        DIPathLedger::outstanding.clear();
+        EXPECT_TRUE(outstanding.empty()) << "allocation " << host.failAt << " failed";
+        outstanding.clear();
     }
+    host.failAt = 0;
     zyrtest::installFront(0);
 }
 
