@@ -1,5 +1,3 @@
-// Geometry: matrix algebra, rectangles, sampled functions and fixed-point arithmetic, each at
-// its boundaries and against plain references over random inputs.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -74,13 +72,8 @@ TEST(CZYRMatrixTest, ProductOrdersAndForms) {
 
     const double rad = 30 * 3.141592653589793 / 180;
     const CZYRMatrix R(std::cos(rad), std::sin(rad), -std::sin(rad), std::cos(rad), 0, 0);
-    // Each prefix (operand first) and postfix (MTX, operand last) form, as a method and as
-    // the free function.
-    const struct {
-        void (*apply)(CZYRMatrix&);
-        CZYRMatrix want;
-        double eps;
-    } forms[] = {
+    // Prefix (operand first) and postfix (MTX) forms, as methods and free functions.
+    const std::tuple<void (*)(CZYRMatrix&), CZYRMatrix, double> forms[] = {
         {[](CZYRMatrix& m) { m *= kB; }, AB, 0},
         {[](CZYRMatrix& m) { m.concat(kB); }, BA, 0},
         {[](CZYRMatrix& m) { m.concatMTX(kB); }, AB, 0},
@@ -97,15 +90,14 @@ TEST(CZYRMatrixTest, ProductOrdersAndForms) {
         {[](CZYRMatrix& m) { ZYRMatrix_rotate(m, 30); }, R * kA, 1e-12},
         {[](CZYRMatrix& m) { ZYRMatrix_rotateMTX(m, 30); }, kA * R, 1e-12},
     };
-    for (size_t i = 0; i < std::size(forms); ++i) {
+    for (const auto& [apply, want, eps] : forms) {
         CZYRMatrix m = kA;
-        forms[i].apply(m);
-        EXPECT_TRUE(near(m, forms[i].want, forms[i].eps)) << "form " << i;
+        apply(m);
+        EXPECT_TRUE(near(m, want, eps));
     }
-    // cos 90 degrees is not 0 in double, and the rotation keeps that.
-    const double cos90 = std::cos(90 * 3.141592653589793 / 180);
     CZYRMatrix m;
     m.rotate(90);
+    const double cos90 = std::cos(90 * 3.141592653589793 / 180); // not 0 in double, and kept
     EXPECT_TRUE(m == CZYRMatrix(cos90, 1, -1, cos90, 0, 0));
 }
 
@@ -135,17 +127,23 @@ TEST(CZYRMatrixTest, Inversion) {
 
     // invert has no tolerance; invertible judges the determinant as a float.
     CZYRMatrix tiny(1e-20, 0, 0, 1e-20, 0, 0);
-    EXPECT_FALSE(tiny.invertible());
+    const bool refused = tiny.invertible();
     tiny.invert();
-    EXPECT_TRUE(near(tiny, CZYRMatrix(1e20, 0, 0, 1e20, 0, 0), 1e5));
-    // The determinant must exceed the least float, not reach it; negative and beyond float
-    // range are fine.
+    EXPECT_TRUE(!refused && near(tiny, CZYRMatrix(1e20, 0, 0, 1e20, 0, 0), 1e5));
+    // The determinant must exceed the least float, not reach it.
     const double fmin = std::numeric_limits<float>::min();
     EXPECT_FALSE(CZYRMatrix(1, 0, 0, fmin, 0, 0).invertible() ||
                  CZYRMatrix(kNaN, 0, 0, 1, 0, 0).invertible());
     EXPECT_TRUE(CZYRMatrix(1, 0, 0, 2 * fmin, 0, 0).invertible() &&
                 CZYRMatrix(0, 1e-3, 1, 0, 0, 0).invertible() &&
                 CZYRMatrix(1e200, 0, 0, 1e200, 0, 0).invertible());
+}
+
+::testing::AssertionResult is(const sZYRRect& g, double l, double b, double r, double t) {
+    if (g.left == l && g.bottom == b && g.right == r && g.top == t)
+        return ::testing::AssertionSuccess();
+    return ::testing::AssertionFailure() << "got left " << g.left << " bottom " << g.bottom
+                                         << " right " << g.right << " top " << g.top;
 }
 
 TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
@@ -155,39 +153,11 @@ TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
     ZYRMatrix_transformPoint(CZYRMatrix(1, 0, 1, 1, -16777216.0, 0), gx, gy);
     EXPECT_EQ(std::tuple(fx, fy, gx), std::tuple(0.5f, 1.0f, 1.0f));
 
-    // Against the extremes of the four transformed corners, for arbitrary (mirroring too)
-    // matrices.
-    std::mt19937_64 rng(11);
-    std::uniform_real_distribution<double> any(-100.0, 100.0);
-    for (int i = 0; i < 2000; ++i) {
-        const CZYRMatrix m(any(rng), any(rng), any(rng), any(rng), any(rng), any(rng));
-        const double x0 = any(rng), x1 = any(rng), y0 = any(rng), y1 = any(rng);
-        const sZYRRect box{std::min(x0, x1), std::min(y0, y1), std::max(y0, y1), std::max(x0, x1)};
-        double lo[2] = {INFINITY, INFINITY}, hi[2] = {-INFINITY, -INFINITY};
-        for (double cx : {x0, x1})
-            for (double cy : {y0, y1}) {
-                double p[2] = {cx, cy};
-                m.transformPoint(p[0], p[1]);
-                for (int k = 0; k < 2; ++k) {
-                    lo[k] = std::min(lo[k], p[k]);
-                    hi[k] = std::max(hi[k], p[k]);
-                }
-            }
-        const sZYRRect got = i % 2 ? ZYRMatrix_transformBBox(m, box) : m.transformBBox(box);
-        ASSERT_TRUE(std::fabs(got.left - lo[0]) + std::fabs(got.right - hi[0]) +
-                        std::fabs(got.bottom - lo[1]) + std::fabs(got.top - hi[1]) <
-                    1e-9)
-            << "case " << i;
-    }
-}
-
-// Expected values in the constructor's order: left, bottom, right, top.
-::testing::AssertionResult is(const CZYRRect& got, double l, double b, double r, double t) {
-    const sZYRRect& g = got;
-    if (g.left == l && g.bottom == b && g.right == r && g.top == t)
-        return ::testing::AssertionSuccess();
-    return ::testing::AssertionFailure() << "got left " << g.left << " bottom " << g.bottom
-                                         << " right " << g.right << " top " << g.top;
+    // A mirroring and rotating matrix: the box holds the extremes of the four corners.
+    const sZYRRect box{-1, 2, 3, 4}; // left, bottom, top, right
+    for (const sZYRRect& got : {CZYRMatrix(-2, 1, 3, -4, 1, 2).transformBBox(box),
+                                ZYRMatrix_transformBBox(CZYRMatrix(-2, 1, 3, -4, 1, 2), box)})
+        EXPECT_TRUE(is(got, -1, -11, 12, -2));
 }
 
 TEST(CZYRRectTest, InvertedDefaultGrowsToItsPoints) {
@@ -202,19 +172,16 @@ TEST(CZYRRectTest, InvertedDefaultGrowsToItsPoints) {
     r.updateBBoxPoint(2, 0);
     EXPECT_TRUE(is(r, -1, 0, 5, 10) && !r.isempty());
     EXPECT_TRUE(CZYRRect(0, 0, 1, 0).isempty() && CZYRRect(0, 0, 0, 1).isempty());
-    CZYRRect u;
+    CZYRRect u; // the default is neutral for union
     u.unionRect(CZYRRect(1, 2, 3, 4));
-    EXPECT_TRUE(u == CZYRRect(1, 2, 3, 4)) << "the default is neutral for union";
     u.unionRect(CZYRRect(-5, 3, 0, 9));
     EXPECT_TRUE(is(u, -5, 2, 3, 9));
-
     r.setRect(CZYRRect(3, 0, 1, 1));
     EXPECT_TRUE(is(r, 3, 0, 1, 1)) << "setRect does not check";
     EXPECT_NO_THROW(r.setBoundingBox(CZYRRect(0, 0, 0, 0)));
     expectBadParam([&] { r.setBoundingBox(CZYRRect(0, 5, 1, 4)); }, "Invalid bounding box set",
                    "source/zyr/std/CZYRRect");
     EXPECT_TRUE(is(r, 0, 5, 1, 4)) << "the refused values are kept";
-    EXPECT_THROW(r.setBoundingBox(CZYRRect(2, 0, 1, 1)), CZYRError);
 }
 
 TEST(CZYRRectTest, IntersectionAndTouch) {
@@ -277,23 +244,15 @@ TEST(CZYRSampledFuncTest, ResamplingRules) {
     expectBadParam(onePoint, "invalid index", "source/zyr/std/CZYRMemBuffer");
 }
 
-constexpr int32_t kMin = std::numeric_limits<int32_t>::min();
-constexpr int32_t kMax = std::numeric_limits<int32_t>::max();
-constexpr int32_t kOne = 0x00010000;
-constexpr int32_t kFrac = 0x40000000;
-
+constexpr int32_t kMin = std::numeric_limits<int32_t>::min(), kMax = -(kMin + 1);
+constexpr int32_t kOne = 0x00010000, kFrac = 0x40000000;
 using i128 = __int128;
-
-i128 floorDiv(i128 n, i128 d) {
-    const i128 q = n / d;
-    return (n % d != 0 && (n < 0) != (d < 0)) ? q - 1 : q;
-}
 
 // n / d to the nearest integer, halves away from zero.
 i128 nearest(i128 n, i128 d) {
     if (d < 0)
         n = -n, d = -d;
-    return n >= 0 ? floorDiv(2 * n + d, 2 * d) : -floorDiv(-2 * n + d, 2 * d);
+    return n >= 0 ? (2 * n + d) / (2 * d) : -((-2 * n + d) / (2 * d));
 }
 
 int32_t clamp32(i128 v) {
@@ -335,7 +294,6 @@ constexpr int32_t kSpecial[] = {
     -0x8000,    -0x8001,    0x7FFF0000, 0x3172c8f0, -0x3172c8f0, 0x2a92a8b3, 0x57046cea, 0x72bbc2b1,
     65535,      -65535,     65537,      641,        -641,        6700417};
 
-// Operands of every scale: full range, a random bit length, small values and the specials.
 int32_t operand(std::mt19937_64& rng) {
     const uint64_t r = rng();
     const auto high = static_cast<int32_t>(r >> 32);
@@ -344,7 +302,6 @@ int32_t operand(std::mt19937_64& rng) {
     return choices[r % 4];
 }
 
-// Every function on one pair or triple of operands against exact arithmetic.
 ::testing::AssertionResult exact(int32_t a, int32_t b, int32_t c, bool rounded) {
     const i128 p = i128{a} * b;
     if (FixedMul(a, b) != clamp32(nearest(p, 1 << 16)) ||
@@ -357,7 +314,6 @@ int32_t operand(std::mt19937_64& rng) {
 }
 
 TEST(ZYRFixedTest, EverySpecialCombinationIsExact) {
-    // A few known answers anchor the reference itself.
     EXPECT_EQ(
         std::vector({fracmul(0x3172c8f0, 0x2a92a8b3), fixratio(0x57046cea, 0x72bbc2b1),
                      FixedMul(0x00018000, 0x00018000), TFixedDiv(0x00010000, 0x00030000),
@@ -370,7 +326,7 @@ TEST(ZYRFixedTest, EverySpecialCombinationIsExact) {
                     ASSERT_TRUE(exact(a, b, c, rounded));
 }
 
-TEST(ZYRFixedTest, PFloatToFixedRoundsAndSaturates) {
+TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
     const float half = 0.5f / 65536, inf = std::numeric_limits<float>::infinity();
     EXPECT_EQ(std::pair(toFixed(1.5f), toFixed(std::nextafter(32768.0f, 0.0f))),
               std::pair(0x00018000, 0x7FFFFF80));
@@ -381,9 +337,6 @@ TEST(ZYRFixedTest, PFloatToFixedRoundsAndSaturates) {
           std::nextafter(half, 0.0f), -std::nextafter(half, 0.0f), 8388609.0f / 65536,
           -8388609.0f / 65536, inf, -inf, std::numeric_limits<float>::quiet_NaN()})
         EXPECT_EQ(toFixed(x), refPFloatToFixed(x)) << "PFloatToFixed(" << x << ")";
-}
-
-TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
     std::mt19937_64 rng(20240611);
     for (int i = 0; i < 1000000; ++i) {
         ASSERT_TRUE(exact(operand(rng), operand(rng), operand(rng), (i & 1) != 0));

@@ -1,5 +1,3 @@
-// Tests of the file system: the static calls, file names, and the native and host-procedure
-// file streams on real files in a fresh temporary directory.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -7,6 +5,7 @@
 #include <functional>
 #include <memory>
 #include <new>
+#include <numeric>
 #include <set>
 #include <string>
 #include <sys/stat.h>
@@ -50,7 +49,6 @@ void expectError(Body body, int type, const char* message, const char* source = 
     EXPECT_EQ(withoutLine(zyrtest::thrown(body)),
               withoutLine(zyrtest::describe(type, message, source, 0)));
 }
-// The common failure of the native file operations.
 template <class Body> void expectOpFailed(Body body, const char* message) {
     expectError(body, ZYRPublic::kZYRErrorFileOpFailed, message);
 }
@@ -71,8 +69,7 @@ public:
     IZYRFileName* clone() const override { return new PathlessName; }
 };
 
-// Installs the host kit's factory and a file system over a fresh directory; `host` routes
-// file streams through the host-procedure record.
+// A file system over a fresh directory; `host` routes file streams through the record.
 class FileSysFixture {
 public:
     explicit FileSysFixture(bool host) : host_(host), record_(ZYRHostKit::posixFileProcs()) {
@@ -102,17 +99,15 @@ public:
 };
 
 TEST(CZYRFileSysTest, NothingInstalled) {
-    const char* notInstalled =
-        "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method";
-    ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
     ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
-    expectError([] { CZYRFileSys::fileExists(CZYRFileName()); },
-                ZYRPublic::kZYRErrorFileSystemNotInitialized, notInstalled,
-                "source/zyr/std/CZYRFileSys");
-    ZYRStd::ZYRStdInit_SetDefaultFileSysProc([]() -> ZYRFileSys::IZYRFileSys* { return nullptr; });
-    expectError([] { CZYRFileSys::getTempDirName(); }, ZYRPublic::kZYRErrorFileSystemNotInitialized,
-                notInstalled, "source/zyr/std/CZYRFileSys");
-    ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
+    using Proc = ZYRFileSys::IZYRFileSys* (*)();
+    for (Proc proc : {Proc([]() -> ZYRFileSys::IZYRFileSys* { return nullptr; }), Proc()}) {
+        ZYRStd::ZYRStdInit_SetDefaultFileSysProc(proc);
+        expectError(
+            [] { CZYRFileSys::getTempDirName(); }, ZYRPublic::kZYRErrorFileSystemNotInitialized,
+            "A FileSys  not installed. Install one with ZYRFileSys_SetDefaultFileSys method",
+            "source/zyr/std/CZYRFileSys");
+    }
     expectError([] { CZYRFileName name("/tmp/x"); }, ZYRPublic::kZYRErrorFatal,
                 "ZYRFactory Proc not set in ZYRStd", "source/zyr/std/ZYRStdInit");
 }
@@ -123,19 +118,14 @@ TEST(CZYRFileSysTest, FileNameCountsAndForwards) {
     { CZYRFileName adopting(raw, false); }
     EXPECT_EQ(raw->peekRefCnt(), 1) << "adopting takes over a reference";
     {
-        CZYRFileName sharing(raw, true), copy(sharing), clone = copy.clone();
-        EXPECT_EQ(raw->peekRefCnt(), 3);
-        EXPECT_TRUE(copy.getWStringPath() == ZYRStd::CZYRWString(u"/a/b/c.txt") && !copy.isEmpty());
-        auto* cloned = static_cast<ZYRFileName::IZYRFileName*>(clone);
-        EXPECT_TRUE(cloned != raw && cloned->peekRefCnt() == 1) << "adopted, not doubled";
+        CZYRFileName sharing(raw, true), clone = sharing.clone();
+        EXPECT_TRUE(sharing.getWStringPath() == ZYRStd::CZYRWString(u"/a/b/c.txt") &&
+                    static_cast<ZYRFileName::IZYRFileName*>(clone)->peekRefCnt() == 1);
     }
-    EXPECT_EQ(raw->peekRefCnt(), 1);
     raw->release();
     EXPECT_TRUE(CZYRFileName(new PathlessName, false).getWStringPath().empty());
-    CZYRFileName none;
-    EXPECT_TRUE(none.isEmpty());
-    expectError([&] { none.getWStringPath(); }, ZYRPublic::kZYRErrorInvalidObject, "Null object",
-                "source/zyr/std/CZYRFileSys");
+    expectError([&] { CZYRFileName().getWStringPath(); }, ZYRPublic::kZYRErrorInvalidObject,
+                "Null object", "source/zyr/std/CZYRFileSys");
 }
 
 TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
@@ -152,14 +142,14 @@ TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
     };
     for (int twice = 0; twice < 2; ++twice) { // existing directories are fine
         const auto fs = create(longest, cache);
-        EXPECT_TRUE(exists(longest) && exists(cache));
         EXPECT_EQ(utf8(fs->getTempDirName()) + "|" + utf8(fs->getDLCacheDirName()),
                   longest + "|" + cache);
     }
-    expectError([&] { create(tooLong, ""); }, ZYRPublic::kZYRErrorLimitCheck,
-                "temp dir filename too long");
-    expectError([&] { create("", tooLong); }, ZYRPublic::kZYRErrorLimitCheck,
-                "DL Cache dir filename too long");
+    EXPECT_TRUE(exists(longest) && exists(cache));
+    for (const auto& [temp, dl, message] :
+         {std::tuple{tooLong, std::string(), "temp dir filename too long"},
+          {std::string(), tooLong, "DL Cache dir filename too long"}})
+        expectError([&] { create(temp, dl); }, ZYRPublic::kZYRErrorLimitCheck, message);
     expectOpFailed([&] { create(dir.file("missing/child"), ""); }, "Directory create failed");
 }
 
@@ -170,57 +160,37 @@ protected:
 };
 
 TEST_P(FileStreamTest, OpenModesAndTransfers) {
-    const std::string path = fx_.dir_.file("data.bin");
+    const std::string path = fx_.dir_.file("data.bin"), temporary = fx_.dir_.file("gone.tmp");
     writeFile(path, "0123456789");
+    char buf[8] = {};
     {
         auto s = fx_.open(path, kZYRStreamRead | kZYRStreamWrite);
-        ASSERT_TRUE(s && s->isOpen());
-        EXPECT_EQ(s->getSize(), 10u) << "read-write keeps the content";
-        EXPECT_EQ(utf8(s->getFilePath()), path);
-        char buf[4] = {};
-        EXPECT_EQ(s->read(buf, 2, 2), 4u);
-        EXPECT_EQ(std::string(buf, 4) + std::to_string(s->getPos()), "01234");
-        EXPECT_EQ(s->write("AB", 1, 2), 2u);
-        EXPECT_EQ(s->setPos(8), 8u);
+        EXPECT_TRUE(s->getSize() == 10 && utf8(s->getFilePath()) == path) << "content kept";
+        EXPECT_EQ(s->read(buf, 2, 2) + s->write("AB", 1, 2) + s->setPos(8), 4u + 2 + 8);
         EXPECT_EQ(s->read(buf, 1, 4), 2u) << "a short read is the end of the file";
         s->setEOF();
-        EXPECT_EQ(s->getPos(), 10u);
+        EXPECT_EQ(std::string(buf, 4) + std::to_string(s->getPos()), "892310");
         s->setPos(3);
         EXPECT_TRUE(s->truncate() && s->getSize() == 3);
-        s->close();
-        EXPECT_FALSE(s->isOpen());
     }
-    EXPECT_EQ(readFile(path), "012");
-    {
-        auto s = fx_.open(path, kZYRStreamAppend);
-        EXPECT_EQ(s->write("xy", 1, 2), 2u);
-        char c;
-        EXPECT_THROW(s->read(&c, 1, 1), CZYRError);
-    }
+    fx_.open(path, kZYRStreamAppend)->write("xy", 1, 2);
     EXPECT_EQ(readFile(path), "012xy") << "append writes at the end";
+    EXPECT_THROW(fx_.open(path, kZYRStreamAppend)->read(buf, 1, 1), CZYRError);
     {
         auto s = fx_.open(path, kZYRStreamWrite | kZYRStreamTruncate);
         EXPECT_EQ(s->getSize(), 0u);
         s->write("new", 1, 3);
         s->reOpen(kZYRStreamRead);
-        char buf[8] = {};
-        EXPECT_EQ(s->read(buf, 1, 8), 3u);
-        EXPECT_EQ(std::string(buf, 3), "new");
-        EXPECT_EQ(s->getAccessMode(), kZYRStreamRead);
+        EXPECT_TRUE(s->read(buf, 1, 8) == 3 && s->getAccessMode() == kZYRStreamRead);
     }
     if (!GetParam()) { // what write-only means to a host file is the host's choice
         fx_.open(path, kZYRStreamWrite)->write("n", 1, 1);
         EXPECT_EQ(readFile(path), "n");
     }
-    const std::string temporary = fx_.dir_.file("gone.tmp");
-    {
-        auto s = fx_.open(temporary, kZYRStreamRead | kZYRStreamWrite | kZYRStreamDeleteOnClose);
-        s->write("x", 1, 1);
-        EXPECT_TRUE(exists(temporary));
-    }
-    EXPECT_FALSE(exists(temporary)) << "deleted when its last handle closed";
+    fx_.open(temporary, kZYRStreamRead | kZYRStreamWrite | kZYRStreamDeleteOnClose)
+        ->write("x", 1, 1);
     fx_.open(path, kZYRStreamRead)->removeFile();
-    EXPECT_FALSE(exists(path));
+    EXPECT_FALSE(exists(temporary) || exists(path)) << "deleted on close, and removed";
 }
 
 TEST_P(FileStreamTest, FilesThatDoNotOpen) {
@@ -244,26 +214,18 @@ TEST_P(FileStreamTest, TemporaryFiles) {
     const std::string dir = fx_.dir_.path();
     auto s = CZYRFileSys::createTmpFileStream(CZYRFileName(dir.c_str()), u"zyrtemp",
                                               kZYRStreamRead | kZYRStreamWrite);
-    ASSERT_TRUE(s && s->isOpen());
-    const std::string path = utf8(s->getFilePath());
-    EXPECT_EQ(path.find(dir + "/zyr"), 0u) << path;
-    EXPECT_EQ(s->getSize(), 0u);
+    auto other = CZYRFileSys::createTmpFileStream(CZYRFileName((dir + "/").c_str()), nullptr,
+                                                  kZYRStreamWrite | kZYRStreamDeleteOnClose);
+    const std::string path = utf8(s->getFilePath()), otherPath = utf8(other->getFilePath());
     s->write("tmp", 1, 3);
     s->close();
-    EXPECT_EQ(readFile(path), "tmp");
-    auto other = CZYRFileSys::createTmpFileStream(CZYRFileName(dir.c_str()), u"zyr",
-                                                  kZYRStreamWrite | kZYRStreamDeleteOnClose);
-    const std::string otherPath = utf8(other->getFilePath());
-    EXPECT_NE(otherPath, path) << "each temporary file is new";
     other->close();
-    EXPECT_FALSE(exists(otherPath));
+    EXPECT_TRUE(path.starts_with(dir + "/zyr") && readFile(path) == "tmp" && !exists(otherPath));
     if (!GetParam()) {
-        // Natively: at most three characters of the prefix, six random ones and ".TMP".
-        EXPECT_EQ(path.size() - dir.size(), 1u + 3 + 6 + 4) << path;
-        EXPECT_EQ(path.substr(path.size() - 4), ".TMP");
-        const auto bare = CZYRFileSys::createTmpFileStream(CZYRFileName((dir + "/").c_str()),
-                                                           nullptr, kZYRStreamWrite);
-        EXPECT_EQ(utf8(bare->getFilePath()).size() - dir.size(), 1u + 6 + 4) << "one separator";
+        // Natively: at most three characters of the prefix, six random ones and ".TMP"; with
+        // no prefix, one separator.
+        EXPECT_EQ(path.substr(dir.size()), "/zyr" + path.substr(dir.size() + 4, 6) + ".TMP");
+        EXPECT_EQ(otherPath.size() - dir.size(), 1u + 6 + 4);
         const CZYRFileName nowhere(fx_.dir_.file("no/such/dir").c_str());
         expectOpFailed([&] { CZYRFileSys::createTmpFileStream(nowhere, u"x", kZYRStreamWrite); },
                        "File rename failed");
@@ -275,23 +237,28 @@ INSTANTIATE_TEST_SUITE_P(NativeAndHost, FileStreamTest, ::testing::Values(false,
                              return info.param ? "Host" : "Native";
                          });
 
+// Host procedures that fail.
+constexpr auto failOne = [](void*) { return -1; };
+constexpr auto failGet = [](void*, unsigned long long*) { return -1; };
+constexpr auto failSet = [](void*, uint32_t, uint32_t) { return -1; };
+constexpr auto failOpen = [](void*, unsigned short, void**) { return -1; };
+constexpr auto failWrite = [](const void*, size_t, size_t, void*, int* e) -> size_t {
+    return *e = EIO, 0;
+};
+const auto failClose = [](void* handle) { return ZYRHostKit::posixFileProcs().close(handle), -1; };
+
 TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
     FileSysFixture fx(true);
     const std::string path = fx.dir_.file("host.txt");
     writeFile(path, "host");
-
     fx.record_.open64 = nullptr;
     auto unopened = fx.open(path, kZYRStreamRead);
-    ASSERT_TRUE(unopened);
-    EXPECT_FALSE(unopened->isOpen());
-    EXPECT_EQ(utf8(unopened->getFilePath()), path) << "the text comes from the host";
+    EXPECT_TRUE(!unopened->isOpen() && utf8(unopened->getFilePath()) == path) << "from the host";
     expectError([&] { unopened->reOpen(kZYRStreamRead); }, ZYRPublic::kZYRErrorInvalidFuncCall,
                 "open64 proc not defined", kHostSource);
     fx.record_ = ZYRHostKit::posixFileProcs();
     fx.record_.diPathToPath = nullptr;
     auto fileless = fx.open(path, kZYRStreamRead);
-    ASSERT_TRUE(fileless);
-    EXPECT_FALSE(fileless->isOpen());
     char c;
     expectOpFailed([&] { fileless->read(&c, 1, 1); }, "file stm not open");
     fx.record_ = ZYRHostKit::posixFileProcs();
@@ -302,75 +269,53 @@ TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
     fx.record_.tempFile = nullptr;
     expectError([&] { CZYRFileSys::createTmpFileStream(CZYRFileName(path.c_str()), u"t", 0); },
                 ZYRPublic::kZYRErrorInvalidFuncCall, "tempFile proc not defined");
-    // A path the host cannot turn into a DI path gives no stream.
     fx.record_ = ZYRHostKit::posixFileProcs();
-    EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true));
+    EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true))
+        << "no DI path";
 
-    // Each procedure missing, or failing, as the stream uses it.
-    using Record = ZYRPublic::_t_ZYRPDLFileSysRec;
-    using Stream = CZYRSmartZYRRefPtr<IZYRFStream>;
-    const ZYRPublic::eZYRErrorType undefined = ZYRPublic::kZYRErrorInvalidFuncCall,
-                                   fails = ZYRPublic::kZYRErrorFileOpFailed;
-    const struct {
-        void (*change)(Record&);
-        void (*use)(Stream&);
-        ZYRPublic::eZYRErrorType type;
-        const char* message;
-    } procedures[] = {
-        {[](Record& r) { r.flush = nullptr; }, [](Stream& s) { s->flush(); }, undefined,
-         "flush proc not defined"},
-        {[](Record& r) { r.flush = [](void*) { return -1; }; }, [](Stream& s) { s->flush(); },
-         fails, "error flushing file"},
-        {[](Record& r) { r.getpos64 = nullptr; }, [](Stream& s) { s->getPos(); }, undefined,
+    using R = ZYRPublic::_t_ZYRPDLFileSysRec&;
+    using S = CZYRSmartZYRRefPtr<IZYRFStream>&;
+    const auto undefined = ZYRPublic::kZYRErrorInvalidFuncCall;
+    const auto fails = ZYRPublic::kZYRErrorFileOpFailed;
+    using Row = std::tuple<void (*)(R, S), ZYRPublic::eZYRErrorType, const char*>;
+    const Row procedures[] = {
+        {[](R r, S s) { r.flush = nullptr, s->flush(); }, undefined, "flush proc not defined"},
+        {[](R r, S s) { r.flush = failOne, s->flush(); }, fails, "error flushing file"},
+        {[](R r, S s) { r.getpos64 = nullptr, s->getPos(); }, undefined,
          "getpos64 proc not defined"},
-        {[](Record& r) { r.getpos64 = [](void*, unsigned long long*) { return -1; }; },
-         [](Stream& s) { s->getPos(); }, fails, "Error getpos file"},
-        {[](Record& r) { r.setpos64 = nullptr; }, [](Stream& s) { s->setPos(1); }, undefined,
+        {[](R r, S s) { r.getpos64 = failGet, s->getPos(); }, fails, "Error getpos file"},
+        {[](R r, S s) { r.setpos64 = nullptr, s->setPos(1); }, undefined,
          "setpos64 proc not defined"},
-        {[](Record& r) { r.setpos64 = [](void*, uint32_t, uint32_t) { return -1; }; },
-         [](Stream& s) { s->setPos(1); }, fails, "Error setpos file"},
-        {[](Record& r) { r.setpos64 = nullptr; }, [](Stream& s) { s->setEOF(); }, undefined,
+        {[](R r, S s) { r.setpos64 = failSet, s->setPos(1); }, fails, "Error setpos file"},
+        {[](R r, S s) { r.setpos64 = nullptr, s->setEOF(); }, undefined,
          "geteof64 or setpos64 proc not defined"},
-        {[](Record& r) { r.setpos64 = [](void*, uint32_t, uint32_t) { return -1; }; },
-         [](Stream& s) { s->setEOF(); }, fails, "Error seteof file"},
-        {[](Record& r) { r.geteof64 = nullptr; }, [](Stream& s) { s->getSize(); }, undefined,
+        {[](R r, S s) { r.setpos64 = failSet, s->setEOF(); }, fails, "Error seteof file"},
+        {[](R r, S s) { r.geteof64 = nullptr, s->getSize(); }, undefined,
          "geteof proc not defined"},
-        {[](Record& r) { r.geteof64 = [](void*, unsigned long long*) { return -1; }; },
-         [](Stream& s) { s->getSize(); }, fails, "Error getting size of file"},
-        {[](Record& r) { r.seteof = nullptr; }, [](Stream& s) { s->truncate(); }, undefined,
+        {[](R r, S s) { r.geteof64 = failGet, s->getSize(); }, fails, "Error getting size of file"},
+        {[](R r, S s) { r.seteof = nullptr, s->truncate(); }, undefined,
          "getpos64 or seteof proc not defined"},
-        {[](Record& r) { r.read = nullptr; }, [](Stream& s) { s->read(nullptr, 1, 1); }, undefined,
+        {[](R r, S s) { r.read = nullptr, s->read(nullptr, 1, 1); }, undefined,
          "read proc not defined"},
-        {[](Record& r) { r.write = nullptr; }, [](Stream& s) { s->write("x", 1, 1); }, undefined,
+        {[](R r, S s) { r.write = nullptr, s->write("x", 1, 1); }, undefined,
          "write proc not defined"},
-        {[](Record& r) {
-             r.write = [](const void*, size_t, size_t, void*, int* error) -> size_t {
-                 *error = EIO;
-                 return 0;
-             };
-         },
-         [](Stream& s) { s->write("x", 1, 1); }, fails, "Error writing file"},
-        {[](Record& r) { r.remove = nullptr; }, [](Stream& s) { s->removeFile(); }, undefined,
+        {[](R r, S s) { r.write = failWrite, s->write("x", 1, 1); }, fails, "Error writing file"},
+        {[](R r, S s) { r.remove = nullptr, s->removeFile(); }, undefined,
          "remove proc not defined"},
-        {[](Record& r) { r.remove = [](void*) { return -1; }; }, [](Stream& s) { s->removeFile(); },
-         undefined, "Error removing file"},
-        {[](Record& r) { r.close = nullptr; }, [](Stream& s) { s->close(); }, undefined,
+        {[](R r, S s) { r.remove = failOne, s->removeFile(); }, undefined, "Error removing file"},
+        {[](R r, S s) { r.close = nullptr, s->close(); }, undefined,
          "close or remove proc not defined"},
-        {[](Record& r) {
-             r.close = [](void* handle) { return ZYRHostKit::posixFileProcs().close(handle), -1; };
-         },
-         [](Stream& s) { s->close(); }, fails, "Error closing file"},
-        {[](Record& r) { r.open64 = [](void*, unsigned short, void**) { return -1; }; },
-         [](Stream& s) { s->reOpen(kZYRStreamRead); }, fails, "Error opening file"},
+        {[](R r, S s) { r.close = failClose, s->close(); }, fails, "Error closing file"},
+        {[](R r, S s) { r.open64 = failOpen, s->reOpen(kZYRStreamRead); }, fails,
+         "Error opening file"},
     };
-    for (const auto& row : procedures) {
-        Stream s = fx.open(path, kZYRStreamRead | kZYRStreamWrite);
+    for (const auto& [use, type, message] : procedures) {
+        auto s = fx.open(path, kZYRStreamRead | kZYRStreamWrite);
         ASSERT_TRUE(s->isOpen());
-        row.change(fx.record_);
-        expectError([&] { row.use(s); }, row.type, row.message, kHostSource);
+        expectError([&] { use(fx.record_, s); }, type, message, kHostSource);
         fx.record_ = ZYRHostKit::posixFileProcs();
     }
-    fx.record_.seteof = [](void*, uint32_t, uint32_t) { return -1; };
+    fx.record_.seteof = failSet;
     EXPECT_FALSE(fx.open(path, kZYRStreamRead | kZYRStreamWrite)->truncate());
     fx.record_ = ZYRHostKit::posixFileProcs();
 }
@@ -386,14 +331,11 @@ protected:
 TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
     const std::string a = fx_.dir_.file("a.txt"), b = fx_.dir_.file("b.txt");
     writeFile(a, "alpha");
-    EXPECT_TRUE(CZYRFileSys::fileExists(name("a.txt")));
-    EXPECT_FALSE(CZYRFileSys::fileExists(name("b.txt")) ||
-                 CZYRFileSys::fileExists(CZYRFileName("")));
+    EXPECT_TRUE(CZYRFileSys::fileExists(name("a.txt")) && !CZYRFileSys::fileExists(name("b.txt")) &&
+                !CZYRFileSys::fileExists(CZYRFileName("")));
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), true);
-    EXPECT_EQ(readFile(b), "alpha");
-    writeFile(a, "beta");
+    writeFile(a, readFile(b) + "beta");
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), false);
-    EXPECT_EQ(readFile(b), "beta");
     CZYRFileSys::copy(CZYRFileName(""), name("c.txt"), false); // an empty path does nothing
     // Refused: an existing target when asked, a file onto itself, a missing source, an
     // existing or missing rename, a missing file to delete.
@@ -410,16 +352,16 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
     };
     for (const auto& [call, message] : refusals)
         expectOpFailed(call, message);
-    EXPECT_EQ(readFile(a) + readFile(b), "betabeta") << "nothing emptied or replaced";
+    EXPECT_EQ(readFile(a) + readFile(b), "alphabetaalphabeta") << "nothing emptied or replaced";
     EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::rename(name("a.txt"), name("c.txt"));
-    EXPECT_EQ(std::to_string(exists(a)) + readFile(fx_.dir_.file("c.txt")), "0beta");
+    EXPECT_EQ(std::to_string(exists(a)) + readFile(fx_.dir_.file("c.txt")), "0alphabeta");
     CZYRFileSys::remove(name("c.txt"), false);
-    EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
     CZYRFileSys::remove(name("c.txt"), true);
-    EXPECT_TRUE(CZYRFileSys::isSameFile(name("x"), name("x")));
-    EXPECT_FALSE(
-        CZYRFileSys::isSameFile(name("x"), CZYRFileName((fx_.dir_.path() + "/./x").c_str())))
+    EXPECT_FALSE(exists(fx_.dir_.file("c.txt")));
+    EXPECT_TRUE(
+        CZYRFileSys::isSameFile(name("x"), name("x")) &&
+        !CZYRFileSys::isSameFile(name("x"), CZYRFileName((fx_.dir_.path() + "/./x").c_str())))
         << "texts only, no normalisation";
     for (int twice = 0; twice < 2; ++twice) // the second time it exists: nothing to do
         CZYRFileSys::makeDirectory(name("sub"));
@@ -427,7 +369,6 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
     EXPECT_TRUE(::stat(fx_.dir_.file("sub").c_str(), &st) == 0 && S_ISDIR(st.st_mode));
 }
 
-// Collects what an enumeration reports.
 class Collector : public ZYRFileSys::IDirEnumCBProc {
 public:
     explicit Collector(size_t stopAfter = ~size_t{0}) : stopAfter_(stopAfter) {}
@@ -474,31 +415,24 @@ TEST_F(FileOperationsTest, EnumDirectory) {
 
 TEST_F(FileOperationsTest, MappedStreams) {
     const std::string path = fx_.dir_.file("mapped.bin");
-    std::string content(10000, '\0');
-    for (size_t i = 0; i < content.size(); ++i)
-        content[i] = static_cast<char>('a' + i % 26);
+    std::string content(10000, 'a');
+    std::iota(content.begin(), content.end(), 'a');
     writeFile(path, content);
     unsigned long long offset = 1;
     unsigned int length = 1;
     char c;
     {
         ZYRStd::CZYRMemMapFStream whole(name("mapped.bin"), kZYRStreamRead, 0, 0);
-        ASSERT_TRUE(whole.isMapped() && whole.isOpen());
-        EXPECT_EQ(std::pair(whole.getSize(), whole.getCapacity()), std::pair(10000ull, 10000ull));
         std::string back(content.size(), '\0');
         EXPECT_EQ(whole.read(back.data(), 1, 20000), content.size());
-        EXPECT_EQ(back, content);
+        EXPECT_TRUE(whole.isMapped() && whole.getCapacity() == 10000 && back == content);
         expectError([&] { whole.write("x", 1, 1); }, ZYRPublic::kZYRErrorInvalidFuncCall,
                     "stream is not writable", "source/zyr/std/IImpZYRMemStream");
         whole.close();
-        EXPECT_FALSE(whole.isMapped());
         expectOpFailed([&] { whole.read(&c, 1, 1); }, "file stm not mapped");
-        EXPECT_EQ(std::tuple(whole.getSize(), whole.getCapacity(),
-                             whole.getMapAttributes(offset, length), offset, length),
-                  std::tuple(0u, 0u, nullptr, 0u, 0u));
+        EXPECT_TRUE(whole.getSize() == 0 && !whole.getMapAttributes(offset, length) && length == 0);
         whole.reOpen(kZYRStreamRead);
-        ASSERT_TRUE(whole.isMapped()) << "a closed stream maps again on reOpen";
-        EXPECT_TRUE(whole.read(&c, 1, 1) == 1 && c == 'a');
+        EXPECT_TRUE(whole.read(&c, 1, 1) == 1 && c == 'a') << "mapped again on reOpen";
     }
     {
         // Not on a page boundary: the stream starts at the requested byte anyway.
@@ -508,11 +442,9 @@ TEST_F(FileOperationsTest, MappedStreams) {
         EXPECT_EQ(std::string(base, 100), content.substr(4099, 100));
         ASSERT_EQ(::truncate(path.c_str(), 4099 + 10), 0);
         EXPECT_EQ(window.getSize(), 10u) << "only what is left of a file that shrank";
-        ASSERT_EQ(::truncate(path.c_str(), 4000), 0);
-        EXPECT_EQ(window.getSize(), 0u);
     }
     expectOpFailed(
-        [&] { ZYRStd::CZYRMemMapFStream past(name("mapped.bin"), kZYRStreamRead, 3990, 100); },
+        [&] { ZYRStd::CZYRMemMapFStream past(name("mapped.bin"), kZYRStreamRead, 4050, 100); },
         "error mapping view of file");
     {
         // A writable view past the end grows the file; the bytes reach it.
@@ -561,8 +493,7 @@ TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
     }
 }
 
-// The host kit's procedures, noting which DI paths and path texts the host has handed out
-// and not yet been given back.
+// The DI paths and path texts that the host handed out and did not get back yet.
 ZYRPublic::_t_ZYRPDLFileSysRec real{};
 std::set<void*> outstanding;
 template <class T> T* noted(T* p) {

@@ -76,7 +76,6 @@ struct Item : CZYRRegisterItemBase {
     explicit Item(int id) : CZYRRegisterItemBase(id) {}
     ~Item() override { ++destroyed; }
 };
-// An item for the registry, which deletes what it owns with the default procedure.
 Item* owned(int id) {
     return std::make_unique<Item>(id).release();
 }
@@ -91,20 +90,16 @@ TEST(ZYRDictEnumProcsTest, InterfaceRegistryOwnsWhatItIsGiven) {
         Item* second = owned(5);
         for (int twice = 0; twice < 2; ++twice) // the same item again stays alive
             registry.registerInterface(second, ZYRRegisterInterfaceDefaultDeleteProc, true);
-        EXPECT_EQ(destroyed, 1) << "the replaced item is deleted";
-        EXPECT_TRUE(registry.getNumInterfaces() == 1 && registry.queryInterface(5) == second);
+        EXPECT_TRUE(destroyed == 1 && registry.getNumInterfaces() == 1 &&
+                    registry.queryInterface(5) == second)
+            << "the replaced item is deleted";
         EXPECT_THROW(registry.registerInterface(nullptr, nullptr, false), CZYRError);
         // Copies share the table; clones own nothing.
         CZYRInterfaceRegistry copy = registry;
         copy.registerInterface(owned(2), ZYRRegisterInterfaceDefaultDeleteProc, false);
-        EXPECT_TRUE(registry.hasInterface(2) && registry.isShared());
+        EXPECT_TRUE(registry.getNumInterfaces() == 2 && registry.isShared());
         EXPECT_THROW(registry.registerInterface(second, nullptr, false), CZYRError);
-        EXPECT_EQ(registry.getNumInterfaces(), 2);
-        {
-            CZYRInterfaceRegistry clone = registry.clone();
-            EXPECT_EQ(clone.queryInterface(5), second);
-            clone.deleteInterface(5);
-        }
+        registry.clone().deleteInterface(5);
         EXPECT_TRUE(destroyed == 1 && registry.hasInterface(5)) << "a clone owns nothing";
         registry.deleteInterface(5);
         registry.deleteInterface(5);
@@ -126,8 +121,7 @@ TEST(ZYRDictEnumProcsTest, CyclesAreMarkedAndDepthIsBounded) {
                                            "\t[0]  [ZYRUINT]: 5\n"
                                            "\t[1] <cycle>\n");
     ring.remove(1);
-    // The depth runs out inside nested arrays and stays out: the bottom dictionary is not
-    // printed.
+    // The depth runs out inside nested arrays and stays out.
     inner.set(0, one("k", 1u));
     outer.set(0, inner);
     EXPECT_EQ(print(one("a", outer), 2), "a  [ZYRArray]: \n"
