@@ -160,7 +160,7 @@ TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
         EXPECT_TRUE(is(got, -1, -11, 12, -2));
 }
 
-TEST(CZYRRectTest, InvertedDefaultGrowsToItsPoints) {
+TEST(CZYRRectTest, InvertedDefaultUnionIntersectionAndTouch) {
     const sZYRRect rec = CZYRRect(1, 2, 3, 4); // left, bottom, right, top
     EXPECT_EQ(std::pair(rec.top, rec.right), std::pair(4.0, 3.0)) << "top before right";
     const double huge = std::numeric_limits<double>::max();
@@ -182,10 +182,7 @@ TEST(CZYRRectTest, InvertedDefaultGrowsToItsPoints) {
     expectBadParam([&] { r.setBoundingBox(CZYRRect(0, 5, 1, 4)); }, "Invalid bounding box set",
                    "source/zyr/std/CZYRRect");
     EXPECT_TRUE(is(r, 0, 5, 1, 4)) << "the refused values are kept";
-}
-
-TEST(CZYRRectTest, IntersectionAndTouch) {
-    CZYRRect r(0, 0, 10, 10);
+    r.setRect(CZYRRect(0, 0, 10, 10));
     r.intersectRect(CZYRRect(5, -5, 15, 8));
     EXPECT_TRUE(is(r, 5, 0, 10, 8));
     // Closed rectangles: a shared edge or corner, or containment, touches.
@@ -313,20 +310,7 @@ int32_t operand(std::mt19937_64& rng) {
     return ::testing::AssertionSuccess();
 }
 
-TEST(ZYRFixedTest, EverySpecialCombinationIsExact) {
-    EXPECT_EQ(
-        std::vector({fracmul(0x3172c8f0, 0x2a92a8b3), fixratio(0x57046cea, 0x72bbc2b1),
-                     FixedMul(0x00018000, 0x00018000), TFixedDiv(0x00010000, 0x00030000),
-                     FixedMulDiv(-65535, 65537, 2, false), FixedMulDiv(-65535, 65537, 2, true)}),
-        std::vector({551855119, 814358052, 0x00024000, 0x5555, kMin + 1, kMin}));
-    for (const int32_t a : kSpecial)
-        for (const int32_t b : kSpecial)
-            for (const int32_t c : kSpecial)
-                for (const bool rounded : {false, true})
-                    ASSERT_TRUE(exact(a, b, c, rounded));
-}
-
-TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
+TEST(ZYRFixedTest, SpecialsAndARandomSweepAgainstExactArithmetic) {
     const float half = 0.5f / 65536, inf = std::numeric_limits<float>::infinity();
     EXPECT_EQ(std::pair(toFixed(1.5f), toFixed(std::nextafter(32768.0f, 0.0f))),
               std::pair(0x00018000, 0x7FFFFF80));
@@ -347,6 +331,16 @@ TEST(ZYRFixedTest, RandomSweepAgainstExactArithmetic) {
                                              -16 - static_cast<int>(r % 40));
         ASSERT_EQ(toFixed(x), refPFloatToFixed(x)) << "PFloatToFixed(" << x << ")";
     }
+    EXPECT_EQ(
+        std::vector({fracmul(0x3172c8f0, 0x2a92a8b3), fixratio(0x57046cea, 0x72bbc2b1),
+                     FixedMul(0x00018000, 0x00018000), TFixedDiv(0x00010000, 0x00030000),
+                     FixedMulDiv(-65535, 65537, 2, false), FixedMulDiv(-65535, 65537, 2, true)}),
+        std::vector({551855119, 814358052, 0x00024000, 0x5555, kMin + 1, kMin}));
+    for (const int32_t a : kSpecial)
+        for (const int32_t b : kSpecial)
+            for (const int32_t c : kSpecial)
+                for (const bool rounded : {false, true})
+                    ASSERT_TRUE(exact(a, b, c, rounded));
 }
 
 } // namespace

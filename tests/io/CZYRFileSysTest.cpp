@@ -389,24 +389,21 @@ TEST_F(FileOperationsTest, EnumDirectory) {
     for (const char* leaf : {"/plain", "/.hidden", "/...", "/locked"}) // "..." is ordinary here
         writeFile(root + leaf, "x");
     ::chmod((root + "/locked").c_str(), 0444);
-    Collector plain, slashed, first(1), none, ignored;
-    EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(root.c_str()), plain));
-    EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName((root + "/").c_str()), slashed));
-    std::sort(plain.entries.begin(), plain.entries.end());
-    std::sort(slashed.entries.begin(), slashed.entries.end());
-    EXPECT_EQ(plain.entries, slashed.entries) << "a trailing separator changes nothing";
-    const std::vector<std::pair<std::string, unsigned int>> expected{
-        {root + "/...", ZYRFileSys::kZYRFileAttrHidden},
-        {root + "/.hidden", ZYRFileSys::kZYRFileAttrHidden},
-        {root + "/inner", ZYRFileSys::kZYRFileAttrDirectory},
-        {root + "/locked", ZYRFileSys::kZYRFileAttrReadOnly},
-        {root + "/plain", 0},
-    };
-    EXPECT_EQ(plain.entries, expected);
+    Collector first(1), none, ignored;
+    for (const std::string& dir : {root, root + "/"}) { // a trailing separator changes nothing
+        Collector all;
+        EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(dir.c_str()), all));
+        std::sort(all.entries.begin(), all.entries.end());
+        EXPECT_EQ(all.entries, (std::vector<std::pair<std::string, unsigned int>>{
+                                   {root + "/...", ZYRFileSys::kZYRFileAttrHidden},
+                                   {root + "/.hidden", ZYRFileSys::kZYRFileAttrHidden},
+                                   {root + "/inner", ZYRFileSys::kZYRFileAttrDirectory},
+                                   {root + "/locked", ZYRFileSys::kZYRFileAttrReadOnly},
+                                   {root + "/plain", 0}}));
+    }
     EXPECT_FALSE(CZYRFileSys::enumDirectory(CZYRFileName(root.c_str()), first));
-    EXPECT_EQ(first.entries.size(), 1u) << "false stops the enumeration";
     EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(empty.c_str()), none));
-    EXPECT_TRUE(none.entries.empty());
+    EXPECT_EQ(first.entries.size() + none.entries.size(), 1u) << "false stops the enumeration";
     expectOpFailed([&] { CZYRFileSys::enumDirectory(name("missing"), ignored); },
                    "Directory enum failed");
     expectOpFailed([&] { CZYRFileSys::enumDirectory(CZYRFileName(""), ignored); },

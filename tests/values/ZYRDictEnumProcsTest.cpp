@@ -29,7 +29,7 @@ CZYRDict one(const char* key, const auto& value) {
 }
 } // namespace
 
-TEST(ZYRDictEnumProcsTest, EntriesPrintExactlyDownToTheirDepth) {
+TEST(ZYRDictEnumProcsTest, EntriesPrintExactlyAndCopyThroughTracing) {
     const CZYRDict n = one("n", 7u), inner = one("flag", true),
                    name = one("name", CZYRUniString("job"));
     EXPECT_EQ(print(n, 1), "") << "depth 1 prints nothing";
@@ -58,9 +58,6 @@ TEST(ZYRDictEnumProcsTest, EntriesPrintExactlyDownToTheirDepth) {
                                            "\t[4] [ZYRDict]\n"
                                            "\t\tflag  [ZYRBool]: 1\n"
                                            "\t[5] <ff>\n");
-}
-
-TEST(ZYRDictEnumProcsTest, TracingCopiesEveryEntry) {
     CZYRDict source, target, nested, shared;
     source.set(CZYRUniString("a"), 1u);
     source.set(CZYRUniString("d"), nested);
