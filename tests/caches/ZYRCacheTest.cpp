@@ -341,7 +341,7 @@ TEST(ZYRCacheTest, RandomRunMatchesAModel) {
 
 // Beyond 250 entries in one chain that nobody lets go even a forced request fails.
 
-TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
+TEST(ZYRCacheTest, ExhaustedPoolAndEveryAllocationFailing) {
     zyrtest::FailingHost host;
     tZYRMemMgr record = host.record();
     zyrtest::installFront(0, &record);
@@ -367,6 +367,18 @@ TEST(ZYRCacheTest, ExhaustedPoolFallsBackToSweepsAndLastEntries) {
         host.failAll = false;
     }
     zyrtest::installFront(0);
+    failEachAllocation([] { // a cache's life: fill past capacity, look up, remove, tear down
+        TestCache cache(50, 5, 3, 8);
+        for (uint64_t k = 0; k < 200; ++k) {
+            cache.add(k * 7);
+            cache.find(k * 7 / 2);
+            uint64_t key = k * 3;
+            (void)(k % 5 == 0 && cache.hcRemoveEntry(&key, nullptr));
+            if (!cache.checkInvariants())
+                throw std::logic_error("invariants broken");
+        }
+        (void)cache.hcFreeCacheControl();
+    });
 }
 
 TEST(ZYRCacheTest, FreeControlUpdatesAndBrokenTables) {
@@ -430,21 +442,6 @@ TEST(ZYRCacheTest, LongChainsRefusalsAndRelocation) {
         ASSERT_NE(nearlyFull.add(i * 257), nullptr);
     EXPECT_EQ(nearlyFull.add(251 * 257, true), nullptr);
     EXPECT_EQ(nearlyFull.GetCurrEntries(), 251);
-}
-
-TEST(ZYRCacheTest, EveryAllocationMayFail) {
-    failEachAllocation([] { // a cache's life: fill past capacity, look up, remove, tear down
-        TestCache cache(50, 5, 3, 8);
-        for (uint64_t k = 0; k < 200; ++k) {
-            cache.add(k * 7);
-            cache.find(k * 7 / 2);
-            uint64_t key = k * 3;
-            (void)(k % 5 == 0 && cache.hcRemoveEntry(&key, nullptr));
-            if (!cache.checkInvariants())
-                throw std::logic_error("invariants broken");
-        }
-        (void)cache.hcFreeCacheControl();
-    });
 }
 
 bool allZero(const unsigned char* p, unsigned int n) {

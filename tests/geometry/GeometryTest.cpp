@@ -61,7 +61,14 @@ TEST(CZYRMatrixTest, IdentityValidityAndComparisons) {
     EXPECT_EQ(std::pair(kA.determinant(), kA.resolution(72)), std::pair(-2.0, 72 * std::sqrt(2.0)));
 }
 
-TEST(CZYRMatrixTest, ProductOrdersAndForms) {
+::testing::AssertionResult is(const sZYRRect& g, double l, double b, double r, double t) {
+    if (g.left == l && g.bottom == b && g.right == r && g.top == t)
+        return ::testing::AssertionSuccess();
+    return ::testing::AssertionFailure() << "got left " << g.left << " bottom " << g.bottom
+                                         << " right " << g.right << " top " << g.top;
+}
+
+TEST(CZYRMatrixTest, ProductFormsPointsAndBoxes) {
     // Worked by hand: in A times B, A applies first.
     const CZYRMatrix AB(25, 28, 57, 64, 100, 112), BA(31, 46, 39, 58, 52, 76);
     EXPECT_TRUE(kA * kB == AB && kB * kA == BA);
@@ -99,6 +106,17 @@ TEST(CZYRMatrixTest, ProductOrdersAndForms) {
     m.rotate(90);
     const double cos90 = std::cos(90 * 3.141592653589793 / 180); // not 0 in double, and kept
     EXPECT_TRUE(m == CZYRMatrix(cos90, 1, -1, cos90, 0, 0));
+    float fx = 1.5f, fy = -2.0f, gx = 16777216.0f, gy = 1.0f;
+    kA.transformPoint(fx, fy);
+    // In float, 2^24 + 1 would round away before the translation cancels 2^24.
+    ZYRMatrix_transformPoint(CZYRMatrix(1, 0, 1, 1, -16777216.0, 0), gx, gy);
+    EXPECT_EQ(std::tuple(fx, fy, gx), std::tuple(0.5f, 1.0f, 1.0f));
+
+    // A mirroring and rotating matrix: the box holds the extremes of the four corners.
+    const sZYRRect box{-1, 2, 3, 4}; // left, bottom, top, right
+    for (const sZYRRect& got : {CZYRMatrix(-2, 1, 3, -4, 1, 2).transformBBox(box),
+                                ZYRMatrix_transformBBox(CZYRMatrix(-2, 1, 3, -4, 1, 2), box)})
+        EXPECT_TRUE(is(got, -1, -11, 12, -2));
 }
 
 TEST(CZYRMatrixTest, Inversion) {
@@ -137,27 +155,6 @@ TEST(CZYRMatrixTest, Inversion) {
     EXPECT_TRUE(CZYRMatrix(1, 0, 0, 2 * fmin, 0, 0).invertible() &&
                 CZYRMatrix(0, 1e-3, 1, 0, 0, 0).invertible() &&
                 CZYRMatrix(1e200, 0, 0, 1e200, 0, 0).invertible());
-}
-
-::testing::AssertionResult is(const sZYRRect& g, double l, double b, double r, double t) {
-    if (g.left == l && g.bottom == b && g.right == r && g.top == t)
-        return ::testing::AssertionSuccess();
-    return ::testing::AssertionFailure() << "got left " << g.left << " bottom " << g.bottom
-                                         << " right " << g.right << " top " << g.top;
-}
-
-TEST(CZYRMatrixTest, PointsAndBoundingBoxes) {
-    float fx = 1.5f, fy = -2.0f, gx = 16777216.0f, gy = 1.0f;
-    kA.transformPoint(fx, fy);
-    // In float, 2^24 + 1 would round away before the translation cancels 2^24.
-    ZYRMatrix_transformPoint(CZYRMatrix(1, 0, 1, 1, -16777216.0, 0), gx, gy);
-    EXPECT_EQ(std::tuple(fx, fy, gx), std::tuple(0.5f, 1.0f, 1.0f));
-
-    // A mirroring and rotating matrix: the box holds the extremes of the four corners.
-    const sZYRRect box{-1, 2, 3, 4}; // left, bottom, top, right
-    for (const sZYRRect& got : {CZYRMatrix(-2, 1, 3, -4, 1, 2).transformBBox(box),
-                                ZYRMatrix_transformBBox(CZYRMatrix(-2, 1, 3, -4, 1, 2), box)})
-        EXPECT_TRUE(is(got, -1, -11, 12, -2));
 }
 
 TEST(CZYRRectTest, InvertedDefaultUnionIntersectionAndTouch) {

@@ -271,7 +271,7 @@ template <class Decoder> std::string decodeError(const std::string& text) {
 constexpr const char* kA85Source = "source/zyr/std/CZYRStreamsFilterASCII85";
 constexpr const char* kHexSource = "source/zyr/std/CZYRStreamsFilterASCIIHEX";
 
-TEST(CZYRStreamsFilterTest, ASCII85Layout) {
+TEST(CZYRStreamsFilterTest, ASCII85LayoutArgumentsAndFailures) {
     // A full group at close is never z; nothing written gives nothing, not even the marker.
     EXPECT_EQ(
         std::vector<std::string>({encode85(std::string(4, '\0')), encode85(std::string(8, '\0')),
@@ -302,9 +302,6 @@ TEST(CZYRStreamsFilterTest, ASCII85Layout) {
             encode85(std::string(4 * zeros, '\0') + std::string(60, '\x7f') + last, nullptr, eod);
         EXPECT_EQ(t.find("\r\n") == lineEnd ? t.substr(lineEnd + 2) : t, second) << zeros;
     }
-}
-
-TEST(CZYRStreamsFilterTest, ASCII85ArgumentsAndFailures) {
     Stream out = sink();
     const CZYRSmartZYRRefPtr<IZYRStream> target(out);
     EXPECT_NO_THROW(CZYRStreamFilterASCII85(target, "ab", "12345678901234"));
@@ -396,26 +393,28 @@ TEST(CZYRStreamsFilterTest, RoundTripsOfManyLengths) {
     }
 }
 
-TEST(CZYRStreamsFilterTest, DecodeRules) {
+TEST(CZYRStreamsFilterTest, DecodeRulesAndErrorTextsThatOutliveTheThread) {
     using A85 = CZYRStreamFilterASCII85Decode;
     using Hex = CZYRStreamFilterASCIIHEXDecode;
     using Rows = std::vector<std::pair<std::string, std::string>>;
     // White space anywhere, Adobe's opening bracket, the end of the source ends the data,
     // nothing after the marker is read, an odd last hex digit is followed by 0.
-    for (const auto& [text, want] : Rows{{" 9jq\no^\tBl\rbD-\f~ >", "Man is d"},
-                                         {"<~9jqo^~>", "Man "},
-                                         {"5l", "A"},
-                                         {"~>garbage{", ""},
-                                         {"s8W-!~>", "\xff\xff\xff\xff"},
-                                         {"", ""}})
-        EXPECT_EQ(decode85(text), want) << text;
-    for (const auto& [text, want] : Rows{{"4d616E>", "Man"},
-                                         {" 4 d\r\n61\t6e\f>", "Man"},
-                                         {"4d6>", "M`"},
-                                         {"4d6", "M`"},
-                                         {">4d", ""},
-                                         {"", ""}})
-        EXPECT_EQ(decodeHex(text), want) << text;
+    const std::string a85[] = {" 9jq\no^\tBl\rbD-\f~ >",
+                               "Man is d",
+                               "<~9jqo^~>",
+                               "Man ",
+                               "5l",
+                               "A",
+                               "~>garbage{",
+                               "",
+                               "s8W-!~>",
+                               "\xff\xff\xff\xff",
+                               "",
+                               ""};
+    const std::string hex[] = {
+        "4d616E>", "Man", " 4 d\r\n61\t6e\f>", "Man", "4d6>", "M`", "4d6", "M`", ">4d", "", "", ""};
+    for (size_t i = 0; i < std::size(a85); i += 2) // text, then what it decodes to
+        EXPECT_EQ(decode85(a85[i]) + "|" + decodeHex(hex[i]), a85[i + 1] + "|" + hex[i + 1]) << i;
     for (const auto& [text, want] : Rows{{"9jqo^{", "invalid character 0x7B at offset 5"},
                                          {"9jz", "'z' inside a group at offset 2"},
                                          {"9jqo^5~>", "final group of one character at offset 5"},
@@ -439,9 +438,6 @@ TEST(CZYRStreamsFilterTest, DecodeRules) {
     EXPECT_EQ(withoutLine(zyrtest::describe(err)),
               withoutLine(zyrtest::describe(ZYRPublic::kZYRErrorInvalidData,
                                             "ASCII85Decode: invalid character", kA85Source, 0)));
-}
-
-TEST(CZYRStreamsFilterTest, DecodingErrorTextsOutliveTheNextErrorAndTheThread) {
     const CZYRError bad85 = firstError<CZYRStreamFilterASCII85Decode>("9jqo^{");
     CZYRError fromThread(ZYRPublic::kZYRErrorNoError, nullptr, "", 0);
     firstError<CZYRStreamFilterASCII85Decode>("9jz"); // a later error of the same kind

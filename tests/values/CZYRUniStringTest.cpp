@@ -216,7 +216,19 @@ TEST(CZYRUniStringTest, IcuAllocationFailureIsAnErrorNotACrash) {
     EXPECT_TRUE(!grown && growErr.getError() == ZYRPublic::kZYRErrorOutOfMemory);
 }
 
-TEST(CZYRStringTest, HashConversionsAndStreams) {
+TEST(CZYRStringTest, HexDecodingHashAndStreams) {
+    const auto hex = [](const char* text) {
+        const CZYRString bytes = CZYRStringFromHexASCIIString(text);
+        return std::string(bytes.c_str(), bytes.length());
+    };
+    // A non-digit repeats the nibble of the previous pair: "4g" after "41" is 0x41 again.
+    EXPECT_EQ(std::vector<std::string>({hex("00ff"), hex("48692"), hex("4A6a9Ff0"), hex("7"),
+                                        hex(""), hex(nullptr), hex("41g1"), hex("G@`g")}),
+              std::vector<std::string>({std::string("\0\xff", 2), "Hi", "Jj\x9f\xf0", "", "", "",
+                                        "AA", std::string(2, '\0')}));
+    // 127 bytes fit the stack buffer with their terminator, 128 do not.
+    for (size_t n : {127u, 128u, 300u})
+        EXPECT_EQ(hex(std::string(2 * n, 'a').c_str()), std::string(n, '\xaa'));
     EXPECT_EQ(std::tuple(CZYRString("ab").hashCode(), CZYRString("a\0b", 3).hashCode(),
                          CZYRString("hello").find("xyz")),
               std::tuple(3105u, 97u, 4294967295u))
@@ -230,21 +242,6 @@ TEST(CZYRStringTest, HashConversionsAndStreams) {
     getline(getline(in, line), part, ';');
     out << word + CZYRString("|") << line << "|" << part;
     EXPECT_EQ(out.str(), "first| second|third");
-}
-
-TEST(CZYRStringTest, HexDecoding) {
-    const auto hex = [](const char* text) {
-        const CZYRString bytes = CZYRStringFromHexASCIIString(text);
-        return std::string(bytes.c_str(), bytes.length());
-    };
-    // A non-digit repeats the nibble of the previous pair: "4g" after "41" is 0x41 again.
-    EXPECT_EQ(std::vector<std::string>({hex("00ff"), hex("48692"), hex("4A6a9Ff0"), hex("7"),
-                                        hex(""), hex(nullptr), hex("41g1"), hex("G@`g")}),
-              std::vector<std::string>({std::string("\0\xff", 2), "Hi", "Jj\x9f\xf0", "", "", "",
-                                        "AA", std::string(2, '\0')}));
-    // 127 bytes fit the stack buffer with their terminator, 128 do not.
-    for (size_t n : {127u, 128u, 300u})
-        EXPECT_EQ(hex(std::string(2 * n, 'a').c_str()), std::string(n, '\xaa'));
 }
 
 TEST(CZYRStringTest, DataBuffersKeepTheirOwnCopy) {
