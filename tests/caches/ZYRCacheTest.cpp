@@ -122,7 +122,7 @@ public:
     std::vector<void*> reports;
 };
 
-TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
+TEST(ZYRCacheTest, HeadTablesUpdatesAndRefusals) {
     for (const auto& [n, l, heads, limit] :
          {std::tuple{100, 4, 37, 17}, {1000000, 2, 32771, 184}, {3, 1, 3, 6}, {42, 42, 3, 84}}) {
         TestCache cache(n, 1, static_cast<unsigned char>(l));
@@ -145,6 +145,26 @@ TEST(ZYRCacheTest, HeadTableSizesAndRefusedArguments) {
     EXPECT_TRUE(!unusable.ValidateHashCtrl() && unusable.hcScavenger(5, nullptr) == 0 &&
                 unusable.hcTraverse(nullptr, nullptr) == kHCSuccess);
     EXPECT_THROW(unusable.hcGetEntry(&key, true), CZYRError) << "no table to look in";
+    TestCache cache(100, 4, 4);
+    for (uint64_t k = 0; k < 40; ++k)
+        cache.add(k);
+    // Same values change nothing; a new chain length alone is a change.
+    for (const auto& [n, l, limit] : {std::tuple{100, 4, 17}, {100, 5, 255}, {200, 5, 255}}) {
+        EXPECT_EQ(cache.hcUpdateCacheSize(n, static_cast<unsigned char>(l)), kHCSuccess);
+        EXPECT_EQ(std::tuple(cache.GetNumEntries(), cache.GetChainLength(),
+                             cache.head(36)->chainLimit, cache.head(0)->chainLimit,
+                             cache.hcGetNumHeads()),
+                  std::tuple(n, l, limit, limit, 37));
+    }
+    EXPECT_TRUE(cache.hcUpdateHowManyToRelease(9) == kHCSuccess && cache.GetAvailEntries() == 9);
+    cache.kept = {3};
+    EXPECT_TRUE(cache.hcFreeCacheControl() == kHCEntriesRemain && cache.hcCountEntries() == 1);
+    cache.kept.clear();
+    EXPECT_TRUE(cache.hcFreeCacheControl() == kHCSuccess && cache.GetCurrEntries() == 0 &&
+                !cache.ValidateHashCtrl());
+    expectAssertion([&] { (void)cache.hcUpdateCacheSize(1, 1); }, kHeader, 539);
+    expectAssertion([&] { (void)cache.hcUpdateHowManyToRelease(1); }, kHeader, 561);
+    EXPECT_THROW((void)cache.hcFreeCacheControl(), CZYRError);
 }
 
 // The cache's rules written out plainly over vectors of keys, front first.
@@ -379,29 +399,6 @@ TEST(ZYRCacheTest, ExhaustedPoolAndEveryAllocationFailing) {
         }
         (void)cache.hcFreeCacheControl();
     });
-}
-
-TEST(ZYRCacheTest, FreeControlUpdatesAndBrokenTables) {
-    TestCache cache(100, 4, 4);
-    for (uint64_t k = 0; k < 40; ++k)
-        cache.add(k);
-    // Same values change nothing; a new chain length alone is a change.
-    for (const auto& [n, l, limit] : {std::tuple{100, 4, 17}, {100, 5, 255}, {200, 5, 255}}) {
-        EXPECT_EQ(cache.hcUpdateCacheSize(n, static_cast<unsigned char>(l)), kHCSuccess);
-        EXPECT_EQ(std::tuple(cache.GetNumEntries(), cache.GetChainLength(),
-                             cache.head(36)->chainLimit, cache.head(0)->chainLimit,
-                             cache.hcGetNumHeads()),
-                  std::tuple(n, l, limit, limit, 37));
-    }
-    EXPECT_TRUE(cache.hcUpdateHowManyToRelease(9) == kHCSuccess && cache.GetAvailEntries() == 9);
-    cache.kept = {3};
-    EXPECT_TRUE(cache.hcFreeCacheControl() == kHCEntriesRemain && cache.hcCountEntries() == 1);
-    cache.kept.clear();
-    EXPECT_TRUE(cache.hcFreeCacheControl() == kHCSuccess && cache.GetCurrEntries() == 0 &&
-                !cache.ValidateHashCtrl());
-    expectAssertion([&] { (void)cache.hcUpdateCacheSize(1, 1); }, kHeader, 539);
-    expectAssertion([&] { (void)cache.hcUpdateHowManyToRelease(1); }, kHeader, 561);
-    EXPECT_THROW((void)cache.hcFreeCacheControl(), CZYRError);
 }
 
 TEST(ZYRCacheTest, LongChainsRefusalsAndRelocation) {

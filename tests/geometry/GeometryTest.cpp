@@ -43,7 +43,7 @@ const CZYRMatrix kA(1, 2, 3, 4, 5, 6);
 const CZYRMatrix kB(7, 8, 9, 10, 11, 12);
 const double kNaN = std::numeric_limits<double>::quiet_NaN();
 
-TEST(CZYRMatrixTest, IdentityValidityAndComparisons) {
+TEST(CZYRMatrixTest, ComparisonsAndInversion) {
     EXPECT_TRUE(CZYRMatrix().isIdentity() && CZYRMatrix(1, -0.0, 0, 1, 0, 0).isIdentity());
     EXPECT_FALSE(CZYRMatrix(1, 0, 0, 1, 0, 1e-300).isIdentity());
     const CZYRMatrix bad(1, 0, 0, 1, 0, kNaN);
@@ -59,6 +59,41 @@ TEST(CZYRMatrixTest, IdentityValidityAndComparisons) {
     EXPECT_EQ(std::vector<float>(f, f + 4), (std::vector<float>{0.1f, 2, 3, 4}));
     EXPECT_TRUE(std::isinf(f[4]) && f[5] == -7.0f) << "beyond float range narrows to infinity";
     EXPECT_EQ(std::pair(kA.determinant(), kA.resolution(72)), std::pair(-2.0, 72 * std::sqrt(2.0)));
+    std::mt19937_64 rng(7);
+    std::uniform_real_distribution<double> linear(-10.0, 10.0), shift(-1000.0, 1000.0);
+    for (int i = 0; i < 1000; ++i) {
+        const CZYRMatrix A(linear(rng), linear(rng), linear(rng), linear(rng), shift(rng),
+                           shift(rng));
+        if (std::fabs(A.determinant()) < 0.5)
+            continue;
+        CZYRMatrix inv;
+        ZYRMatrix_invert(A, inv);
+        ASSERT_TRUE(near(A * inv, CZYRMatrix(), 1e-9) && near(inv * A, CZYRMatrix(), 1e-9)) << i;
+    }
+    CZYRMatrix same = kA;
+    ZYRMatrix_invert(same, same);
+    EXPECT_TRUE(near(same * kA, CZYRMatrix(), 1e-12)) << "source and target may be one matrix";
+
+    // Exactly singular: the error, and neither matrix changes.
+    CZYRMatrix singular(1, 2, 2, 4, 0, 0), target = kB;
+    EXPECT_FALSE(singular.invertible());
+    expectBadParam([&] { singular.invert(); }, "Inverting Singular Matrix",
+                   "source/zyr/std/CZYRMatrix");
+    EXPECT_THROW(ZYRMatrix_invert(singular, target), CZYRError);
+    EXPECT_TRUE(singular == CZYRMatrix(1, 2, 2, 4, 0, 0) && target == kB);
+
+    // invert has no tolerance; invertible judges the determinant as a float.
+    CZYRMatrix tiny(1e-20, 0, 0, 1e-20, 0, 0);
+    const bool refused = tiny.invertible();
+    tiny.invert();
+    EXPECT_TRUE(!refused && near(tiny, CZYRMatrix(1e20, 0, 0, 1e20, 0, 0), 1e5));
+    // The determinant must exceed the least float, not reach it.
+    const double fmin = std::numeric_limits<float>::min();
+    EXPECT_FALSE(CZYRMatrix(1, 0, 0, fmin, 0, 0).invertible() ||
+                 CZYRMatrix(kNaN, 0, 0, 1, 0, 0).invertible());
+    EXPECT_TRUE(CZYRMatrix(1, 0, 0, 2 * fmin, 0, 0).invertible() &&
+                CZYRMatrix(0, 1e-3, 1, 0, 0, 0).invertible() &&
+                CZYRMatrix(1e200, 0, 0, 1e200, 0, 0).invertible());
 }
 
 ::testing::AssertionResult is(const sZYRRect& g, double l, double b, double r, double t) {
@@ -117,44 +152,6 @@ TEST(CZYRMatrixTest, ProductFormsPointsAndBoxes) {
     for (const sZYRRect& got : {CZYRMatrix(-2, 1, 3, -4, 1, 2).transformBBox(box),
                                 ZYRMatrix_transformBBox(CZYRMatrix(-2, 1, 3, -4, 1, 2), box)})
         EXPECT_TRUE(is(got, -1, -11, 12, -2));
-}
-
-TEST(CZYRMatrixTest, Inversion) {
-    std::mt19937_64 rng(7);
-    std::uniform_real_distribution<double> linear(-10.0, 10.0), shift(-1000.0, 1000.0);
-    for (int i = 0; i < 1000; ++i) {
-        const CZYRMatrix A(linear(rng), linear(rng), linear(rng), linear(rng), shift(rng),
-                           shift(rng));
-        if (std::fabs(A.determinant()) < 0.5)
-            continue;
-        CZYRMatrix inv;
-        ZYRMatrix_invert(A, inv);
-        ASSERT_TRUE(near(A * inv, CZYRMatrix(), 1e-9) && near(inv * A, CZYRMatrix(), 1e-9)) << i;
-    }
-    CZYRMatrix same = kA;
-    ZYRMatrix_invert(same, same);
-    EXPECT_TRUE(near(same * kA, CZYRMatrix(), 1e-12)) << "source and target may be one matrix";
-
-    // Exactly singular: the error, and neither matrix changes.
-    CZYRMatrix singular(1, 2, 2, 4, 0, 0), target = kB;
-    EXPECT_FALSE(singular.invertible());
-    expectBadParam([&] { singular.invert(); }, "Inverting Singular Matrix",
-                   "source/zyr/std/CZYRMatrix");
-    EXPECT_THROW(ZYRMatrix_invert(singular, target), CZYRError);
-    EXPECT_TRUE(singular == CZYRMatrix(1, 2, 2, 4, 0, 0) && target == kB);
-
-    // invert has no tolerance; invertible judges the determinant as a float.
-    CZYRMatrix tiny(1e-20, 0, 0, 1e-20, 0, 0);
-    const bool refused = tiny.invertible();
-    tiny.invert();
-    EXPECT_TRUE(!refused && near(tiny, CZYRMatrix(1e20, 0, 0, 1e20, 0, 0), 1e5));
-    // The determinant must exceed the least float, not reach it.
-    const double fmin = std::numeric_limits<float>::min();
-    EXPECT_FALSE(CZYRMatrix(1, 0, 0, fmin, 0, 0).invertible() ||
-                 CZYRMatrix(kNaN, 0, 0, 1, 0, 0).invertible());
-    EXPECT_TRUE(CZYRMatrix(1, 0, 0, 2 * fmin, 0, 0).invertible() &&
-                CZYRMatrix(0, 1e-3, 1, 0, 0, 0).invertible() &&
-                CZYRMatrix(1e200, 0, 0, 1e200, 0, 0).invertible());
 }
 
 TEST(CZYRRectTest, InvertedDefaultUnionIntersectionAndTouch) {

@@ -66,7 +66,7 @@ CZYRUniString fresh(const std::string& text) {
 
 } // namespace
 
-TEST(CZYRDictTest, TypedValuesAndTypeChecks) {
+TEST(CZYRDictTest, TypedValuesTypeChecksAndBadArguments) {
     CZYRDict dict, inner, gotDict;
     CZYRArray arr;
     const CZYRUniString k("k");
@@ -117,29 +117,26 @@ TEST(CZYRDictTest, TypedValuesAndTypeChecks) {
                 "Key not found");
     const CZYRDict invalid(static_cast<I_Dict*>(nullptr), false);
     expectThrow([&] { invalid.getType(k); }, kZYRErrorInvalidObject, "Null object");
-}
-
-TEST(CZYRDictTest, InterfaceRecordsBadArgumentsAndKeepsEarlierErrors) {
     C_Error err;
-    I_Dict* dict = createDict(err);
+    I_Dict* raw = createDict(err);
     const CZYRUniString key("key");
     for (const auto& [call, message] :
          std::initializer_list<std::pair<std::function<void()>, const char*>>{
-             {[&] { dict->set(nullptr, 1u, err); }, "set"},
-             {[&] { dict->get(key.getImpl(), static_cast<unsigned int*>(nullptr), err); }, "get"},
-             {[&] { dict->remove(nullptr, err); }, "remove"},
-             {[&] { dict->enumerate(nullptr, err); }, "enumerate"}}) {
+             {[&] { raw->set(nullptr, 1u, err); }, "set"},
+             {[&] { raw->get(key.getImpl(), static_cast<unsigned int*>(nullptr), err); }, "get"},
+             {[&] { raw->remove(nullptr, err); }, "remove"},
+             {[&] { raw->enumerate(nullptr, err); }, "enumerate"}}) {
         err.reset();
         call();
         expectError(err, kZYRErrorBadParam,
                     ("Bad argument to IImp_ZYRDict::" + std::string(message)).c_str());
     }
-    dict->set(key.getImpl(), 3u, err); // with an error already recorded, nothing changes
-    EXPECT_TRUE(dict->getType(key.getImpl()) == kZYRValTypeNone && !createDict(err));
+    raw->set(key.getImpl(), 3u, err); // with an error already recorded, nothing changes
+    EXPECT_TRUE(raw->getType(key.getImpl()) == kZYRValTypeNone && !createDict(err));
     err.reset();
-    dict->set(key.getImpl(), static_cast<I_Dict*>(nullptr), err);
-    EXPECT_EQ(dict->getType(key.getImpl()), kZYRValTypeDict) << "a null object is a value";
-    dict->release();
+    raw->set(key.getImpl(), static_cast<I_Dict*>(nullptr), err);
+    EXPECT_EQ(raw->getType(key.getImpl()), kZYRValTypeDict) << "a null object is a value";
+    raw->release();
     CZYRArray array;
     array.getImpl()->get(0, static_cast<bool*>(nullptr), err);
     EXPECT_STREQ(err.getMessage(), "Bad argument to IImp_ZYRArray::get");

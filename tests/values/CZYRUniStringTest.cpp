@@ -83,7 +83,7 @@ TEST(CZYRUniStringTest, ConstructionFromEveryEncoding) {
                 odd.getImpl()->lessThan(a.getImpl()) && !a.getImpl()->lessThan(odd.getImpl()));
 }
 
-TEST(CZYRUniStringTest, ConvertReportsNeededLengthAndTerminates) {
+TEST(CZYRUniStringTest, ConversionsReportTheLengthAndTerminate) {
     const CZYRUniString abc = fresh("abc"), invalid;
     char buffer[10];
     // The full length even when it does not fit, nothing beyond the capacity, and up to four
@@ -111,19 +111,16 @@ TEST(CZYRUniStringTest, ConvertReportsNeededLengthAndTerminates) {
     invalid.convert(buffer, &invalidSize, "UTF-8");
     EXPECT_EQ(std::string(buffer, 4) + std::to_string(size) + std::to_string(invalidSize),
               std::string("\0\0\0x100", 7));
-}
-
-TEST(CZYRUniStringTest, BufferConversionsMeasureThenFill) {
     CZYRMemBuffer<char> narrow;
-    CZYRMemBuffer<char16_t> wide;
+    CZYRMemBuffer<char16_t> wideBuffer;
     EXPECT_EQ(UniStringToUTF8(CZYRUniString(""), narrow) + narrow.count(), 0u) << "left alone";
     EXPECT_EQ(UniStringToUTF8(CZYRUniString(u"\u00e9t\u00e9"), narrow), 5u);
     EXPECT_STREQ(narrow.data(), "\xc3\xa9t\xc3\xa9");
     EXPECT_EQ(UniStringToChar(CZYRUniString(u"\u00e9"), narrow), 1u);
     EXPECT_EQ(std::string(narrow.data(), narrow.count()), std::string("\x1a\0\0\0\0\0", 6))
         << "substituted outside ASCII; the buffer never shrinks";
-    EXPECT_EQ(UniStringToWChar_t(CZYRUniString(u"\U0001F600"), wide), 2u);
-    EXPECT_EQ(std::u16string(wide.data()), u"\U0001F600");
+    EXPECT_EQ(UniStringToWChar_t(CZYRUniString(u"\U0001F600"), wideBuffer), 2u);
+    EXPECT_EQ(std::u16string(wideBuffer.data()), u"\U0001F600");
     EXPECT_EQ(UniStringToWString(CZYRUniString(u"x\u00e9")).str(), u"x\u00e9");
 }
 
