@@ -520,34 +520,7 @@ TEST(CZYRMaskCacheTest, RecordsZeroedReusedAndGrownWhileMemoryLasts) {
     expectAssertion([] { CZYRMaskCache none(0); });
 }
 
-TEST(CZYRMaskCacheTest, ConversionMatchesAPerPixelReference) {
-    CZYRMaskCache cache(8);
-    unsigned int size = 0;
-    ZYR_MaskRec* mask = cache.CreateBitmapMask(nullptr, 0, 0, 5, size, false, false);
-    EXPECT_EQ(size + mask->width + mask->height, 0u);
-    std::mt19937 random(77);
-    for (int round = 0; round < 400; ++round) {
-        const bool fourBit = random() % 2;
-        const unsigned int width = 1 + random() % (round < 200 ? 80 : 700);
-        const unsigned int height = 1 + random() % 24;
-        const unsigned int srcRowBytes = ((fourBit ? 4 : 1) * width + 7) / 8 + random() % 5;
-        const bool useReserved = random() % 4 == 0;
-        cache.DeleteBitmapMask(mask);
-        std::vector<unsigned char> src(size_t{srcRowBytes} * height);
-        std::generate(src.begin(), src.end(), random);
-        mask = cache.CreateBitmapMask(src.data(), width, srcRowBytes, height, size, fourBit,
-                                      useReserved);
-        ASSERT_EQ(std::vector<unsigned char>(mask->data, mask->data + size),
-                  referenceMask(src, width, srcRowBytes, height, fourBit))
-            << "width " << width << " height " << height << (fourBit ? " 4-bit" : " 1-bit");
-        ASSERT_TRUE(cache.isReservedMask(mask) == useReserved && mask->width == width &&
-                    mask->height == height && mask->flag == 0);
-        std::memset(mask->data, 0xFF, size); // the next mask's padding must still come out 0
-    }
-    cache.DeleteBitmapMask(mask);
-}
-
-TEST(CZYRMaskCacheTest, ReservedMaskLimits) {
+TEST(CZYRMaskCacheTest, ReservedMaskLimitsAndAPerPixelReference) {
     CZYRMaskCache cache(8);
     std::vector<unsigned char> src(size_t{512} * 2001, 0xC3);
     unsigned int size = 0;
@@ -584,6 +557,28 @@ TEST(CZYRMaskCacheTest, ReservedMaskLimits) {
     EXPECT_EQ(cache.GetMaskRec(8, 1), mask) << "the moved mask's record was freed";
     expectAssertion([&] { cache.FallbackToReservedMask(mask, 4096); });
     expectAssertion([&] { cache.FallbackToReservedMask(nullptr, 4); });
+    cache.DeleteBitmapMask(mask);
+    mask = cache.CreateBitmapMask(nullptr, 0, 0, 5, size, false, false);
+    EXPECT_EQ(size + mask->width + mask->height, 0u);
+    std::mt19937 random(77);
+    for (int round = 0; round < 400; ++round) {
+        const bool fourBit = random() % 2;
+        const unsigned int width = 1 + random() % (round < 200 ? 80 : 700);
+        const unsigned int height = 1 + random() % 24;
+        const unsigned int srcRowBytes = ((fourBit ? 4 : 1) * width + 7) / 8 + random() % 5;
+        const bool useReserved = random() % 4 == 0;
+        cache.DeleteBitmapMask(mask);
+        std::vector<unsigned char> src(size_t{srcRowBytes} * height);
+        std::generate(src.begin(), src.end(), random);
+        mask = cache.CreateBitmapMask(src.data(), width, srcRowBytes, height, size, fourBit,
+                                      useReserved);
+        ASSERT_EQ(std::vector<unsigned char>(mask->data, mask->data + size),
+                  referenceMask(src, width, srcRowBytes, height, fourBit))
+            << "width " << width << " height " << height << (fourBit ? " 4-bit" : " 1-bit");
+        ASSERT_TRUE(cache.isReservedMask(mask) == useReserved && mask->width == width &&
+                    mask->height == height && mask->flag == 0);
+        std::memset(mask->data, 0xFF, size); // the next mask's padding must still come out 0
+    }
     cache.DeleteBitmapMask(mask);
 }
 

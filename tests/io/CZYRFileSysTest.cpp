@@ -82,7 +82,7 @@ public:
     zyrtest::TempDir dir_;
 };
 
-TEST(CZYRFileSysTest, NothingInstalled) {
+TEST(CZYRFileSysTest, NothingInstalledAndFileNames) {
     ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
     using Proc = ZYRFileSys::IZYRFileSys* (*)();
     for (Proc proc : {Proc([]() -> ZYRFileSys::IZYRFileSys* { return nullptr; }), Proc()}) {
@@ -94,9 +94,6 @@ TEST(CZYRFileSysTest, NothingInstalled) {
     }
     expectError([] { CZYRFileName name("/tmp/x"); }, ZYRPublic::kZYRErrorFatal,
                 "ZYRFactory Proc not set in ZYRStd", "source/zyr/std/ZYRStdInit");
-}
-
-TEST(CZYRFileSysTest, FileNameCountsAndForwards) {
     auto* raw = new ZYRHostKit::CPosixFileName(ZYRStd::CZYRWString(u"/a/b/c.txt"));
     raw->addRef(); // ours, kept across the wrappers below
     { CZYRFileName adopting(raw, false); }
@@ -142,7 +139,7 @@ protected:
     const char* source() const { return GetParam() ? kHostSource : kWindowsSource; }
 };
 
-TEST_P(FileStreamTest, OpenModesAndTransfers) {
+TEST_P(FileStreamTest, OpenModesTransfersAndFilesThatDoNotOpen) {
     const std::string path = fx_.dir_.file("data.bin"), temporary = fx_.dir_.file("gone.tmp");
     writeFile(path, "0123456789");
     char buf[8] = {};
@@ -174,9 +171,6 @@ TEST_P(FileStreamTest, OpenModesAndTransfers) {
         ->write("x", 1, 1);
     fx_.open(path, kZYRStreamRead)->removeFile();
     EXPECT_FALSE(exists(temporary) || exists(path)) << "deleted on close, and removed";
-}
-
-TEST_P(FileStreamTest, FilesThatDoNotOpen) {
     auto missing = fx_.open(fx_.dir_.file("missing.txt"), kZYRStreamRead);
     char c;
     ZYRPublic::eZYRErrorType err = ZYRPublic::kZYRErrorNoError;

@@ -48,7 +48,7 @@ CZYRSmartZYRRefPtr<IImpZYRMemStream> memStream(unsigned int mode, unsigned int c
 const char* const kPastEnd = "write past end of stream";
 
 // Random modes, capacities, own or caller's buffers and transfers against a model.
-TEST(ZYRStreamsTest, MemoryStreamMatchesAModel) {
+TEST(ZYRStreamsTest, MemoryStreamMatchesAModelAndWrappersForward) {
     std::mt19937 random(3);
     const unsigned int R = kZYRStreamRead, W = kZYRStreamWrite, A = kZYRStreamAppend,
                        T = kZYRStreamTruncate;
@@ -141,9 +141,6 @@ TEST(ZYRStreamsTest, MemoryStreamMatchesAModel) {
     expectError([] { IImpZYRMemStream s(kZYRStreamWrite, 64, nullptr); },
                 ZYRPublic::kZYRErrorOutOfMemory, nullptr);
     zyrtest::installFront(0);
-}
-
-TEST(ZYRStreamsTest, WrappersForwardAndCount) {
     ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
     EXPECT_THROW(ZYRStd::CZYRBaseStream(kZYRStreamWrite, 16, nullptr), CZYRError)
         << "wrappers make their streams through the file system";
@@ -154,8 +151,9 @@ TEST(ZYRStreamsTest, WrappersForwardAndCount) {
     ZYRStd::ZYRStdInit_SetDefaultFileSysProc([] { return installed; });
     ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
     ZYRStd::ZYRStdInit_SetZYRFactoryProc(ZYRHostKit::posixFileNameFactory);
-    ZYRStd::CZYRBaseStream empty, s(kZYRStreamRead | kZYRStreamWrite, 16, nullptr), copy(s);
-    EXPECT_TRUE(!empty.isValid() && s.isShared() && s.write("abc", 1, 3) == 3 && s.getPos() == 3);
+    ZYRStd::CZYRBaseStream empty, base(kZYRStreamRead | kZYRStreamWrite, 16, nullptr), copy(base);
+    EXPECT_TRUE(!empty.isValid() && base.isShared() && base.write("abc", 1, 3) == 3 &&
+                base.getPos() == 3);
     expectError([&] { empty.getPos(); }, ZYRPublic::kZYRErrorInvalidObject, "Null object",
                 "source/zyr/std/CZYRBaseStream");
     zyrtest::TempDir dir;

@@ -213,33 +213,8 @@ TEST(CZYRDictTest, RandomRunMatchesAModel) {
 
 // Keys that each have a bucket of their own at both sizes enumerate in bucket order, which
 // shows how many buckets the table has.
-TEST(CZYRDictTest, TableGrowsFrom193To389Buckets) {
-    std::vector<CZYRUniString> keys;
-    std::set<uint32_t> small, large;
-    for (unsigned int n = 0; keys.size() < 194; ++n) {
-        const CZYRUniString key(("key" + std::to_string(n)).c_str());
-        const uint32_t h = key.hashCode();
-        if ((keys.size() == 193 || !small.contains(h % 193)) && large.insert(h % 389).second)
-            small.insert(h % 193), keys.push_back(key);
-    }
-    auto inBucketOrder = [](const CZYRDict& dict, std::vector<CZYRUniString> expected,
-                            uint32_t buckets) {
-        std::sort(expected.begin(), expected.end(), [buckets](const auto& a, const auto& b) {
-            return a.hashCode() % buckets < b.hashCode() % buckets;
-        });
-        CountingProcs procs;
-        dict.enumerate(&procs);
-        return procs.keys == expected;
-    };
-    CZYRDict dict;
-    for (size_t n = 0; n < 193; ++n)
-        dict.set(keys[n], static_cast<unsigned int>(n));
-    EXPECT_TRUE(inBucketOrder(dict, {keys.begin(), keys.begin() + 193}, 193));
-    dict.set(keys[193], 193u);
-    EXPECT_TRUE(inBucketOrder(dict, keys, 389));
-}
 
-TEST(CZYRDictTest, FinalizeIsDeepAndCloneIsNot) {
+TEST(CZYRDictTest, FinalizeCloneAndBucketGrowth) {
     CZYRDict outer, inner, inList;
     CZYRArray list;
     list.set(0, inList);
@@ -295,6 +270,29 @@ TEST(CZYRDictTest, FinalizeIsDeepAndCloneIsNot) {
     trailing.set(3, CZYRUniString("x"));
     trailing.getImpl()->insert(3, err);
     EXPECT_EQ(trailing.clone().getLength(), 5u);
+    std::vector<CZYRUniString> keys;
+    std::set<uint32_t> small, large;
+    for (unsigned int n = 0; keys.size() < 194; ++n) {
+        const CZYRUniString key(("key" + std::to_string(n)).c_str());
+        const uint32_t h = key.hashCode();
+        if ((keys.size() == 193 || !small.contains(h % 193)) && large.insert(h % 389).second)
+            small.insert(h % 193), keys.push_back(key);
+    }
+    auto inBucketOrder = [](const CZYRDict& dict, std::vector<CZYRUniString> expected,
+                            uint32_t buckets) {
+        std::sort(expected.begin(), expected.end(), [buckets](const auto& a, const auto& b) {
+            return a.hashCode() % buckets < b.hashCode() % buckets;
+        });
+        CountingProcs procs;
+        dict.enumerate(&procs);
+        return procs.keys == expected;
+    };
+    CZYRDict dict;
+    for (size_t n = 0; n < 193; ++n)
+        dict.set(keys[n], static_cast<unsigned int>(n));
+    EXPECT_TRUE(inBucketOrder(dict, {keys.begin(), keys.begin() + 193}, 193));
+    dict.set(keys[193], 193u);
+    EXPECT_TRUE(inBucketOrder(dict, keys, 389));
 }
 
 TEST(CZYRDictTest, CyclesAndDeepNestingAreRefusedByFinalizeAndClone) {

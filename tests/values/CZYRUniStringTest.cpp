@@ -124,7 +124,7 @@ TEST(CZYRUniStringTest, ConversionsReportTheLengthAndTerminate) {
     EXPECT_EQ(UniStringToWString(CZYRUniString(u"x\u00e9")).str(), u"x\u00e9");
 }
 
-TEST(CZYRUniStringTest, OrderEqualityConcatAndInterning) {
+TEST(CZYRUniStringTest, OrderConcatInterningAndPathForms) {
     const CZYRUniString a = fresh("a"), ab = fresh("ab"), ab2 = fresh("ab"), invalid;
     EXPECT_TRUE(a < ab && a < ab.getImpl() && ab == ab2 && ab == ab2.getImpl() &&
                 invalid < invalid && ab.hashCode() == ab2.hashCode() && invalid.hashCode() == 0);
@@ -149,9 +149,6 @@ TEST(CZYRUniStringTest, OrderEqualityConcatAndInterning) {
                 CZYRUniString(u"some key").getImpl() == one.getImpl());
     EXPECT_EQ(CZYRUniString("MediaBox").getImpl(), GetCommonUniStrings()->str_MediaBox().get())
         << "rows of the table are shared with it";
-}
-
-TEST(CZYRUniStringTest, PathForms) {
     C_Error err;
     EXPECT_TRUE(!UniStringToUTF16Path(CZYRUniString(""), err) && !err.errorOccurred());
     for (unsigned short* path :
