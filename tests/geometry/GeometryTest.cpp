@@ -154,7 +154,26 @@ TEST(CZYRMatrixTest, ProductFormsPointsAndBoxes) {
         EXPECT_TRUE(is(got, -1, -11, 12, -2));
 }
 
-TEST(CZYRRectTest, InvertedDefaultUnionIntersectionAndTouch) {
+struct Collect : IEncodedDataCBProc {
+    bool encodedSample(int index, float value) override {
+        EXPECT_EQ(index, static_cast<int>(values.size()));
+        values.push_back(value);
+        return true;
+    }
+    std::vector<float> values;
+};
+
+std::vector<float> samples(std::vector<CZYRSampledFunc<float>::Point> points,
+                           sZYRRangeT<float> domain, sZYRRangeT<float> range, int n) {
+    CZYRSampledFunc<float> f(domain, range);
+    f.setPoints(points.data(), static_cast<unsigned int>(points.size()));
+    Collect out;
+    const auto eightBit = Caculate8BitEncodedSamples(CZYRSampledFunc<float>(f), n, out);
+    EXPECT_TRUE(eightBit.min == 0.0f && eightBit.max == 255.0f);
+    return out.values;
+}
+
+TEST(CZYRRectTest, RectanglesAndResampling) {
     const sZYRRect rec = CZYRRect(1, 2, 3, 4); // left, bottom, right, top
     EXPECT_EQ(std::pair(rec.top, rec.right), std::pair(4.0, 3.0)) << "top before right";
     const double huge = std::numeric_limits<double>::max();
@@ -194,28 +213,6 @@ TEST(CZYRRectTest, InvertedDefaultUnionIntersectionAndTouch) {
         edge.intersectRect(other);
         EXPECT_TRUE(is(edge, 0, 0, 0, 0));
     }
-}
-
-struct Collect : IEncodedDataCBProc {
-    bool encodedSample(int index, float value) override {
-        EXPECT_EQ(index, static_cast<int>(values.size()));
-        values.push_back(value);
-        return true;
-    }
-    std::vector<float> values;
-};
-
-std::vector<float> samples(std::vector<CZYRSampledFunc<float>::Point> points,
-                           sZYRRangeT<float> domain, sZYRRangeT<float> range, int n) {
-    CZYRSampledFunc<float> f(domain, range);
-    f.setPoints(points.data(), static_cast<unsigned int>(points.size()));
-    Collect out;
-    const auto eightBit = Caculate8BitEncodedSamples(CZYRSampledFunc<float>(f), n, out);
-    EXPECT_TRUE(eightBit.min == 0.0f && eightBit.max == 255.0f);
-    return out.values;
-}
-
-TEST(CZYRSampledFuncTest, ResamplingRules) {
     using V = std::vector<float>;
     EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0, 1}, 3), (V{0.0f, 127.5f, 255.0f}));
     // Points cover 0.25..0.75 of the domain: outside them the end values hold.

@@ -82,7 +82,7 @@ public:
     zyrtest::TempDir dir_;
 };
 
-TEST(CZYRFileSysTest, NothingInstalledAndFileNames) {
+TEST(CZYRFileSysTest, NothingInstalledFileNamesAndDirectories) {
     ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
     using Proc = ZYRFileSys::IZYRFileSys* (*)();
     for (Proc proc : {Proc([]() -> ZYRFileSys::IZYRFileSys* { return nullptr; }), Proc()}) {
@@ -106,9 +106,6 @@ TEST(CZYRFileSysTest, NothingInstalledAndFileNames) {
     raw->release();
     expectError([&] { CZYRFileName().getWStringPath(); }, ZYRPublic::kZYRErrorInvalidObject,
                 "Null object", "source/zyr/std/CZYRFileSys");
-}
-
-TEST(CZYRFileSysTest, DirectoriesMadeAtConstruction) {
     zyrtest::TempDir dir;
     // 245 characters in all is the longest accepted name; an empty text is a name not given.
     const std::string longest = dir.path() + "/" + std::string(244 - dir.path().size(), 'd'),
@@ -442,29 +439,6 @@ ssize_t scripted() {
     return errno = steps[calls].second, steps[calls++].first;
 }
 
-TEST(CZYRFileSysTest, PosixTransfersRetryInterruptsAndStopAtNoProgress) {
-    // Interrupts are retried; a write that moves nothing must not be retried for ever; the
-    // failure's errno, or EIO without one; the end of the file is no error.
-    const std::tuple<bool, std::vector<std::pair<ssize_t, int>>, size_t, int> cases[] = {
-        {true, {{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}, 10, 0},
-        {true, {{3, 0}, {0, 0}}, 3, EIO},
-        {true, {{2, 0}, {-1, ENOSPC}}, 2, ENOSPC},
-        {true, {{-1, 0}}, 0, EIO},
-        {false, {{-1, EINTR}, {7, 0}, {0, 0}}, 7, 0},
-        {false, {{5, 0}, {-1, EBADF}}, 5, EBADF},
-    };
-    char buf[10] = {};
-    for (const auto& [write, script, done, error] : cases) {
-        steps = script;
-        calls = 0;
-        const auto t = write ? ZYRStd::posixio::writeFully(
-                                   3, buf, 10, [](int, const void*, size_t) { return scripted(); })
-                             : ZYRStd::posixio::readFully(
-                                   3, buf, 10, [](int, void*, size_t) { return scripted(); });
-        EXPECT_EQ(std::tuple(t.done, t.error, calls), std::tuple(done, error, steps.size()));
-    }
-}
-
 // The DI paths and path texts that the host handed out and did not get back yet.
 ZYRPublic::_t_ZYRPDLFileSysRec real{};
 std::set<void*> outstanding;
@@ -472,7 +446,7 @@ template <class T> T* noted(T* p) {
     return p ? outstanding.insert(p), p : p;
 }
 
-TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
+TEST(CZYRFileSysTest, HostPathFreedAndPosixTransfersRetried) {
     FileSysFixture fx(true);
     const std::string path = fx.dir_.file("host.txt");
     writeFile(path, "host");
@@ -500,6 +474,26 @@ TEST(CZYRFileSysTest, HostPathIsFreedWhateverAllocationFails) {
     }
     host.failAt = 0;
     zyrtest::installFront(0);
+    // Interrupts are retried; a write that moves nothing must not be retried for ever; the
+    // failure's errno, or EIO without one; the end of the file is no error.
+    const std::tuple<bool, std::vector<std::pair<ssize_t, int>>, size_t, int> cases[] = {
+        {true, {{-1, EINTR}, {4, 0}, {-1, EINTR}, {6, 0}}, 10, 0},
+        {true, {{3, 0}, {0, 0}}, 3, EIO},
+        {true, {{2, 0}, {-1, ENOSPC}}, 2, ENOSPC},
+        {true, {{-1, 0}}, 0, EIO},
+        {false, {{-1, EINTR}, {7, 0}, {0, 0}}, 7, 0},
+        {false, {{5, 0}, {-1, EBADF}}, 5, EBADF},
+    };
+    char buf[10] = {};
+    for (const auto& [write, script, done, error] : cases) {
+        steps = script;
+        calls = 0;
+        const auto t = write ? ZYRStd::posixio::writeFully(
+                                   3, buf, 10, [](int, const void*, size_t) { return scripted(); })
+                             : ZYRStd::posixio::readFully(
+                                   3, buf, 10, [](int, void*, size_t) { return scripted(); });
+        EXPECT_EQ(std::tuple(t.done, t.error, calls), std::tuple(done, error, steps.size()));
+    }
 }
 
 } // namespace

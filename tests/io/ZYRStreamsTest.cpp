@@ -330,7 +330,24 @@ TEST(CZYRStreamsFilterTest, ASCII85LayoutArgumentsAndFailures) {
     EXPECT_EQ(small->peekRefCnt(), 1);
 }
 
-TEST(CZYRStreamsFilterTest, ASCIIHexLayout) {
+TEST(CZYRStreamsFilterTest, RoundTripsAndASCIIHexLayout) {
+    for (size_t n = 0; n < 300; ++n) {
+        for (bool zeros : {false, true}) {
+            const std::string bytes = randomBytes(n, static_cast<unsigned int>(n), zeros);
+            const std::string a85 = encode85(bytes, nullptr, nullptr, true, 1 + n % 7);
+            ASSERT_EQ(decode85(a85, 1 + n % 5), bytes) << n << " bytes: " << a85;
+            ASSERT_EQ(encode85(bytes, nullptr, nullptr, true, 1), a85)
+                << "byte by byte or in bulk, the same text";
+            const std::string hex = encodeHex(bytes, "  ", nullptr, 1 + n % 9);
+            ASSERT_EQ(decodeHex(hex, 1 + n % 5), bytes) << n << " bytes: " << hex;
+        }
+    }
+    for (size_t n : {4095u, 65536u, 65537u, 200001u}) {
+        const std::string bytes = randomBytes(n, 99, true);
+        EXPECT_EQ(decode85(encode85(bytes, "  ", nullptr, true)), bytes) << n;
+        EXPECT_EQ(decode85(encode85(bytes, nullptr, nullptr, false), 1000), bytes) << n;
+        EXPECT_EQ(decodeHex(encodeHex(bytes)), bytes) << n;
+    }
     EXPECT_EQ(encodeHex("") + encodeHex("\x01\xab\xff"), ">\r\n01abff>\r\n") << "a marker always";
 
     EXPECT_EQ(encodeHex(std::string(41, '\xaa'), "  "),
@@ -369,26 +386,6 @@ TEST(CZYRStreamsFilterTest, ASCIIHexLayout) {
     err.reset();
     EXPECT_EQ(closed.write("x", 1, 1, err), 0u);
     EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCIIHEX::write - stream invalid");
-}
-
-TEST(CZYRStreamsFilterTest, RoundTripsOfManyLengths) {
-    for (size_t n = 0; n < 300; ++n) {
-        for (bool zeros : {false, true}) {
-            const std::string bytes = randomBytes(n, static_cast<unsigned int>(n), zeros);
-            const std::string a85 = encode85(bytes, nullptr, nullptr, true, 1 + n % 7);
-            ASSERT_EQ(decode85(a85, 1 + n % 5), bytes) << n << " bytes: " << a85;
-            ASSERT_EQ(encode85(bytes, nullptr, nullptr, true, 1), a85)
-                << "byte by byte or in bulk, the same text";
-            const std::string hex = encodeHex(bytes, "  ", nullptr, 1 + n % 9);
-            ASSERT_EQ(decodeHex(hex, 1 + n % 5), bytes) << n << " bytes: " << hex;
-        }
-    }
-    for (size_t n : {4095u, 65536u, 65537u, 200001u}) {
-        const std::string bytes = randomBytes(n, 99, true);
-        EXPECT_EQ(decode85(encode85(bytes, "  ", nullptr, true)), bytes) << n;
-        EXPECT_EQ(decode85(encode85(bytes, nullptr, nullptr, false), 1000), bytes) << n;
-        EXPECT_EQ(decodeHex(encodeHex(bytes)), bytes) << n;
-    }
 }
 
 TEST(CZYRStreamsFilterTest, DecodeRulesAndErrorTextsThatOutliveTheThread) {

@@ -55,7 +55,9 @@ void expectError(Call call, ZYRPublic::eZYRErrorType type, const char* message) 
 
 } // namespace
 
-TEST(CZYRUniStringTest, ConstructionFromEveryEncoding) {
+static bool icuHeapFails = false;
+
+TEST(CZYRUniStringTest, ConstructionAndIcuAllocationFailure) {
     const CZYRUniString empty("");
     unsigned int bytes = 99;
     empty.getUTF16LEBuffer(&bytes);
@@ -81,6 +83,38 @@ TEST(CZYRUniStringTest, ConstructionFromEveryEncoding) {
     EXPECT_TRUE(odd.isValid() && odd.isEmpty() && bytes == 0 &&
                 odd.getImpl()->equals(fresh("").getImpl()) &&
                 odd.getImpl()->lessThan(a.getImpl()) && !a.getImpl()->lessThan(odd.getImpl()));
+    UErrorCode status = U_ZERO_ERROR;
+    u_setMemoryFunctions(
+        nullptr, [](const void*, size_t n) { return icuHeapFails ? nullptr : std::malloc(n); },
+        [](const void*, void* p, size_t n) { return icuHeapFails ? nullptr : std::realloc(p, n); },
+        [](const void*, void* p) { std::free(p); }, &status);
+    ASSERT_TRUE(U_SUCCESS(status));
+    // Longer than the text ICU keeps inside the object, so the buffer comes from its heap.
+    const std::string longAscii(200, 'x');
+    const std::u16string longWide(200, u'y');
+    const CZYRUniString base = fresh("base");
+    C_Error asciiErr, wideErr, concatErr;
+    icuHeapFails = true;
+    I_UniString* ascii = createUniString(longAscii.c_str(), "ASCII", asciiErr);
+    I_UniString* wide = createUniString(longWide.c_str(), wideErr);
+    I_UniString* joined = base.getImpl()->concat(ascii, concatErr);
+    icuHeapFails = false;
+    ASSERT_NE(ascii, nullptr);
+    EXPECT_TRUE(ascii->getUTF16LEBuffer(&(bytes = 99)) && bytes == 0 &&
+                !ascii->equals(base.getImpl()));
+    EXPECT_EQ(std::tuple(asciiErr.getError(), wideErr.getError(), concatErr.getError()),
+              std::tuple(ZYRPublic::kZYRErrorOutOfMemory, ZYRPublic::kZYRErrorOutOfMemory,
+                         ZYRPublic::kZYRErrorNoError))
+        << "an empty text appended needs no memory";
+    for (I_UniString* made : {joined, ascii, wide})
+        if (made)
+            made->release();
+    C_Error growErr;
+    const CZYRUniString big = fresh(longAscii.c_str());
+    icuHeapFails = true;
+    I_UniString* grown = big.getImpl()->concat(big.getImpl(), growErr);
+    icuHeapFails = false;
+    EXPECT_TRUE(!grown && growErr.getError() == ZYRPublic::kZYRErrorOutOfMemory);
 }
 
 TEST(CZYRUniStringTest, ConversionsReportTheLengthAndTerminate) {
@@ -171,43 +205,6 @@ TEST(CZYRUniStringTest, OrderConcatInterningAndPathForms) {
         EXPECT_EQ(std::u16string(reinterpret_cast<char16_t*>(decoded)), path);
         ZYRFree(decoded);
     }
-}
-
-static bool icuHeapFails = false;
-
-TEST(CZYRUniStringTest, IcuAllocationFailureIsAnErrorNotACrash) {
-    UErrorCode status = U_ZERO_ERROR;
-    u_setMemoryFunctions(
-        nullptr, [](const void*, size_t n) { return icuHeapFails ? nullptr : std::malloc(n); },
-        [](const void*, void* p, size_t n) { return icuHeapFails ? nullptr : std::realloc(p, n); },
-        [](const void*, void* p) { std::free(p); }, &status);
-    ASSERT_TRUE(U_SUCCESS(status));
-    // Longer than the text ICU keeps inside the object, so the buffer comes from its heap.
-    const std::string longAscii(200, 'x');
-    const std::u16string longWide(200, u'y');
-    const CZYRUniString base = fresh("base");
-    C_Error asciiErr, wideErr, concatErr;
-    icuHeapFails = true;
-    I_UniString* ascii = createUniString(longAscii.c_str(), "ASCII", asciiErr);
-    I_UniString* wide = createUniString(longWide.c_str(), wideErr);
-    I_UniString* joined = base.getImpl()->concat(ascii, concatErr);
-    icuHeapFails = false;
-    unsigned int bytes = 99;
-    ASSERT_NE(ascii, nullptr);
-    EXPECT_TRUE(ascii->getUTF16LEBuffer(&bytes) && bytes == 0 && !ascii->equals(base.getImpl()));
-    EXPECT_EQ(std::tuple(asciiErr.getError(), wideErr.getError(), concatErr.getError()),
-              std::tuple(ZYRPublic::kZYRErrorOutOfMemory, ZYRPublic::kZYRErrorOutOfMemory,
-                         ZYRPublic::kZYRErrorNoError))
-        << "an empty text appended needs no memory";
-    for (I_UniString* made : {joined, ascii, wide})
-        if (made)
-            made->release();
-    C_Error growErr;
-    const CZYRUniString big = fresh(longAscii.c_str());
-    icuHeapFails = true;
-    I_UniString* grown = big.getImpl()->concat(big.getImpl(), growErr);
-    icuHeapFails = false;
-    EXPECT_TRUE(!grown && growErr.getError() == ZYRPublic::kZYRErrorOutOfMemory);
 }
 
 TEST(CZYRStringTest, HexDecodingHashAndStreams) {

@@ -29,7 +29,18 @@ CZYRDict one(const char* key, const auto& value) {
 }
 } // namespace
 
-TEST(ZYRDictEnumProcsTest, PrintingCyclesDepthAndTracing) {
+namespace {
+int destroyed = 0;
+struct Item : CZYRRegisterItemBase {
+    explicit Item(int id) : CZYRRegisterItemBase(id) {}
+    ~Item() override { ++destroyed; }
+};
+Item* owned(int id) {
+    return std::make_unique<Item>(id).release();
+}
+} // namespace
+
+TEST(ZYRDictEnumProcsTest, PrintingTracingAndTheInterfaceRegistry) {
     const CZYRDict n = one("n", 7u), inner = one("flag", true),
                    name = one("name", CZYRUniString("job"));
     EXPECT_EQ(print(n, 1), "") << "depth 1 prints nothing";
@@ -93,20 +104,6 @@ TEST(ZYRDictEnumProcsTest, PrintingCyclesDepthAndTracing) {
     const std::string text = print(one("deep", chain), 2);
     EXPECT_EQ(std::count(text.begin(), text.end(), '['), 1 + 256) << "the label and 256 levels";
     EXPECT_EQ(text.substr(text.size() - 4), "...\n");
-}
-
-namespace {
-int destroyed = 0;
-struct Item : CZYRRegisterItemBase {
-    explicit Item(int id) : CZYRRegisterItemBase(id) {}
-    ~Item() override { ++destroyed; }
-};
-Item* owned(int id) {
-    return std::make_unique<Item>(id).release();
-}
-} // namespace
-
-TEST(ZYRDictEnumProcsTest, InterfaceRegistryOwnsWhatItIsGiven) {
     destroyed = 0;
     {
         CZYRInterfaceRegistry registry;
