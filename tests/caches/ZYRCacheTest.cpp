@@ -122,7 +122,7 @@ public:
     std::vector<void*> reports;
 };
 
-TEST(ZYRCacheTest, HeadTablesUpdatesAndRefusals) {
+TEST(ZYRCacheTest, HeadTablesLongChainsRefusalsAndRelocation) {
     for (const auto& [n, l, heads, limit] :
          {std::tuple{100, 4, 37, 17}, {1000000, 2, 32771, 184}, {3, 1, 3, 6}, {42, 42, 3, 84}}) {
         TestCache cache(n, 1, static_cast<unsigned char>(l));
@@ -165,6 +165,43 @@ TEST(ZYRCacheTest, HeadTablesUpdatesAndRefusals) {
     expectAssertion([&] { (void)cache.hcUpdateCacheSize(1, 1); }, kHeader, 539);
     expectAssertion([&] { (void)cache.hcUpdateHowManyToRelease(1); }, kHeader, 561);
     EXPECT_THROW((void)cache.hcFreeCacheControl(), CZYRError);
+    TestCache full(1000, 1, 1, 300); // 1031 heads
+    for (uint64_t i = 0; i < 254; ++i)
+        ASSERT_NE(full.add(i * 1031), nullptr);
+    expectAssertion([&] { full.add(254 * 1031); }, kHeader, 551);
+    EXPECT_TRUE(full.head(0)->count == 255 && IZYRCache::hcIsChainFull(full.head(0)) &&
+                full.checkInvariants())
+        << "linked and counted before the assertion";
+    uint64_t overflow = 255 * 1031; // nothing more fits the 8-bit count: refused before linking
+    auto* extra = static_cast<Entry*>(full.pool.Alloc());
+    *extra = Entry{{}, overflow, valueFor(overflow)};
+    expectAssertion([&] { full.hcInsertEntry(&overflow, extra); }, kHeader, 533);
+    expectAssertion([&] { full.hcLinkEntry(full.head(0), extra); }, kHeader, 551);
+    EXPECT_TRUE(full.head(0)->count == 255 && !full.find(overflow));
+    *extra = Entry{{}, 1, valueFor(1)}; // another chain takes it
+    full.hcInsertEntry(&extra->key, extra);
+    EXPECT_TRUE(full.find(1) == extra && full.GetMaxEntries() == 256);
+    {
+        TestCache cache(100, 4, 4);
+        for (uint64_t k : {0u, 37u, 74u})
+            cache.add(k); // {74, 37, 0}
+        Entry* first = static_cast<Entry*>(cache.head(0)->next);
+        Entry front{}, loose{};
+        IZYRCache::hcRelocateEntry(first, &front, sizeof(Entry));
+        EXPECT_TRUE(cache.head(0)->next == &front && cache.chain(0) == (Keys{74, 37, 0}) &&
+                    cache.checkInvariants());
+        for (const auto& [from, to, bytes] : {std::tuple<Entry*, Entry*, int>{nullptr, &loose, 8},
+                                              {&front, nullptr, 8},
+                                              {&front, &loose, 0}})
+            expectAssertion([&] { IZYRCache::hcRelocateEntry(from, to, bytes); }, kSource, 172);
+        IZYRCache::hcRelocateEntry(&front, first, sizeof(Entry)); // back into pool memory
+    }
+    TestCache nearlyFull(251, 1, 1); // 257 heads
+    nearlyFull.keepAll = true;
+    for (uint64_t i = 0; i < 251; ++i)
+        ASSERT_NE(nearlyFull.add(i * 257), nullptr);
+    EXPECT_EQ(nearlyFull.add(251 * 257, true), nullptr);
+    EXPECT_EQ(nearlyFull.GetCurrEntries(), 251);
 }
 
 // The cache's rules written out plainly over vectors of keys, front first.
@@ -401,46 +438,6 @@ TEST(ZYRCacheTest, ExhaustedPoolAndEveryAllocationFailing) {
     });
 }
 
-TEST(ZYRCacheTest, LongChainsRefusalsAndRelocation) {
-    TestCache cache(1000, 1, 1, 300); // 1031 heads
-    for (uint64_t i = 0; i < 254; ++i)
-        ASSERT_NE(cache.add(i * 1031), nullptr);
-    expectAssertion([&] { cache.add(254 * 1031); }, kHeader, 551);
-    EXPECT_TRUE(cache.head(0)->count == 255 && IZYRCache::hcIsChainFull(cache.head(0)) &&
-                cache.checkInvariants())
-        << "linked and counted before the assertion";
-    uint64_t key = 255 * 1031; // nothing more fits the 8-bit count: refused before linking
-    auto* extra = static_cast<Entry*>(cache.pool.Alloc());
-    *extra = Entry{{}, key, valueFor(key)};
-    expectAssertion([&] { cache.hcInsertEntry(&key, extra); }, kHeader, 533);
-    expectAssertion([&] { cache.hcLinkEntry(cache.head(0), extra); }, kHeader, 551);
-    EXPECT_TRUE(cache.head(0)->count == 255 && !cache.find(key));
-    *extra = Entry{{}, 1, valueFor(1)}; // another chain takes it
-    cache.hcInsertEntry(&extra->key, extra);
-    EXPECT_TRUE(cache.find(1) == extra && cache.GetMaxEntries() == 256);
-    {
-        TestCache cache(100, 4, 4);
-        for (uint64_t k : {0u, 37u, 74u})
-            cache.add(k); // {74, 37, 0}
-        Entry* first = static_cast<Entry*>(cache.head(0)->next);
-        Entry front{}, loose{};
-        IZYRCache::hcRelocateEntry(first, &front, sizeof(Entry));
-        EXPECT_TRUE(cache.head(0)->next == &front && cache.chain(0) == (Keys{74, 37, 0}) &&
-                    cache.checkInvariants());
-        for (const auto& [from, to, bytes] : {std::tuple<Entry*, Entry*, int>{nullptr, &loose, 8},
-                                              {&front, nullptr, 8},
-                                              {&front, &loose, 0}})
-            expectAssertion([&] { IZYRCache::hcRelocateEntry(from, to, bytes); }, kSource, 172);
-        IZYRCache::hcRelocateEntry(&front, first, sizeof(Entry)); // back into pool memory
-    }
-    TestCache nearlyFull(251, 1, 1); // 257 heads
-    nearlyFull.keepAll = true;
-    for (uint64_t i = 0; i < 251; ++i)
-        ASSERT_NE(nearlyFull.add(i * 257), nullptr);
-    EXPECT_EQ(nearlyFull.add(251 * 257, true), nullptr);
-    EXPECT_EQ(nearlyFull.GetCurrEntries(), 251);
-}
-
 bool allZero(const unsigned char* p, unsigned int n) {
     return std::all_of(p, p + n, [](unsigned char c) { return c == 0; });
 }
@@ -475,7 +472,7 @@ std::unique_ptr<void, void (*)(void*)> exhaustMemory() {
     return {filler, ZYRFree};
 }
 
-TEST(CZYRMaskCacheTest, RecordsZeroedReusedAndGrownWhileMemoryLasts) {
+TEST(CZYRMaskCacheTest, RecordsWhileMemoryLastsAndTheReservedMaskWithout) {
     const unsigned long long before = GetMemUsage();
     const unsigned long long page = CZYRMaskCache::VAR_ALLOC_PAGE_SIZE + 24ull;
     unsigned long long current = 0, peak = 0;
@@ -518,6 +515,36 @@ TEST(CZYRMaskCacheTest, RecordsZeroedReusedAndGrownWhileMemoryLasts) {
     }
     EXPECT_EQ(GetMemUsage(), before) << "the destructor returns every block and chunk";
     expectAssertion([] { CZYRMaskCache none(0); });
+    zyrtest::installFront(0);
+    const CZYRErrorStk notices; // refusals are noticed there; built before measuring
+    const unsigned long long fronted = GetMemUsage();
+    {
+        CZYRMaskCache cache(2);
+        const auto exhausted = exhaustMemory();
+        ASSERT_TRUE(exhausted);
+        ZYR_MaskRec* first = cache.GetMaskRec(100, 10);   // the initial page still serves
+        ZYR_MaskRec* large = cache.GetMaskRec(2000, 700); // the supplier refuses the block
+        EXPECT_TRUE(!cache.isReservedMask(first) && cache.isReservedMask(large) &&
+                    large->width == 2000 && large->height == 700 && allZero(large->data, 176400));
+        ZYR_MaskRec* second = cache.GetMaskRec(100, 10);
+        unsigned int size = 0;
+        std::vector<unsigned char> src(100, 0x80);
+        ZYR_MaskRec* third = cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, false);
+        EXPECT_TRUE(!cache.isReservedMask(second) && cache.isReservedMask(third) &&
+                    third->data[0] == 0x01 && third->data[4 * 99] == 0x01);
+        expectAssertion([&] { cache.GetMaskRec(2000, 2001); });
+        cache.DeleteBitmapMask(first);
+        EXPECT_EQ(cache.GetMaskRec(50, 1), first) << "a freed record serves without new memory";
+        cache.DeleteBitmapMask(first);
+        cache.DeleteBitmapMask(second);
+    }
+    EXPECT_EQ(GetMemUsage(), fronted);
+    {
+        const auto exhausted = exhaustMemory();
+        expectError([] { CZYRMaskCache refused(2); }, ZYRPublic::kZYRErrorOutOfMemory,
+                    "failed to allocate mask cache storage", kMaskSource);
+    }
+    EXPECT_EQ(GetMemUsage(), fronted) << "a refused construction keeps nothing";
 }
 
 TEST(CZYRMaskCacheTest, ReservedMaskLimitsAndAPerPixelReference) {
@@ -580,39 +607,6 @@ TEST(CZYRMaskCacheTest, ReservedMaskLimitsAndAPerPixelReference) {
         std::memset(mask->data, 0xFF, size); // the next mask's padding must still come out 0
     }
     cache.DeleteBitmapMask(mask);
-}
-
-TEST(CZYRMaskCacheTest, WithoutMemoryEveryRequestGetsTheReservedMask) {
-    zyrtest::installFront(0);
-    const CZYRErrorStk notices; // refusals are noticed there; built before measuring
-    const unsigned long long before = GetMemUsage();
-    {
-        CZYRMaskCache cache(2);
-        const auto exhausted = exhaustMemory();
-        ASSERT_TRUE(exhausted);
-        ZYR_MaskRec* first = cache.GetMaskRec(100, 10);   // the initial page still serves
-        ZYR_MaskRec* large = cache.GetMaskRec(2000, 700); // the supplier refuses the block
-        EXPECT_TRUE(!cache.isReservedMask(first) && cache.isReservedMask(large) &&
-                    large->width == 2000 && large->height == 700 && allZero(large->data, 176400));
-        ZYR_MaskRec* second = cache.GetMaskRec(100, 10);
-        unsigned int size = 0;
-        std::vector<unsigned char> src(100, 0x80);
-        ZYR_MaskRec* third = cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, false);
-        EXPECT_TRUE(!cache.isReservedMask(second) && cache.isReservedMask(third) &&
-                    third->data[0] == 0x01 && third->data[4 * 99] == 0x01);
-        expectAssertion([&] { cache.GetMaskRec(2000, 2001); });
-        cache.DeleteBitmapMask(first);
-        EXPECT_EQ(cache.GetMaskRec(50, 1), first) << "a freed record serves without new memory";
-        cache.DeleteBitmapMask(first);
-        cache.DeleteBitmapMask(second);
-    }
-    EXPECT_EQ(GetMemUsage(), before);
-    {
-        const auto exhausted = exhaustMemory();
-        expectError([] { CZYRMaskCache refused(2); }, ZYRPublic::kZYRErrorOutOfMemory,
-                    "failed to allocate mask cache storage", kMaskSource);
-    }
-    EXPECT_EQ(GetMemUsage(), before) << "a refused construction keeps nothing";
 }
 
 } // namespace

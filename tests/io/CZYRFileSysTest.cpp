@@ -300,7 +300,20 @@ protected:
     FileSysFixture fx_{false};
 };
 
-TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
+class Collector : public ZYRFileSys::IDirEnumCBProc {
+public:
+    explicit Collector(size_t stopAfter = ~size_t{0}) : stopAfter_(stopAfter) {}
+    bool operator()(const ZYRStd::CZYRUniString& path, unsigned int attributes) override {
+        entries.emplace_back(utf8(path), attributes);
+        return entries.size() < stopAfter_;
+    }
+    std::vector<std::pair<std::string, unsigned int>> entries;
+
+private:
+    size_t stopAfter_;
+};
+
+TEST_F(FileOperationsTest, CopyRemoveRenameExistsAndEnumerate) {
     const std::string a = fx_.dir_.file("a.txt"), b = fx_.dir_.file("b.txt");
     writeFile(a, "alpha");
     EXPECT_TRUE(CZYRFileSys::fileExists(name("a.txt")) && !CZYRFileSys::fileExists(name("b.txt")) &&
@@ -339,22 +352,6 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExists) {
         CZYRFileSys::makeDirectory(name("sub"));
     struct stat st;
     EXPECT_TRUE(::stat(fx_.dir_.file("sub").c_str(), &st) == 0 && S_ISDIR(st.st_mode));
-}
-
-class Collector : public ZYRFileSys::IDirEnumCBProc {
-public:
-    explicit Collector(size_t stopAfter = ~size_t{0}) : stopAfter_(stopAfter) {}
-    bool operator()(const ZYRStd::CZYRUniString& path, unsigned int attributes) override {
-        entries.emplace_back(utf8(path), attributes);
-        return entries.size() < stopAfter_;
-    }
-    std::vector<std::pair<std::string, unsigned int>> entries;
-
-private:
-    size_t stopAfter_;
-};
-
-TEST_F(FileOperationsTest, EnumDirectory) {
     const std::string root = fx_.dir_.file("tree"), empty = fx_.dir_.file("empty");
     for (const std::string& dir : {root, root + "/inner", empty})
         ::mkdir(dir.c_str(), 0777);

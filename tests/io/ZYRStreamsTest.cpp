@@ -269,68 +269,7 @@ template <class Decoder> std::string decodeError(const std::string& text) {
 constexpr const char* kA85Source = "source/zyr/std/CZYRStreamsFilterASCII85";
 constexpr const char* kHexSource = "source/zyr/std/CZYRStreamsFilterASCIIHEX";
 
-TEST(CZYRStreamsFilterTest, ASCII85LayoutArgumentsAndFailures) {
-    // A full group at close is never z; nothing written gives nothing, not even the marker.
-    EXPECT_EQ(
-        std::vector<std::string>({encode85(std::string(4, '\0')), encode85(std::string(8, '\0')),
-                                  encode85(std::string(8, '\0'), nullptr, nullptr, false),
-                                  encode85("A"), encode85(""), encode85("Man is", "  ", "EOD")}),
-        std::vector<std::string>({"!!!!!~>\r\n", "z!!!!!~>\r\n", "!!!!!!!!!!~>\r\n", "5l~>\r\n", "",
-                                  "  9jqo^BlaEOD\r\n"}));
-
-    const std::string text = encode85(std::string(64, '\x7f')), group = text.substr(0, 5);
-    EXPECT_EQ(text.substr(80), "\r\n~>\r\n") << "80 digits, then the marker alone";
-    EXPECT_EQ(encode85(std::string(68, '\x7f') + "x").find("\r\n"), 80u);
-    // A group split over two lines: one 'z' first moves every group by one character.
-    const std::string split = encode85(std::string(4, '\0') + std::string(68, '\x7f'));
-    EXPECT_EQ(split.substr(76, 4) + split.substr(80, 3), group.substr(0, 4) + "\r\n" + group[4]);
-
-    // At close, the split never leaves a single character for the next line. `zeros` 'z'
-    // characters and 15 groups of digits come first; then "A" gives "5l", "AB" "5sb".
-    const std::tuple<unsigned int, const char*, const char*, size_t, const char*> closings[] = {
-        {2, nullptr, "A", 79, "~>\r\n"},    // 77 + "5l~>": 3 would fit and leave ">" alone
-        {3, nullptr, "A", 80, "~>\r\n"},    // 78: 2 fit, 2 go on
-        {4, nullptr, "A", 80, "l~>\r\n"},   // 79: 1 fits, 3 go on
-        {4, "", "A", 79, "5l\r\n"},         // 79 + "5l": "l" would be alone, so both go on
-        {3, "~", "A", 79, "l~\r\n"},        // 78 + "5l~": "~" would be alone
-        {4, nullptr, "AB", 80, "sb~>\r\n"}, // 79 + "5sb~>": 1 fits, 4 go on
-    };
-    for (const auto& [zeros, eod, last, lineEnd, second] : closings) {
-        const std::string t =
-            encode85(std::string(4 * zeros, '\0') + std::string(60, '\x7f') + last, nullptr, eod);
-        EXPECT_EQ(t.find("\r\n") == lineEnd ? t.substr(lineEnd + 2) : t, second) << zeros;
-    }
-    Stream out = sink();
-    const CZYRSmartZYRRefPtr<IZYRStream> target(out);
-    EXPECT_NO_THROW(CZYRStreamFilterASCII85(target, "ab", "12345678901234"));
-    expectError([&] { CZYRStreamFilterASCII85 f(target, nullptr, "123456789012345"); },
-                ZYRPublic::kZYRErrorBadParam,
-                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long", kA85Source);
-    expectError([&] { CZYRStreamFilterASCII85 f(target, "abc", nullptr); },
-                ZYRPublic::kZYRErrorBadParam,
-                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long", kA85Source);
-
-    CZYRStreamFilterASCII85 filter(target, nullptr, nullptr, true);
-    CZYRStreamFilterASCII85{target}.write("A", 1, 1); // the destructor closes
-    EXPECT_EQ(filter.write("A", 1, 1), 1u);
-    filter.close();
-    filter.close();
-    EXPECT_EQ(contents(out), "5l~>\r\n5l~>\r\n");
-    expectError([&] { filter.write("x", 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
-                "CZYRStreamFilterASCII85::write - stream invalid", kA85Source);
-    // Too small for the second line: the target is dropped, the destructor does not throw.
-    Stream small = sink(90);
-    {
-        CZYRStreamFilterASCII85 f{CZYRSmartZYRRefPtr<IZYRStream>(small)};
-        const std::string bytes(200, '\x7f');
-        ZYRStd::C_Error writeErr;
-        EXPECT_EQ(f.write(bytes.data(), 1, 200, writeErr), 0u);
-        EXPECT_TRUE(!strcmp(writeErr.getMessage(), kPastEnd) && !f.getTargetStream());
-    }
-    EXPECT_EQ(small->peekRefCnt(), 1);
-}
-
-TEST(CZYRStreamsFilterTest, RoundTripsAndASCIIHexLayout) {
+TEST(CZYRStreamsFilterTest, RoundTripsLayoutsArgumentsAndFailures) {
     for (size_t n = 0; n < 300; ++n) {
         for (bool zeros : {false, true}) {
             const std::string bytes = randomBytes(n, static_cast<unsigned int>(n), zeros);
@@ -386,6 +325,64 @@ TEST(CZYRStreamsFilterTest, RoundTripsAndASCIIHexLayout) {
     err.reset();
     EXPECT_EQ(closed.write("x", 1, 1, err), 0u);
     EXPECT_STREQ(err.getMessage(), "CZYRStreamFilterASCIIHEX::write - stream invalid");
+    // A full group at close is never z; nothing written gives nothing, not even the marker.
+    EXPECT_EQ(
+        std::vector<std::string>({encode85(std::string(4, '\0')), encode85(std::string(8, '\0')),
+                                  encode85(std::string(8, '\0'), nullptr, nullptr, false),
+                                  encode85("A"), encode85(""), encode85("Man is", "  ", "EOD")}),
+        std::vector<std::string>({"!!!!!~>\r\n", "z!!!!!~>\r\n", "!!!!!!!!!!~>\r\n", "5l~>\r\n", "",
+                                  "  9jqo^BlaEOD\r\n"}));
+
+    const std::string text = encode85(std::string(64, '\x7f')), group = text.substr(0, 5);
+    EXPECT_EQ(text.substr(80), "\r\n~>\r\n") << "80 digits, then the marker alone";
+    EXPECT_EQ(encode85(std::string(68, '\x7f') + "x").find("\r\n"), 80u);
+    // A group split over two lines: one 'z' first moves every group by one character.
+    const std::string split = encode85(std::string(4, '\0') + std::string(68, '\x7f'));
+    EXPECT_EQ(split.substr(76, 4) + split.substr(80, 3), group.substr(0, 4) + "\r\n" + group[4]);
+
+    // At close, the split never leaves a single character for the next line. `zeros` 'z'
+    // characters and 15 groups of digits come first; then "A" gives "5l", "AB" "5sb".
+    const std::tuple<unsigned int, const char*, const char*, size_t, const char*> closings[] = {
+        {2, nullptr, "A", 79, "~>\r\n"},    // 77 + "5l~>": 3 would fit and leave ">" alone
+        {3, nullptr, "A", 80, "~>\r\n"},    // 78: 2 fit, 2 go on
+        {4, nullptr, "A", 80, "l~>\r\n"},   // 79: 1 fits, 3 go on
+        {4, "", "A", 79, "5l\r\n"},         // 79 + "5l": "l" would be alone, so both go on
+        {3, "~", "A", 79, "l~\r\n"},        // 78 + "5l~": "~" would be alone
+        {4, nullptr, "AB", 80, "sb~>\r\n"}, // 79 + "5sb~>": 1 fits, 4 go on
+    };
+    for (const auto& [zeros, eod, last, lineEnd, second] : closings) {
+        const std::string t =
+            encode85(std::string(4 * zeros, '\0') + std::string(60, '\x7f') + last, nullptr, eod);
+        EXPECT_EQ(t.find("\r\n") == lineEnd ? t.substr(lineEnd + 2) : t, second) << zeros;
+    }
+    Stream a85Out = sink();
+    const CZYRSmartZYRRefPtr<IZYRStream> target(a85Out);
+    EXPECT_NO_THROW(CZYRStreamFilterASCII85(target, "ab", "12345678901234"));
+    expectError([&] { CZYRStreamFilterASCII85 f(target, nullptr, "123456789012345"); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: eod is too long", kA85Source);
+    expectError([&] { CZYRStreamFilterASCII85 f(target, "abc", nullptr); },
+                ZYRPublic::kZYRErrorBadParam,
+                "CZYRStreamFilterASCII85::CZYRStreamFilterASCII85: prefix is too long", kA85Source);
+
+    CZYRStreamFilterASCII85 filter(target, nullptr, nullptr, true);
+    CZYRStreamFilterASCII85{target}.write("A", 1, 1); // the destructor closes
+    EXPECT_EQ(filter.write("A", 1, 1), 1u);
+    filter.close();
+    filter.close();
+    EXPECT_EQ(contents(a85Out), "5l~>\r\n5l~>\r\n");
+    expectError([&] { filter.write("x", 1, 1); }, ZYRPublic::kZYRErrorFileOpFailed,
+                "CZYRStreamFilterASCII85::write - stream invalid", kA85Source);
+    // Too small for the second line: the target is dropped, the destructor does not throw.
+    Stream small = sink(90);
+    {
+        CZYRStreamFilterASCII85 f{CZYRSmartZYRRefPtr<IZYRStream>(small)};
+        const std::string bytes(200, '\x7f');
+        ZYRStd::C_Error writeErr;
+        EXPECT_EQ(f.write(bytes.data(), 1, 200, writeErr), 0u);
+        EXPECT_TRUE(!strcmp(writeErr.getMessage(), kPastEnd) && !f.getTargetStream());
+    }
+    EXPECT_EQ(small->peekRefCnt(), 1);
 }
 
 TEST(CZYRStreamsFilterTest, DecodeRulesAndErrorTextsThatOutliveTheThread) {

@@ -207,7 +207,7 @@ TEST(CZYRUniStringTest, OrderConcatInterningAndPathForms) {
     }
 }
 
-TEST(CZYRStringTest, HexDecodingHashAndStreams) {
+TEST(CZYRStringTest, HexDecodingHashStreamsAndDataBuffers) {
     const auto hex = [](const char* text) {
         const CZYRString bytes = CZYRStringFromHexASCIIString(text);
         return std::string(bytes.c_str(), bytes.length());
@@ -233,9 +233,6 @@ TEST(CZYRStringTest, HexDecodingHashAndStreams) {
     getline(getline(in, line), part, ';');
     out << word + CZYRString("|") << line << "|" << part;
     EXPECT_EQ(out.str(), "first| second|third");
-}
-
-TEST(CZYRStringTest, DataBuffersKeepTheirOwnCopy) {
     char bytes[] = "payload";
     const CZYRDataBuffer buffer(bytes, 7), copy = buffer, invalid;
     bytes[0] = 'X';
@@ -261,7 +258,7 @@ TEST(CZYRStringTest, DataBuffersKeepTheirOwnCopy) {
     zyrtest::installFront(0);
 }
 
-TEST(CZYRCommonUniStringsTest, EveryAccessorAnswersItsOwnRowAndText) {
+TEST(CZYRCommonUniStringsTest, RowsTextsAndTheBoundedCache) {
     IZYRCommonUniStrings* table = GetCommonUniStrings();
     unsigned int row = 0;
     auto check = [&](C_SmartPtr<I_UniString> s, const char* name) {
@@ -289,9 +286,6 @@ TEST(CZYRCommonUniStringsTest, EveryAccessorAnswersItsOwnRowAndText) {
                 "CommonUniString singleton not initialized");
     InitCommonUniStrings();
     EXPECT_NO_THROW(CZYRUniString("anything"));
-}
-
-TEST(CZYRCommonUniStringsTest, CacheIsBoundedAndLeastRecentlyUsedGoesFirst) {
     ReleaseDynamicUniStringCache();
     InitDynamicUniStringCache();
     std::vector<C_SmartPtr<I_UniString>> first;
