@@ -209,7 +209,6 @@ INSTANTIATE_TEST_SUITE_P(NativeAndHost, FileStreamTest, ::testing::Values(false,
                              return info.param ? "Host" : "Native";
                          });
 
-// Host procedures that fail.
 constexpr auto failOne = [](void*) { return -1; };
 constexpr auto failGet = [](void*, unsigned long long*) { return -1; };
 constexpr auto failSet = [](void*, uint32_t, uint32_t) { return -1; };
@@ -230,9 +229,8 @@ TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
                 "open64 proc not defined", kHostSource);
     fx.record_ = ZYRHostKit::posixFileProcs();
     fx.record_.diPathToPath = nullptr;
-    auto fileless = fx.open(path, kZYRStreamRead);
-    char c;
-    expectOpFailed([&] { fileless->read(&c, 1, 1); }, "file stm not open");
+    expectOpFailed([&] { fx.open(path, kZYRStreamRead)->read(nullptr, 1, 1); },
+                   "file stm not open");
     fx.record_ = ZYRHostKit::posixFileProcs();
     fx.record_.wPathToDIPath = nullptr;
     EXPECT_TRUE(fx.open(path, kZYRStreamRead)->isOpen()) << "the narrow procedure stands in";
@@ -242,8 +240,7 @@ TEST(CZYRFileSysTest, HostRecordWithMissingProcedures) {
     expectError([&] { CZYRFileSys::createTmpFileStream(CZYRFileName(path.c_str()), u"t", 0); },
                 ZYRPublic::kZYRErrorInvalidFuncCall, "tempFile proc not defined");
     fx.record_ = ZYRHostKit::posixFileProcs();
-    EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true))
-        << "no DI path";
+    EXPECT_FALSE(CZYRFileSys::createFileStream(CZYRFileName(""), kZYRStreamRead, true)) << "no DI";
 
     using R = ZYRPublic::_t_ZYRPDLFileSysRec&;
     using S = CZYRSmartZYRRefPtr<IZYRFStream>&;
@@ -313,7 +310,7 @@ private:
     size_t stopAfter_;
 };
 
-TEST_F(FileOperationsTest, CopyRemoveRenameExistsAndEnumerate) {
+TEST_F(FileOperationsTest, CopyRemoveRenameEnumerateAndMap) {
     const std::string a = fx_.dir_.file("a.txt"), b = fx_.dir_.file("b.txt");
     writeFile(a, "alpha");
     EXPECT_TRUE(CZYRFileSys::fileExists(name("a.txt")) && !CZYRFileSys::fileExists(name("b.txt")) &&
@@ -322,8 +319,6 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExistsAndEnumerate) {
     writeFile(a, readFile(b) + "beta");
     CZYRFileSys::copy(name("a.txt"), name("b.txt"), false);
     CZYRFileSys::copy(CZYRFileName(""), name("c.txt"), false); // an empty path does nothing
-    // Refused: an existing target when asked, a file onto itself, a missing source, an
-    // existing or missing rename, a missing file to delete.
     const std::pair<std::function<void()>, const char*> refusals[] = {
         {[&] { CZYRFileSys::copy(name("a.txt"), name("b.txt"), true); }, "File copy failed"},
         {[&] { CZYRFileSys::copy(name("a.txt"), name("a.txt"), false); }, "File copy failed"},
@@ -377,9 +372,6 @@ TEST_F(FileOperationsTest, CopyRemoveRenameExistsAndEnumerate) {
                    "Directory enum failed");
     expectOpFailed([&] { CZYRFileSys::enumDirectory(CZYRFileName(""), ignored); },
                    "Directory create failed empty filename");
-}
-
-TEST_F(FileOperationsTest, MappedStreams) {
     const std::string path = fx_.dir_.file("mapped.bin");
     std::string content(10000, 'a');
     std::iota(content.begin(), content.end(), 'a');

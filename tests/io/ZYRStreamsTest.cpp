@@ -189,7 +189,8 @@ std::string randomBytes(size_t n, unsigned int seed, bool zeroRuns = false) {
     return out;
 }
 
-// Encodes through writes of `chunk` bytes (all at once for 0).
+// Encodes through writes of `chunk` bytes (all at once for 0), decodes through reads of
+// `step` bytes.
 template <class Encoder, class... Args>
 std::string encode(const std::string& bytes, size_t chunk, Args... args) {
     Stream out = sink();
@@ -214,7 +215,6 @@ std::string encodeHex(const std::string& bytes, const char* prefix = nullptr,
     return encode<CZYRStreamFilterASCIIHEX>(bytes, chunk, prefix, eod);
 }
 
-// Decodes through reads of `step` bytes, to cross every buffer boundary.
 template <class Decoder> std::string decode(const std::string& text, unsigned int step = 4096) {
     Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));
     std::string out;
@@ -237,8 +237,7 @@ std::string decodeHex(const std::string& text, unsigned int step = 4096) {
     return decode<CZYRStreamFilterASCIIHEXDecode>(text, step);
 }
 
-// The first decoding error of `text`, which the decoder keeps giving; `where` gets it with
-// the failure byte and offset.
+// The first decoding error of `text`, which stays; `where` gets it with byte and offset.
 template <class Decoder>
 CZYRError firstError(const std::string& text, std::string* where = nullptr) {
     Decoder decoder(CZYRSmartZYRRefPtr<IZYRStream>(source(text)));

@@ -211,9 +211,6 @@ TEST(CZYRDictTest, RandomRunMatchesAModel) {
     }
 }
 
-// Keys that each have a bucket of their own at both sizes enumerate in bucket order, which
-// shows how many buckets the table has.
-
 TEST(CZYRDictTest, FinalizeCloneBucketsCyclesAndNesting) {
     CZYRDict outer, inner, inList;
     CZYRArray list;

@@ -117,7 +117,7 @@ TEST(CZYRUniStringTest, ConstructionAndIcuAllocationFailure) {
     EXPECT_TRUE(!grown && growErr.getError() == ZYRPublic::kZYRErrorOutOfMemory);
 }
 
-TEST(CZYRUniStringTest, ConversionsReportTheLengthAndTerminate) {
+TEST(CZYRUniStringTest, ConversionsOrderConcatInterningAndPathForms) {
     const CZYRUniString abc = fresh("abc"), invalid;
     char buffer[10];
     // The full length even when it does not fit, nothing beyond the capacity, and up to four
@@ -156,10 +156,7 @@ TEST(CZYRUniStringTest, ConversionsReportTheLengthAndTerminate) {
     EXPECT_EQ(UniStringToWChar_t(CZYRUniString(u"\U0001F600"), wideBuffer), 2u);
     EXPECT_EQ(std::u16string(wideBuffer.data()), u"\U0001F600");
     EXPECT_EQ(UniStringToWString(CZYRUniString(u"x\u00e9")).str(), u"x\u00e9");
-}
-
-TEST(CZYRUniStringTest, OrderConcatInterningAndPathForms) {
-    const CZYRUniString a = fresh("a"), ab = fresh("ab"), ab2 = fresh("ab"), invalid;
+    const CZYRUniString a = fresh("a"), ab = fresh("ab"), ab2 = fresh("ab");
     EXPECT_TRUE(a < ab && a < ab.getImpl() && ab == ab2 && ab == ab2.getImpl() &&
                 invalid < invalid && ab.hashCode() == ab2.hashCode() && invalid.hashCode() == 0);
     EXPECT_FALSE(ab < a || ab < a.getImpl() || a == ab || a == ab.getImpl() || ab < ab2 ||
@@ -183,7 +180,7 @@ TEST(CZYRUniStringTest, OrderConcatInterningAndPathForms) {
                 CZYRUniString(u"some key").getImpl() == one.getImpl());
     EXPECT_EQ(CZYRUniString("MediaBox").getImpl(), GetCommonUniStrings()->str_MediaBox().get())
         << "rows of the table are shared with it";
-    C_Error err;
+    err.reset();
     EXPECT_TRUE(!UniStringToUTF16Path(CZYRUniString(""), err) && !err.errorOccurred());
     for (unsigned short* path :
          {UniStringToUTF16Path(CZYRUniString("/a/b"), err), ASCII2UTF16Path("/a/b", err)}) {

@@ -1,4 +1,3 @@
-// Dictionary printing, copying through enumeration, and the interface registry.
 #include <gtest/gtest.h>
 
 #include <algorithm>
