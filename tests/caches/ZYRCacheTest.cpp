@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 #include <cstring>
 #include <memory>
@@ -196,12 +197,18 @@ TEST(ZYRCacheTest, HeadTablesLongChainsRefusalsAndRelocation) {
             expectAssertion([&] { IZYRCache::hcRelocateEntry(from, to, bytes); }, kSource, 172);
         IZYRCache::hcRelocateEntry(&front, first, sizeof(Entry)); // back into pool memory
     }
-    TestCache nearlyFull(251, 1, 1); // 257 heads
-    nearlyFull.keepAll = true;
-    for (uint64_t i = 0; i < 251; ++i)
-        ASSERT_NE(nearlyFull.add(i * 257), nullptr);
-    EXPECT_EQ(nearlyFull.add(251 * 257, true), nullptr);
-    EXPECT_EQ(nearlyFull.GetCurrEntries(), 251);
+    // One chain kept whole: above 8 L only forced requests succeed, past 250 entries none.
+    for (const auto& [n, heads] : {std::pair{20u, 37u}, {251u, 257u}}) {
+        TestCache crowded(n, 1, 1);
+        crowded.keepAll = true;
+        for (uint64_t i = 0; i < n; ++i)
+            crowded.add(i * heads);
+        EXPECT_EQ(
+            (std::array<bool, 3>{!!crowded.add(n * heads, true), !!crowded.add((n + 1) * heads),
+                                 !!crowded.add((n + 2) * heads)}),
+            (std::array<bool, 3>{n < 250, true, false}))
+            << n;
+    }
 }
 
 // The cache's rules written out plainly over vectors of keys, front first.
@@ -433,8 +440,6 @@ TEST(ZYRCacheTest, RandomRunExhaustedPoolAndEveryAllocationFailing) {
         (void)cache.hcFreeCacheControl();
     });
 }
-
-// Beyond 250 entries in one chain that nobody lets go even a forced request fails.
 
 bool allZero(const unsigned char* p, unsigned int n) {
     return std::all_of(p, p + n, [](unsigned char c) { return c == 0; });

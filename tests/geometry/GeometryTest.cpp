@@ -203,7 +203,6 @@ TEST(CZYRRectTest, RectanglesAndResampling) {
     for (const CZYRRect& other : {CZYRRect(1.5, 0, 2, 1), CZYRRect(0, 1.001, 1, 2),
                                   CZYRRect(-2, 0, -0.5, 1), CZYRRect(0, -2, 1, -0.5)})
         EXPECT_FALSE(unit.touch(other) || other.touch(unit));
-    // Without area, an intersection collapses to zeros.
     for (const CZYRRect& other :
          {CZYRRect(1, 0, 2, 1), CZYRRect(0, 1, 1, 2), CZYRRect(5, 5, 6, 6)}) {
         CZYRRect edge = unit;
@@ -269,9 +268,8 @@ int32_t toFixed(float x) {
     return PFloatToFixed(&x);
 }
 
-// Signs and zeros, halves, one unit either side of each extreme, and past faults: products of
-// more than 53 bits and quotients near a half that a double would round the wrong way, and
-// 65535 * 65537 / 2 = 2^31 - 0.5 and 641 * 6700417 / 2 = 2^31 + 0.5.
+// Signs, halves, each extreme and its neighbours, and past faults: products over 53 bits, quotients
+// near a half, 65535 * 65537 / 2 = 2^31 - 0.5 and 641 * 6700417 / 2 = 2^31 + 0.5.
 constexpr int32_t kSpecial[] = {
     0,          1,          -1,         2,          3,           -5,         kOne,       -kOne,
     kOne + 1,   3 * kOne,   -3 * kOne,  0x18000,    kFrac,       -kFrac,     kFrac + 1,  kFrac - 1,

@@ -194,8 +194,7 @@ TEST_P(FileStreamTest, TemporaryFiles) {
     other->close();
     EXPECT_TRUE(path.starts_with(dir + "/zyr") && readFile(path) == "tmp" && !exists(otherPath));
     if (!GetParam()) {
-        // Natively: at most three characters of the prefix, six random ones and ".TMP"; with
-        // no prefix, one separator.
+        // Natively: three characters of the prefix at most, six random ones and ".TMP".
         EXPECT_EQ(path.substr(dir.size()), "/zyr" + path.substr(dir.size() + 4, 6) + ".TMP");
         EXPECT_EQ(otherPath.size() - dir.size(), 1u + 6 + 4);
         const CZYRFileName nowhere(fx_.dir_.file("no/such/dir").c_str());

@@ -127,7 +127,6 @@ TEST(ZYRStreamsTest, MemoryStreamMatchesAModelAndWrappersForward) {
     s->setPos(4);
     expectError([&] { s->write("", 0x10000, 0x10000 - 1); }, ZYRPublic::kZYRErrorInvalidData,
                 kPastEnd);
-    // The error-reporting forms report; success leaves the status alone.
     ZYRPublic::eZYRErrorType e1 = {}, e2 = {}, e3 = {};
     EXPECT_EQ(s->read(nullptr, 1, 1, e1) + s->write("abcde", 1, 5, e2), 0u);
     EXPECT_EQ(s->write("abcd", 1, 4, e3), 4u);

@@ -120,8 +120,7 @@ TEST(CZYRUniStringTest, ConstructionAndIcuAllocationFailure) {
 TEST(CZYRUniStringTest, ConversionsOrderConcatInterningAndPathForms) {
     const CZYRUniString abc = fresh("abc"), invalid;
     char buffer[10];
-    // The full length even when it does not fit, nothing beyond the capacity, and up to four
-    // zero bytes after the text.
+    // The full length even when it does not fit, and up to four zeros within the capacity.
     for (const auto& [capacity, text] :
          {std::pair{2u, std::string("abxx")}, {10u, std::string("abc\0\0\0\0x", 8)}}) {
         std::memset(buffer, 'x', sizeof buffer);

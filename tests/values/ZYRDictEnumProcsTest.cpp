@@ -115,7 +115,6 @@ TEST(ZYRDictEnumProcsTest, PrintingTracingAndTheInterfaceRegistry) {
                     registry.queryInterface(5) == second)
             << "the replaced item is deleted";
         EXPECT_THROW(registry.registerInterface(nullptr, nullptr, false), CZYRError);
-        // Copies share the table; clones own nothing.
         CZYRInterfaceRegistry copy = registry;
         copy.registerInterface(owned(2), ZYRRegisterInterfaceDefaultDeleteProc, false);
         EXPECT_TRUE(registry.getNumInterfaces() == 2 && registry.isShared());
