@@ -1,13 +1,6 @@
-// The setup-file parser: pairs, line rules, errors, sources, line numbers and the value
-// readers.
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <functional>
-#include <memory>
-#include <string>
-#include <tuple>
-#include <vector>
 
 #include "TestSupport.h"
 #include "ZYRHostKit.h"
@@ -20,8 +13,6 @@ using namespace ZYRStd;
 
 namespace {
 
-// A parse as "key=value|key=value", ending in "|!" when a missing value stopped it; the
-// lines of the pairs (and of the error) as "1,3,5".
 struct Parsed {
     std::string pairs;
     std::string lines;
@@ -45,7 +36,6 @@ private:
     unsigned int line_ = 0;
 };
 
-// A memory stream over a text that hands out at most `step` bytes a read.
 class TrickleStream : public ZYRFileSys::IImpZYRMemStream {
 public:
     TrickleStream(const std::string& text, unsigned int step)
@@ -64,7 +54,6 @@ private:
     unsigned int step_;
 };
 
-// Runs `parse` on a collector; a missing value ends it with the parser's own error.
 Parsed collect(const std::function<void(Collector&)>& parse) {
     Parsed out;
     Collector collector(out);
@@ -85,14 +74,12 @@ Parsed parseStream(const std::string& text, unsigned int step) {
     });
 }
 
-// Through ParseConfigData, as a host hands over its text or names its file.
 Parsed parseData(void* data, ZYRPublic::eZYRConfigDataType type, unsigned int size) {
     return collect([&](Collector& collector) {
         ParseConfigData(static_cast<unsigned char*>(data), type, size, collector);
     });
 }
 
-// Installs the host kit's file names and the native file system for memory and file streams.
 class ZYRConfigParserTest : public ::testing::Test {
 protected:
     void SetUp() override {
@@ -115,11 +102,6 @@ protected:
 
 } // namespace
 
-// Comments, empty lines and blanks; a third token ignored; runs of delimiters as one; a
-// comment mark inside a line is text; a missing value stops the parse after the earlier
-// pairs; 0xFF first on a line ends the text, inside one it is a byte; vertical tab and form
-// feed are blanks before a line only; a zero byte ends a line's text; a line of 1024 bytes
-// drops its next byte, of 1023 keeps it, and a line end right after 1024 ends the line.
 TEST_F(ZYRConfigParserTest, PairsOfTheFormat) {
     const std::string k(1000, 'K'), v22(22, 'V'), v23(23, 'V');
     const std::pair<std::string, std::string> cases[] = {
@@ -151,9 +133,6 @@ TEST_F(ZYRConfigParserTest, PairsOfTheFormat) {
     }
 }
 
-// LF, CR and CR LF each end a line, also when a read splits CR from LF; LF CR is two ends,
-// and so is CR blank LF; the rest of a cut line belongs to its line; the missing-value error
-// names its own line.
 TEST_F(ZYRConfigParserTest, LineEndsAndLineNumbers) {
     const std::string lf = "A=1\n\nB = 2\n# c\nC 3\n";
     std::string crlf, cr = lf;
@@ -198,8 +177,6 @@ TEST_F(ZYRConfigParserTest, DataTypesFilesAndTheirErrors) {
                       : "6: Invalid Config Data buffer (source/zyr/std/ZYRConfigParser:195)");
     EXPECT_EQ(error(text, 1, 3), "A=1") << "only `size` bytes are the text";
 
-    // Files by narrow (UTF-8) and wide path; a file that is not there is an error of the
-    // file system, not an empty setup.
     std::string path = dir_.file("setup \xc3\xa9.cfg"), missing = dir_.file("missing.cfg");
     zyrtest::writeFile(path, "Key1 = v1\r\n# note\r\nKey2\tv2\r\n");
     std::u16string widePath(dir_.path().begin(), dir_.path().end());

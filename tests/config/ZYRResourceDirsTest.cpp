@@ -1,9 +1,4 @@
-// Resource directories: the directory list with and without a fonts directory, reference
-// directories, the numbered cache list names, both forms, and failing allocations.
 #include <gtest/gtest.h>
-
-#include <string>
-#include <vector>
 
 #include "TestSupport.h"
 #include "zyr/std/config/ZYRResourceDirs.h"
@@ -28,7 +23,6 @@ std::u16string text(const CZYRUniString& s) {
     return std::u16string(wide.c_str(), wide.length());
 }
 
-// The first `count` entries as texts; frees the list and its entries.
 Texts take(unsigned short** list, unsigned int count) {
     Texts out;
     for (unsigned int i = 0; list && i < count; ++i) {
@@ -45,7 +39,6 @@ std::u16string take(unsigned short* path) {
     return out;
 }
 
-// Through the first form: the list (with `count` as it grew from `start`) and the cache file.
 struct Listed {
     Texts dirs;
     std::u16string cacheFile;
@@ -83,11 +76,9 @@ std::u16string numbered(int n) {
 
 } // namespace
 
-// One sequence: the directories and the list number are process-wide.
 TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     EXPECT_FALSE(ZYRFontCacheDirExist());
     EXPECT_EQ(text(ZYRGetFontCacheDir()), u"");
-    // Without fonts and cache directories: the relative directories, no cache file.
     const Listed plain = list(CZYRDict(), 5);
     EXPECT_EQ(plain.count, 8u) << "count grows by the entries stored";
     EXPECT_EQ(plain.dirs, kRelative) << "entries start at dirList[0]";
@@ -95,8 +86,6 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     ZYRSetZYRFontsDir(u"C:/R/");
     EXPECT_EQ(list(CZYRDict()).dirs, kUnderR);
 
-    // Reference directories: paths and file URLs, a null slot for a non-string, and what
-    // the URL conversion makes of an empty text (an empty path).
     ZYRSetFontCacheDir(u"/cache");
     EXPECT_TRUE(ZYRFontCacheDirExist());
     EXPECT_EQ(text(ZYRGetFontCacheDir()), u"/cache");
@@ -105,8 +94,6 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
                     {u"/usr/share/fonts", u"<null>", u"/tmp/a b", u"", u"C:/Fonts"});
     const Listed references = list(withReferences());
     EXPECT_EQ(references.dirs, expected);
-    // The numbering is process-wide and other tests may have drawn names already: the first
-    // names of a process are checked in a fresh one below.
     ASSERT_TRUE(
         zyrtest::startsWith(std::string(references.cacheFile.begin(), references.cacheFile.end()),
                             "/cache/OrmunFnt14_VELT_"));
@@ -118,7 +105,6 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     EXPECT_EQ(text(ZYRGetCommonCacheFile()), u"/cache/OrmunFnt14_com.lst");
     EXPECT_EQ(text(ZYRGetCmapCacheFile()), u"/cache/OrmunFnt14_Cmap.lst");
 
-    // The interface form: the count as its result, and four list names.
     unsigned short** dirs = nullptr;
     unsigned short** names = nullptr;
     ASSERT_EQ(ZYRSetDirListAndCacheFileList(C_SmartPtr<I_Dict>(withReferences()), dirs, names), 8);
@@ -127,7 +113,6 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
     EXPECT_EQ(take(names, 4), (Texts{numbered(first + 2), u"/cache/OrmunFnt14_sys.lst",
                                      u"/cache/OrmunFnt14_com.lst", u"/cache/OrmunFnt14_Cmap.lst"}));
 
-    // Null or empty texts unset the directories again.
     ZYRSetZYRFontsDir(u"");
     ZYRSetFontCacheDir(nullptr);
     EXPECT_FALSE(ZYRFontCacheDirExist());
@@ -140,7 +125,6 @@ TEST(ZYRResourceDirsTest, DirectoryListsAndCacheNames) {
 }
 
 TEST(ZYRResourceDirsTest, FirstCacheNamesOfAProcessAre1001And1002) {
-    // The death-test child runs only this statement, so its counter is untouched.
     EXPECT_EXIT(
         {
             ZYRSetFontCacheDir(u"/cache");
@@ -150,8 +134,6 @@ TEST(ZYRResourceDirsTest, FirstCacheNamesOfAProcessAre1001And1002) {
         ::testing::ExitedWithCode(0), "");
 }
 
-// Whichever allocation fails, the call either throws or hands out what it built, and
-// nothing is lost.
 TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
     zyrtest::FailingHost host;
     tZYRMemMgr record = host.record();
@@ -168,7 +150,6 @@ TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
             const std::string error = zyrtest::thrown(
                 [&] { ZYRSetDirListAndCacheFileList(options, dirs, cacheFile, count); });
             if (error != "no error") {
-                // Ours, or the error of an allocation it asked for.
                 EXPECT_TRUE(zyrtest::startsWith(error, "7: ")) << error;
                 own += error == "7: ZYRSetDirListAndCacheFileList out of memory "
                                 "(source/zyr/std/ZYRStartupOptions:970)";
@@ -195,7 +176,6 @@ TEST(ZYRResourceDirsTest, EveryAllocationMayFail) {
         EXPECT_GT(own, 0u);
         EXPECT_GT(failures, own);
 
-        // The interface form reports a failure as -1 and hands nothing out.
         unsigned short** dirs = nullptr;
         unsigned short** names = nullptr;
         host.failAll = true;

@@ -1,16 +1,8 @@
-// The start-up option store: every key through the host's start-up order to its getter,
-// the rules of the special keys, records, typed setters and the allocation front's options.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
-#include <limits>
-#include <map>
-#include <set>
-#include <sstream>
-#include <string>
-#include <vector>
 
 #include "TestSupport.h"
 #include "zyr/std/config/ZYRStartupOptions.h"
@@ -24,7 +16,6 @@ namespace {
 
 using Snapshot = std::map<std::string, std::string>;
 
-// Every printable option as the getters give it.
 Snapshot snapshot() {
     Snapshot values;
     for (const sZYRStartupOptionKey& row : kZYRStartupOptionKeys)
@@ -33,7 +24,6 @@ Snapshot snapshot() {
     return values;
 }
 
-// The keys whose printed value changed from `before` to now.
 std::set<std::string> changedSince(const Snapshot& before) {
     std::set<std::string> changed;
     for (const auto& [key, value] : snapshot())
@@ -42,9 +32,6 @@ std::set<std::string> changedSince(const Snapshot& before) {
     return changed;
 }
 
-// Values every key of a reading takes as they are ("value=shown"; no key of the reading
-// clamps them), ending on one that leaves the other keys' rules alone. Words and special
-// rules have tests of their own.
 const char* samplesFor(eZYRStartupReading reading) {
     switch (reading) {
     case eZYRStartupReading::kBool:
@@ -66,7 +53,6 @@ const char* samplesFor(eZYRStartupReading reading) {
     }
 }
 
-// Feeds one pair the way a host does and stores the records.
 struct Host {
     CZYRStartupOptionFeeder feeder;
     void feed(const char* key, const char* value) {
@@ -75,8 +61,6 @@ struct Host {
     }
 };
 
-// Runs `check` in a fresh process (the store is process-wide and never reset); a
-// non-empty result is the failure, printed for the parent to show.
 void inFreshProcess(std::string (*check)()) {
     EXPECT_EXIT(
         {
@@ -96,8 +80,6 @@ unsigned long long expectedDefaultRAM() {
 
 } // namespace
 
-// Each key, read by its rule, changes its own getter and nothing else; the key list holds
-// each key once.
 TEST(ZYRStartupOptionsTest, EveryKeyReachesItsGetter) {
     std::set<std::string> keys;
     for (const sZYRStartupOptionKey& row : kZYRStartupOptionKeys)
@@ -126,7 +108,6 @@ TEST(ZYRStartupOptionsTest, EveryKeyReachesItsGetter) {
     }
     EXPECT_GT(checked, 250u);
 
-    // Unknown and misspelt keys, and missing texts, change nothing.
     const Snapshot before = snapshot();
     for (const char* key : {"usenullgraphics", "UseNullGraphics ", "Unknown", ""})
         host.feed(key, "1");
@@ -135,11 +116,6 @@ TEST(ZYRStartupOptionsTest, EveryKeyReachesItsGetter) {
     EXPECT_TRUE(changedSince(before).empty());
 }
 
-// Fed in order, line by line: a key, then values, each with the printed value it gives
-// ("value=shown"), or that of another key ("value=Key:shown"). A stored overlap comes back
-// when single-threading ends; the copy-dot method is chosen by name only; GROption takes
-// its names and the numbers 0 to 2, anything else changes nothing; floats beyond the float
-// range are infinite.
 TEST(ZYRStartupOptionsTest, RulesOfSingleKeys) {
     constexpr const char* kSteps = R"(MaxCacheShades 3=10 10=10 11=11
         SingleThreadProcess false=false
@@ -229,7 +205,6 @@ TEST(ZYRStartupOptionsTest, DisplayListCacheRecord) {
     }
     EXPECT_TRUE(options.sharedCache);
 
-    // The record parser sets two store options, and a null record leaves the rest alone.
     for (const bool on : {false, true}) {
         ZYRParseDLCacheOptions(nullptr, "TileSuperCell", on ? "true" : "false");
         ZYRParseDLCacheOptions(nullptr, "RasterizeTilingPattern", on ? "1" : "0");
@@ -243,7 +218,6 @@ TEST(ZYRStartupOptionsTest, DisplayListCacheRecord) {
     EXPECT_EQ(ZYRGetDLCacheOptions().maxDisk, most);
 }
 
-// The store copies and the once-only budget flag are process state: look at them fresh.
 TEST(ZYRStartupOptionsTest, FreshProcessState) {
     inFreshProcess([]() -> std::string {
         const sMTOptions& mt = ZYRGetMTOptions();
@@ -262,7 +236,6 @@ TEST(ZYRStartupOptionsTest, FreshProcessState) {
         ZYRParseDLCacheOptions(&options, "XObjDLSharedCache", "1");
         return options.maxRAM == expectedDefaultRAM() ? "" : "the budget flag did not stay set";
     });
-    // The memory options reach the allocation front.
     inFreshProcess([]() -> std::string {
         ZYRParseMemoryOptions("MaxMemLimit", "100000000");
         if (ZYRGetMemLimit() != 419430400 || ZYRGetMemReserve() != 314572800)

@@ -1,10 +1,7 @@
-// Surface render attributes, raster device attributes, colorant order and stroke parameters.
 #include <gtest/gtest.h>
 
 #include <climits>
 #include <cmath>
-#include <functional>
-#include <tuple>
 
 #include "EngineFakes.h"
 #include "TestSupport.h"
@@ -24,8 +21,6 @@ CZYRColorantOrderArray colorants(int n) {
     return order;
 }
 
-// The device constructor's arguments, so that a case can change one of them. With the
-// third flag set, the component count need not match the colorants.
 struct Device {
     unsigned int components = 3, first = 8, fourth = 1, second = 1, third = 1;
     double xRes = 72.0, yRes = 144.0;
@@ -47,7 +42,6 @@ template <class I> void registerItem(CZYRInterfaceRegistry& registry, int id, I*
                                ZYRRegisterInterfaceDefaultDeleteProc, true);
 }
 
-// A registry of the raster and progress interfaces given (null ones are left out).
 struct Registry {
     CZYRInterfaceRegistry registry;
     Registry(Raster* raster, FakeProgress* progress) {
@@ -72,7 +66,6 @@ TEST(CZYRSurfaceRenderAttributesTest, DeviceValidationAndEquality) {
     EXPECT_STREQ(d.make().getColorantOrder().getEntry(3).name.c_str(), "Black");
     EXPECT_THROW(d.make().getColorantOrder().getEntry(4), CZYRError);
 
-    // Each argument takes part in the comparison on its own.
     const std::function<void(Device&)> changes[] = {
         [](auto& d) { d.components = 4; },
         [](auto& d) { d.first = 9; },
@@ -146,8 +139,6 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
     EXPECT_EQ(attempt(makeSurface(3, C_SmartPtr<ZYRPublic::I_Job>()), full),
               invalid("miss job", 46));
     EXPECT_EQ(attempt(C_SmartPtr<ZYRPublic::I_Surface>(), full), invalid("miss job", 46));
-    // An error recorded by a step of the walk is thrown at once, not when the step it broke
-    // is missed later.
     const auto fail = [](auto& link, auto& next) {
         link.failWith = ZYRPublic::kZYRErrorTypeCheck;
         next.reset();
@@ -179,13 +170,11 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
     EXPECT_TRUE(attrs.isFirstSurface() && attrs.isFrontSurface() && !attrs.isLastSurface() &&
                 !attrs.useDocumentTransfers() && attrs.trapInEmulatedColorSpace());
 
-    // Copies compare equal and hold their own references; the resource holder is ignored.
     const unsigned int before = raster->debugGetRefCount();
     CZYRSurfaceRenderAttributes copy(attrs);
     EXPECT_EQ(raster->debugGetRefCount(), before + 1);
     registerItem<ZYRPublic::I_OEMRasterInterface>(copy.getResourceHolder(), 5, raster.get());
     EXPECT_TRUE(copy == attrs);
-    // Each compared value on its own makes a difference.
     Device other;
     other.xRes = 1;
     const CZYRSurfaceRenderAttributes variants[] = {
@@ -201,7 +190,6 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
     };
     for (size_t i = 0; i < std::size(variants); ++i)
         EXPECT_FALSE(variants[i] == attrs) << "variant " << i;
-    // The same surface object with another identifier, then with another job.
     for (const bool otherJob : {false, true}) {
         surface->id = otherJob ? 77 : 78;
         if (otherJob)
@@ -254,7 +242,6 @@ TEST(CZYRSurfaceRenderAttributesTest, StrokeParams) {
     EXPECT_THROW(p.setDashedArray(dashes, -1), CZYRError);
     EXPECT_THROW(p.setDashedArray(nullptr, 2), CZYRError);
 
-    // Each compared value on its own makes a difference.
     CZYRStrokeParams base;
     base.setDashedArray(dashes, 3);
     const std::function<void(CZYRStrokeParams&)> changes[] = {
@@ -277,7 +264,6 @@ TEST(CZYRSurfaceRenderAttributesTest, StrokeParams) {
     b.setDashedArray(other, 0);
     EXPECT_TRUE(a == b) << "no dashes, nothing to compare";
 
-    // Copies own their dashes.
     base.setStrokeAdjust(true);
     CZYRStrokeParams copy(base), assigned;
     assigned = base;

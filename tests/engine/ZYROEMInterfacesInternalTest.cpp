@@ -1,7 +1,4 @@
-// The twelve job look-ups: references, the required rule and the two errors.
 #include <gtest/gtest.h>
-
-#include <type_traits>
 
 #include "EngineFakes.h"
 #include "TestSupport.h"
@@ -12,7 +9,6 @@ using namespace zyrtest;
 
 namespace {
 
-// Checks one look-up with the interface present and absent; `required` is the rule.
 template <class I, class Lookup>
 void checkLookup(const char* name, C_SmartPtr<I> FakeInterfaceSet::*slot, bool required,
                  Lookup lookup) {
@@ -35,7 +31,6 @@ void checkLookup(const char* name, C_SmartPtr<I> FakeInterfaceSet::*slot, bool r
     }
     EXPECT_EQ(held->debugGetRefCount(), 2u) << "the result gave its reference back";
 
-    // Absent, or "found" with nothing handed out: an error only when required.
     const auto absent = [&] {
         C_Error status;
         EXPECT_FALSE(lookup(job, status));

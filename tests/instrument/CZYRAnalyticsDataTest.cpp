@@ -1,4 +1,3 @@
-// Analytics records: enabled and disabled records, errors of set and finalize, the wrapper.
 #include <gtest/gtest.h>
 
 #include <optional>
@@ -13,7 +12,6 @@ using namespace ZYRPublic;
 
 namespace {
 
-// Sets the process's analytics setting for one test and puts it back afterwards.
 class ActiveSetting {
 public:
     explicit ActiveSetting(bool active) : saved_(ZYRIsAnalyticsActive()) {
@@ -25,7 +23,6 @@ private:
     bool saved_;
 };
 
-// An error up to its source line (the record's errors carry their own lines).
 std::string upToLine(const std::string& error) {
     return error.substr(0, error.rfind(':'));
 }
@@ -53,7 +50,6 @@ TEST(CZYRAnalyticsDataTest, DisabledRecordAcceptsAndDropsValues) {
     C_Error err;
     EXPECT_EQ(count(record.getImpl(), err), 0u);
     EXPECT_FALSE(err.errorOccurred());
-    // Nothing goes to a manager, so none is needed.
     record.finalize();
     EXPECT_TRUE(record.isFinalized());
     EXPECT_EQ(thrown([&] { record.set(CZYRUniString("Count"), 4u); }),
@@ -79,8 +75,6 @@ TEST(CZYRAnalyticsDataTest, EnabledRecordKeepsTypedValuesUntilFinalizeFails) {
     EXPECT_TRUE(CZYRUniString(name, false) == CZYRUniString("Acme"));
     EXPECT_FALSE(impl->get(CZYRUniString("Missing").getImpl(), &delta, err));
     EXPECT_FALSE(err.errorOccurred());
-    // The contents' type checks apply; a status that already holds an error makes every
-    // slot a no-op.
     EXPECT_FALSE(impl->get(CZYRUniString("Count").getImpl(), &time, err));
     EXPECT_EQ(err.getError(), kZYRErrorTypeCheck);
     EXPECT_EQ(count(impl, err), 0u);
@@ -88,7 +82,6 @@ TEST(CZYRAnalyticsDataTest, EnabledRecordKeepsTypedValuesUntilFinalizeFails) {
     C_Error fresh;
     EXPECT_FALSE(impl->get(CZYRUniString("Other").getImpl(), &delta, fresh));
 
-    // Without a manager, finalizing fails and leaves the record open.
     EXPECT_EQ(thrown([&] { record.finalize(); }),
               error(kZYRErrorInvalidFuncCall, "Analytics Manager not initialized"));
     EXPECT_FALSE(record.isFinalized());
@@ -128,7 +121,6 @@ TEST(CZYRAnalyticsDataTest, BadArgumentsAndInvalidWrappers) {
     EXPECT_EQ(thrown([&] { (void)invalid.isFinalized(); }), null);
     EXPECT_EQ(thrown([&] { (void)invalid.getUniqueID(); }), null);
 
-    // Copies share one record; each record has its own identity.
     CZYRAnalyticsData copy = record;
     EXPECT_EQ(copy.getImpl(), record.getImpl());
     EXPECT_EQ(record.getImpl()->debugGetRefCount(), 2u);

@@ -1,10 +1,6 @@
-// The telemetry session logger against a recording telemetry library: each call and its
-// arguments for every group, document facts, errors, events, surfaces and the session folder.
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <string>
-#include <vector>
 
 #include "RecordingKelvrin.h"
 #include "TestSupport.h"
@@ -25,8 +21,6 @@ std::u16string wide(const std::string& s) {
     return std::u16string(s.begin(), s.end());
 }
 
-// The recorder's calls for the entries "key,value" of group `id`, after the group's creation
-// when it has a `name` (and a `label`, when not the name).
 Calls group(int id, const char* name, std::initializer_list<const char*> entries,
             const char* label = nullptr) {
     const std::string number = std::to_string(id);
@@ -49,7 +43,6 @@ std::u16string drainErrorStack() {
     return CZYRErrorStk().getErrorMessage(text) ? text : u"";
 }
 
-// An enabled record (or a dictionary) of group `group` with the given key and value pairs.
 template <class R> void setPairs(R&) {}
 template <class R, class Value, class... Rest>
 void setPairs(R& r, const char* key, Value value, Rest... rest) {
@@ -76,7 +69,6 @@ protected:
         ZYRSetAnalyticsActive(false);
         (void)recorder.take();
     }
-    // An active session in a fresh folder, with the start-up calls taken.
     void start() {
         ASSERT_TRUE(Farlamp::StartSession(true, wide(dir.path()).c_str()));
         ASSERT_TRUE(Farlamp::LoggingEnabled());
@@ -90,7 +82,6 @@ protected:
 } // namespace
 
 TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
-    // A missing folder is created and probed; the probe file does not stay.
     const std::string fresh = dir.file("logs");
     ASSERT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str()));
     EXPECT_TRUE(std::filesystem::is_directory(fresh));
@@ -101,8 +92,6 @@ TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
     EXPECT_EQ(recorder.take(), Calls{});
     EXPECT_EQ(drainErrorStack(), u"");
 
-    // A folder that cannot be made (under a plain file), or a plain file: the default folder,
-    // with a report; an empty folder name: the default folder.
     zyrtest::writeFile(dir.file("plain"), "x");
     const std::string kDefault = "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,,./AnalyticsLogs)";
     for (const std::string& folder :
@@ -115,7 +104,6 @@ TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
                   folder.empty() ? u"" : u" Default directory was used to store analytics logs \n");
     }
 
-    // An inactive session goes to the default folder, with logging off.
     Farlamp::CloseSession();
     (void)recorder.take();
     ASSERT_TRUE(Farlamp::StartSession(false, wide(fresh).c_str()));
@@ -132,7 +120,6 @@ TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
     Farlamp::CloseSession();
     EXPECT_EQ(recorder.take(), Calls{"UTCloseSession()"}) << "nothing logged while off";
 
-    // A library that refuses the session: no session, logging off.
     recorder.refuseSessions(true);
     EXPECT_FALSE(Farlamp::StartSession(true, wide(fresh).c_str()));
     EXPECT_FALSE(Farlamp::LoggingEnabled());
@@ -159,7 +146,6 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
     Farlamp::LogDataObject(raster);
     const auto dl = record("DLCacheInfo", "NumLargeDLs", 1u);
     Farlamp::LogDataObject(dl);
-    // Records without a known group name are not logged.
     Farlamp::LogDataObject(record("NoSuchGroup"));
     Farlamp::LogDataObject(record(nullptr));
     Farlamp::LogDataObject(C_SmartPtr<I_AnalyticsData>());
@@ -176,24 +162,20 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
                   group(104, "ErrorInfo", {"Area,PDF", "Type,kZYRErrorPDF", "Parameter1,page 3"}) +
                   group(105, "JobInfo",
                         {"SurfaceCount,2", "TotalMediaSize,1.5", "ErrorOccured,n\xc3\xa9"}) +
-                  // The cache groups add to the job's group.
                   group(105, nullptr,
                         {"NumSmallRasters,5", "RasterDiskCachingEnabled,0", "NumLargeDLs,1"}));
 
-    // The job's start time gives its completion time; the next job gets a new group.
     Farlamp::LogEvent(kZYRAnalyticsEventHasTransparency, false);
     Farlamp::FlushJob(12.345);
     EXPECT_EQ(recorder.take(),
               group(105, nullptr, {"CompletionTime,2.35", "HasTrapping,0", "HasTransparency,1"}));
     Farlamp::LogDataObject(job);
     EXPECT_EQ(recorder.take().front(), "UTNewDataGroup(JobInfo,,JobInfo)=106");
-    // A product mode other than 0 and 2 keeps the cache groups out.
     Farlamp::LogDataObject(record("ProductInfo", "xobjMode", 1u));
     Farlamp::LogDataObject(raster);
     Farlamp::LogDataObject(dl);
     EXPECT_EQ(recorder.take(), group(100, nullptr, {"xobjMode,1"}))
         << "the product group is reused";
-    // The product group exists, so closing adds no placeholder.
     Farlamp::CloseSession();
     EXPECT_EQ(recorder.take(), Calls{"UTCloseSession()"});
 }
@@ -229,7 +211,6 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
     Farlamp::LogZYRError(static_cast<eZYRErrorType>(35), nullptr, nullptr);
     EXPECT_EQ(recorder.take()[2], "UTAddToGroup(104,Type,kZYRErrorModuleNotInitialized)");
     EXPECT_EQ(drainErrorStack(), u"");
-    // A type without a name is reported on the error stack and logged as its number.
     int id = 105;
     for (const int type : {2, 36}) {
         Farlamp::LogZYRError(static_cast<eZYRErrorType>(type), "Area", nullptr);
@@ -238,7 +219,6 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
                   "UTAddToGroup(" + std::to_string(id++) + ",Type," + std::to_string(type) + ")");
     }
 
-    // Never created, the product group gets placeholders when the session closes.
     Farlamp::CloseSession();
     EXPECT_EQ(recorder.take(), group(107, "ProductInfo",
                                      {"OEMName,NoData", "OEMModelName,NoData", "NumDevices,NoData",
@@ -300,15 +280,11 @@ TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
                     {"Surface Resolution,1000X500", "Placed Objects,0", "count,1"}, "Surface"));
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take(), Calls{}) << "a flushed run is not logged again";
-    // Extents beyond the printed range are clamped rather than converted.
     surface(1e300, -1e300, 1);
     Farlamp::FlushJob(0);
     EXPECT_EQ(recorder.take().at(1), "UTAddToGroup(102,Surface Resolution,2147483647X-2147483648)");
 }
 
-// A library that lacks an entry point is not used, and no other is looked for in its place:
-// the logger does nothing. Run in a child process, where the incomplete library is the first
-// one named libKelvrin.so.
 TEST(FarlampLibraryTest, IncompleteLibraryLeavesTheLoggerIdle) {
     EXPECT_EXIT(
         {

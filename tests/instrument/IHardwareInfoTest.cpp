@@ -1,14 +1,7 @@
-// Hardware information: the five reports, and the Linux query source over a prepared /proc,
-// /sys and /etc tree.
 #include <gtest/gtest.h>
 
 #include <cstring>
 #include <filesystem>
-#include <memory>
-#include <sstream>
-#include <string>
-#include <tuple>
-#include <vector>
 
 #include "TestSupport.h"
 #include "zyr/std/instrument/IHardwareInfo.h"
@@ -30,7 +23,6 @@ template <std::size_t N> void setText(char16_t (&field)[N], const std::u16string
     std::memcpy(field, text.data(), std::min(text.size(), N) * sizeof(char16_t));
 }
 
-// Writes `bytes` to `relative` below `root`, making the directories.
 void put(const std::string& root, const std::string& relative, const std::string& bytes) {
     const fs::path path = fs::path(root) / relative;
     fs::create_directories(path.parent_path());
@@ -45,8 +37,6 @@ void disk(const std::string& root, const std::string& dir, const std::string& mo
     put(root, dir + "/removable", std::string(removable) + "\n");
 }
 
-// An SMBIOS memory device (type 17): the size word, the speed, and for 0x7FFF the extended
-// size in MB; a locator string follows.
 std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB = 0) {
     std::string entry(0x28, '\0');
     entry[0] = 17;
@@ -59,14 +49,12 @@ std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB 
     return entry + std::string("DIMM A\0\0", 8);
 }
 
-// A type-4 entry, 8 GiB, an empty slot, 32 GiB as extended size, 512 KiB in KB, the end.
 std::string dmiTable() {
     return std::string("\4\10\0\0\0\0\0\0\0\0", 10) + memoryDevice(8192, 3200) +
            memoryDevice(0, 0) + memoryDevice(0x7FFF, 2666, 32768) + memoryDevice(0x8000 | 512, 0) +
            std::string("\177\4\0\0\0\0", 6);
 }
 
-// Four processors in two packages with their caches, the system, memory, load and disks.
 void buildMachine(const std::string& root) {
     static const char* const kCacheFiles[] = {"level", "type", "size", "shared_cpu_list"};
     std::string cpuinfo;
@@ -102,7 +90,6 @@ void buildMachine(const std::string& root) {
     put(root, "proc/stat",
         "cpu  100 0 100 800 0 0 0 0 0 0\ncpu0 50 0 50 400 0 0 0 0 0 0\n"
         "cpu1 50 0 50 400 0 0 0 0 0 0\nintr 1 2 3\n");
-    // Hard disks by name; no drives, whatever they look like; an optical drive and a stick.
     for (const auto& [name, model, sectors] : {std::tuple{"sda", "Samsung SSD 860", 1953525168ull},
                                                {"nvme0n1", "WDC PC SN730", 1000215216ull},
                                                {"hda", "Old IDE", 2097152ull},
@@ -117,7 +104,6 @@ void buildMachine(const std::string& root) {
     put(root, "sys/block/dm-0/size", "100\n"); // mapped: no device of its own
 }
 
-// The five reports of the records, and the processor count the system report returns.
 std::wstring printAll(IHardwareInfo& info, const HardwareInfoRec* rec, const PerformanceRec* perf) {
     std::wostringstream out;
     info.printMemoryInfo(rec, out);
@@ -155,7 +141,6 @@ TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
     rec->numberOfProcessors = 1;
     HardwareProcessorEntry& cpu = rec->processors[0];
     cpu = {{}, 1200, 100, 512, 0, 8192, 0, {}, 4000, {}, 4, 8, {}};
-    // Pairs of surrogates reach the stream whole, also first in a field.
     setText(cpu.caption, u"\U0001F600 Family 6");
     setText(cpu.manufacturer, u"GenuineIntel");
     setText(cpu.name, u"Xeon \u00e9 \U0001F600");
@@ -176,7 +161,6 @@ TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
               L"\tCPU Performance\n\t\tCPU: 37% busy\n\t\tCore 1 : 12 % busy\n"
               L"\t\tCore 2 : 100 % busy\n|1");
 
-    // A record filled by someone else never makes the printing read past its entries.
     rec->numberOfMemoryModules = rec->numberOfProcessors = rec->numberOfDisks = 1000;
     perf->numberOfCores = 100000;
     const std::wstring over = printAll(*info, rec.get(), perf.get());
@@ -196,8 +180,6 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
     ASSERT_TRUE(info->getProcessorAndOSInfo(rec.get()));
     EXPECT_TRUE(rec->reserved1[0] == 0 && rec->numberOfDisks == 0);
     EXPECT_EQ(std::u16string(rec->computerName), u"printhost");
-    // One processor per package; private caches add up, a shared one counts once; cpufreq
-    // when it is there, else "cpu MHz".
     std::wstring processor = L"\tProcessor 1\n\t\tCaption: x86_64 Family 6 Model 158 Stepping 9\n"
                              L"\t\tCurrentClockSpeed: 1200 Mhz\n\t\tExtClock: 0 MHz\n"
                              L"\t\tL2CacheSize: 512 KB\n\t\tL3CacheSize: 8192 KB\n"
@@ -213,14 +195,12 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
                          L"\t\tCSDVersion: 6.1.0-13-amd64\n" +
                              processor + second);
 
-    // Memory modules from SMBIOS: the empty slot is no module.
     ASSERT_TRUE(info->getMemoryInfo(rec.get()));
     ASSERT_EQ(rec->numberOfMemoryModules, 3u);
     EXPECT_TRUE(rec->memory[0].capacity == 8192ull << 20 && rec->memory[0].speed == 3200);
     EXPECT_TRUE(rec->memory[1].capacity == 32768ull << 20 && rec->memory[1].speed == 2666);
     EXPECT_EQ(rec->memory[2].capacity, 512ull << 10);
 
-    // Only hard disks with a device of their own, in name order, at most six.
     ASSERT_TRUE(info->getDiskInfo(rec.get()));
     std::wostringstream disks;
     info->printDiskInfo(rec.get(), disks);
@@ -244,8 +224,6 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
     buildMachine(root.path());
     const auto info = infoFor(root.path());
     const auto rec = zeroed<HardwareInfoRec>();
-    // Texts are cut to their fields with the terminating zero, never inside a pair of
-    // surrogates; bytes that are no UTF-8 become U+FFFD.
     const struct {
         std::string vendor;
         std::u16string manufacturer;
@@ -253,8 +231,6 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
         {"Caf\xc3\xa9 \xf0\x9f\x98\x80 Chips Incorporated", u"Caf\u00e9 \U0001F600 Chips Incor"},
         {"123456789012345678\xf0\x9f\x98\x80", u"123456789012345678"},
         {"a\xff\xc3(\xe2\x82", u"a\uFFFD\uFFFD(\uFFFD\uFFFD"},
-        // U+D7FF and U+E000 around the surrogates, which are refused; U+10FFFF is
-        // the last code point.
         {"\xed\x9f\xbf\xed\xa0\x80\xed\xbf\xbf\xee\x80\x80\xf4\x8f\xbf\xbf\xf4\x90\x80\x80",
          u"\uD7FF\uFFFD\uFFFD\uFFFD\uFFFD\uFFFD\uFFFD\uE000\U0010FFFF\uFFFD\uFFFD\uFFFD\uFFFD"}};
     for (const auto& v : vendors) {
@@ -267,7 +243,6 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
         EXPECT_EQ(rec->processors[0].numberOfCores, 1u) << "one per processor without cpu cores";
     }
 
-    // A cut-off SMBIOS table ends the walk without reading past it; without one, MemTotal.
     put(root.path(), "sys/firmware/dmi/tables/DMI", dmiTable().substr(0, 70));
     ASSERT_TRUE(info->getMemoryInfo(rec.get()));
     EXPECT_TRUE(rec->numberOfMemoryModules == 1 && rec->memory[0].capacity == 8192ull << 20);
@@ -276,7 +251,6 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
     EXPECT_TRUE(rec->numberOfMemoryModules == 1 && rec->memory[0].capacity == 16303520ull * 1024 &&
                 rec->memory[0].speed == 0);
 
-    // Processors without an operating-system description: false, the processors stay.
     fs::remove_all(root.path() + "/etc");
     EXPECT_FALSE(info->getProcessorAndOSInfo(rec.get()));
     EXPECT_EQ(rec->numberOfProcessors, 1u);
@@ -293,7 +267,6 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
     EXPECT_FALSE(info->getMemoryInfo(nullptr) || info->getProcessorAndOSInfo(nullptr) ||
                  info->getDiskInfo(nullptr) || info->getMemoryPerformance(nullptr) ||
                  info->getCPUPerformance(nullptr));
-    // The object is allocated through the front, and its failure is a null result.
     zyrtest::FailingHost host;
     host.failAll = true;
     ZYRStd::tZYRMemMgr record = host.record();
@@ -307,7 +280,6 @@ TEST(IHardwareInfoTest, PerformanceFromMeminfoAndTwoStatSamples) {
     const zyrtest::TempDir root;
     buildMachine(root.path());
     ZYRHardwareQuerySource source(root.path() + "//");
-    // Between the samples: cpu0 works 30 of 100 ticks, cpu1 90 of 100 (iowait counts idle).
     source.setBetweenSamples([&] {
         put(root.path(), "proc/stat",
             "cpu  220 0 100 860 20 0 0 0 0 0\n"
@@ -331,7 +303,6 @@ TEST(IHardwareInfoTest, PerformanceFromMeminfoAndTwoStatSamples) {
     EXPECT_FALSE(source.run("SELECT Name FROM Win32_Processor", rows));
     EXPECT_TRUE(rows.empty());
 
-    // Through the interface, with an unchanged /proc/stat: no time passed, nothing busy.
     const auto info = infoFor(root.path());
     auto perf = zeroed<PerformanceRec>();
     ASSERT_TRUE(info->getCPUPerformance(perf.get()));

@@ -1,10 +1,6 @@
-// The analytics manager: start-up against the telemetry session, logging in enqueue order on
-// its own thread, termination, and producers that never wait for a slow telemetry library.
 #include <gtest/gtest.h>
 
-#include <string>
 #include <thread>
-#include <vector>
 
 #include "RecordingKelvrin.h"
 #include "TestSupport.h"
@@ -32,13 +28,11 @@ protected:
         ZYRSetAnalyticsLogFolder(nullptr);
         (void)recorder.take();
     }
-    // An active manager, with the start-up calls taken.
     void start() {
         ZYRSetAnalyticsActive(true);
         ASSERT_TRUE(ZYRAnalyticsManagerInit() && ZYRIsAnalyticsActive());
         (void)recorder.take();
     }
-    // Finalizes a drip-session record whose "NumWorkers" is `n`; its error, if any.
     static std::string produce(unsigned int n) {
         CZYRAnalyticsData record;
         record.set(CZYRUniString("DataGroupName"), CZYRUniString("DripSessionInfo"));
@@ -56,7 +50,6 @@ protected:
 } // namespace
 
 TEST_F(IImpZYRAnalyticsManagerTest, InitFollowsTheSession) {
-    // Inactive: the session still starts (recording nothing); records stay disabled.
     ZYRSetAnalyticsActive(false);
     EXPECT_TRUE(ZYRAnalyticsManagerInit());
     IZYRAnalyticsManager* const first = GetZYRAnalyticsManager();
@@ -70,12 +63,10 @@ TEST_F(IImpZYRAnalyticsManagerTest, InitFollowsTheSession) {
                                       "UTCloseSession()"}));
     EXPECT_FALSE(ZYREnqueueAnalyticsRecord(C_SmartPtr<ZYRPublic::I_AnalyticsData>()));
 
-    // A session that cannot start leaves analytics inactive and no manager.
     recorder.refuseSessions(true);
     ZYRSetAnalyticsActive(true);
     EXPECT_TRUE(ZYRAnalyticsManagerInit());
     EXPECT_TRUE(!GetZYRAnalyticsManager() && !ZYRIsAnalyticsActive() && !Farlamp::LoggingEnabled());
-    // Term without a manager only closes the session.
     (void)recorder.take();
     EXPECT_TRUE(ZYRAnalyticsManagerTerm() && ZYRAnalyticsManagerTerm());
     EXPECT_EQ(recorder.take(), Calls{});
@@ -101,11 +92,9 @@ TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) 
     const int startedBefore = recorder.callsStarted();
     for (unsigned int i = 0; i < 5; ++i)
         produce(i);
-    // The worker is inside the first record's first call when termination begins.
     while (recorder.callsStarted() == startedBefore)
         std::this_thread::yield();
     std::thread terminator([] { ZYRAnalyticsManagerTerm(); });
-    // Records finalized while the manager terminates fail with the enqueue error.
     std::string error;
     for (unsigned int i = 0; error == "no error" || error.empty(); ++i)
         error = produce(i);
@@ -114,7 +103,6 @@ TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) 
                                            "called. (source/zyr/std/IImpZYRAnalyticsManager:"))
         << error;
     EXPECT_EQ(GetZYRAnalyticsManager(), nullptr);
-    // Only the record the worker was logging got through; the session was closed after it.
     EXPECT_EQ(
         recorder.take(),
         (Calls{"UTNewDataGroup(DripSessionInfo,,DripSessionInfo)=100",
@@ -126,8 +114,6 @@ TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) 
 
 TEST_F(IImpZYRAnalyticsManagerTest, ProducersNeverWaitForASleepingLibrary) {
     start();
-    // Each telemetry call sleeps a second before it is recorded: a producer that waited for
-    // logging would find a recorded call when its finalize returned.
     recorder.setDelay(1000);
     std::thread producer([] {
         for (unsigned int i = 0; i < 20; ++i)

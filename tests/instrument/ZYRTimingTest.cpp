@@ -1,10 +1,7 @@
-// Timing: calibration, accumulators, nested stop watches, the named list and the
-// measurement lines.
 #include <gtest/gtest.h>
 
 #include <chrono>
 #include <regex>
-#include <string>
 
 #include "zyr/std/instrument/ZYRTimingManager.h"
 
@@ -24,12 +21,10 @@ double secondsSince(std::chrono::steady_clock::time_point start) {
 TEST(ZYRTimingTest, CalibrationAndMeasurementLines) {
     calibrateOnce();
     const long long perSec = ZYRTimingManager::GetClocksPerSec();
-    // A processor of this century ticks at 0.1 to 10 GHz; the monotonic clock counts ns.
     EXPECT_TRUE(ZYRTimingManager::UsesTimeStampCounter()
                     ? perSec > 100000000LL && perSec < 10000000000LL
                     : perSec == 1000000000LL)
         << perSec;
-    // A stop watch costs well under a millisecond.
     EXPECT_TRUE(ZYRTimingManager::GetAvgInnerConstructTime() >= 0 &&
                 ZYRTimingManager::GetAvgInnerConstructTime() < perSec / 1000 &&
                 ZYRTimingManager::GetAvgOuterConstructTime() < perSec / 1000);
@@ -50,8 +45,6 @@ TEST(ZYRTimingTest, CalibrationAndMeasurementLines) {
         << "measured once";
 }
 
-// Passes add their time in seconds; recursive passes on one accumulator count as calls,
-// but only the outermost adds its time; another accumulator has its own nesting.
 TEST(ZYRTimingTest, StopWatchesAddTheOutermostPasses) {
     calibrateOnce();
     ZYRTimeAccumulator acc("", __FILE__, __LINE__), other("", __FILE__, __LINE__);
@@ -82,7 +75,6 @@ TEST(ZYRTimingTest, StopWatchesAddTheOutermostPasses) {
     }
     const double outside = secondsSince(start);
     EXPECT_EQ(acc.GetTotalCalls(), 5);
-    // Counted once: 30 ms; counted per pass it would be 60 ms, more than passed outside.
     const double added = static_cast<double>(acc.GetTotalTicks() - before) /
                          static_cast<double>(ZYRTimingManager::GetClocksPerSec());
     EXPECT_TRUE(added >= 0.029 && added <= outside + 0.002) << added << " of " << outside;
@@ -119,7 +111,6 @@ TEST(ZYRTimingTest, NamedAccumulatorsAreListedInOrderAndLeaveOnDestruction) {
     EXPECT_EQ(countNamed(&kept), 1u);
     ZYRTimingManager::Terminate();
     EXPECT_EQ(ZYRTimingManager::GetNamedAccumulatorCount(), 0u);
-    // Destroying an accumulator the list no longer holds is harmless.
 }
 
 TEST(ZYRTimingTest, ClockSleepAndCounter) {

@@ -1,5 +1,3 @@
-// A small engine of the tests' own: a job, its interface set, a progress interface that
-// records what it is sent, and the chain from a surface to its job.
 #pragma once
 
 #include <string>
@@ -21,15 +19,12 @@ using ZYRPublic::I_Error;
 
 template <class Interface> using RefCounted = ZYRHostKit::Counted<Interface>;
 
-// A new object with its creator's reference adopted.
 template <class T, class... Args> C_SmartPtr<T> make(Args&&... args) {
     return C_SmartPtr<T>(new T(std::forward<Args>(args)...), false);
 }
 
 template <class Interface> class FakeOEM : public RefCounted<Interface> {};
 
-// An object that hands out others; `failWith` makes its getters record that error (and
-// still hand out what they hold).
 template <class Interface> class FakeHolder : public RefCounted<Interface> {
 public:
     eZYRErrorType failWith = ZYRPublic::kZYRErrorNoError;
@@ -44,7 +39,6 @@ protected:
     }
 };
 
-// The tests' texts are ASCII; a null string is empty.
 inline std::string utf8(ZYRPublic::I_UniString* s) {
     unsigned int bytes = 0;
     const char* buffer = s ? s->getUTF16LEBuffer(&bytes) : nullptr;
@@ -54,8 +48,6 @@ inline std::string utf8(ZYRPublic::I_UniString* s) {
     return out;
 }
 
-// Records each call as one line: "whole Area/Category L3: text", "begin ...", "text: ..."
-// or "end". `failWith` makes each call record that error; `throwForeign` throws an int.
 class FakeProgress : public RefCounted<ZYRPublic::I_OEMProgressInterface> {
 public:
     using Msg = ZYRPublic::sZYRTraceMsg;
@@ -97,7 +89,6 @@ private:
     }
 };
 
-// Each getter hands out what its member holds; a null member means "not there".
 class FakeInterfaceSet : public RefCounted<ZYRPublic::I_OEMInterfaceSet> {
 public:
 #define ZYRTEST_SLOT(Name, member)                                                                 \
@@ -167,7 +158,6 @@ public:
     }
 };
 
-// A job with a progress interface and the given parameters; `progress` receives the fake.
 inline C_SmartPtr<ZYRPublic::I_Job> makeJob(const ZYRStd::CZYRDict& params,
                                             FakeProgress** progress = nullptr) {
     auto set = make<FakeInterfaceSet>();
@@ -181,8 +171,6 @@ inline C_SmartPtr<ZYRPublic::I_Job> makeJob(const ZYRStd::CZYRDict& params,
     return job;
 }
 
-// A surface whose owner, parent and job are all there; `job` may be null to break the walk.
-// (C_SmartPtr converts to any pointer type: name the interface where overloads differ.)
 inline C_SmartPtr<FakeSurface> makeSurface(uint64_t id, const C_SmartPtr<ZYRPublic::I_Job>& job) {
     auto surface = make<FakeSurface>();
     surface->id = id;

@@ -1,5 +1,3 @@
-// A telemetry library for the tests: it records every call with its arguments as one line
-// of text, and can be told to sleep in each call or to refuse sessions.
 #include <atomic>
 #include <chrono>
 #include <mutex>
@@ -40,7 +38,6 @@ void record(std::string call) {
 
 extern "C" {
 
-// The test side: take the recorded calls (and forget them), and set the behaviour.
 KELVRIN_API void RecordingTakeCalls(std::vector<std::string>& out) {
     const std::lock_guard guard(callsLock);
     out = std::exchange(calls, {});

@@ -1,5 +1,3 @@
-// The tests' side of the recording telemetry library: loads it once by path, so that the
-// logger's dlopen("libKelvrin.so") finds it by its internal name instead of ours.
 #pragma once
 
 #include <dlfcn.h>
@@ -14,13 +12,11 @@ namespace zyrtest {
 
 class RecordingKelvrin {
 public:
-    // The process-wide instance; the library stays loaded until the process ends.
     static RecordingKelvrin& get() {
         static RecordingKelvrin instance;
         return instance;
     }
 
-    // The calls recorded since the last take, one line each, e.g. "UTAddToGroup(100,k,v)".
     std::vector<std::string> take() {
         std::vector<std::string> calls;
         take_(calls);
@@ -29,7 +25,6 @@ public:
     void setDelay(int ms) { setDelay_(ms); } // each call sleeps this long before it is recorded
     void refuseSessions(bool refuse) { refuse_(refuse); }
     int callsStarted() { return started_(); }
-    // Waits (up to 10 s) until `count` calls were recorded since the last take.
     std::vector<std::string> waitFor(size_t count) {
         std::vector<std::string> all;
         for (int i = 0; i < 10000 && all.size() < count; ++i) {

@@ -1,5 +1,3 @@
-// Test entry point: every suite starts with the C runtime heap behind the front and the
-// shared string tables built, as a host would set them up.
 #include <gtest/gtest.h>
 
 #include "TestSupport.h"
@@ -7,7 +5,6 @@
 
 int main(int argc, char** argv) {
     ::testing::InitGoogleTest(&argc, argv);
-    // Death tests fork; "threadsafe" re-executes so that threads started earlier are safe.
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     zyrtest::installFront(0);
     ZYRStd::InitCommonUniStrings();

@@ -1,4 +1,3 @@
-// Helpers shared by the test suites.
 #include "TestSupport.h"
 #include "ZYRHostKit.h"
 

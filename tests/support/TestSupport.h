@@ -1,4 +1,3 @@
-// Helpers shared by the test suites: a host memory record and temporary directories.
 #pragma once
 
 #include <cstddef>
@@ -9,9 +8,7 @@
 
 namespace zyrtest {
 
-// A host allocator over malloc that can be told to fail.
 struct FailingHost {
-    // Calls (counting from 1) to fail: every n-th, or all once `failAll` is set.
     unsigned int failEvery = 0;
     unsigned int failAt = 0; // one given call
     bool failAll = false;
@@ -20,16 +17,12 @@ struct FailingHost {
     ZYRStd::tZYRMemMgr record();
 };
 
-// Installs a host record (C runtime by default) with the given statistics level and a
-// generous limit; restores "ZYR_MEMORY_STAT" afterwards.
 void installFront(int statLevel, ZYRStd::tZYRMemMgr* host = nullptr);
 
-// An error as "type: message (file:line)", so that one check compares all four.
 std::string describe(int type, const char* message, const char* file, int line);
 template <class Error> std::string describe(const Error& e) {
     return describe(e.getError(), e.getMessage(), e.getSrcFileName(), e.getSrcLineNumber());
 }
-// The CZYRError that `call` throws, described; "no error" when it returns.
 template <class Call> std::string thrown(Call&& call) {
     try {
         call();
@@ -52,12 +45,9 @@ struct Outcome {
     std::string err;
 };
 
-// Runs `program args...` (searched in PATH) with standard input from `input`; both output
-// streams go through files in `dir`, so that neither pipe can fill up and block.
 Outcome runProgram(const std::string& program, const std::vector<std::string>& args,
                    const TempDir& dir, const std::string& input = "/dev/null");
 
-// A fresh directory under the system's temporary directory, removed by the destructor.
 class TempDir {
 public:
     TempDir();

@@ -1,5 +1,3 @@
-// Our telemetry library: the JSON Lines session file, opt-in, and the whole road from an
-// analytics record through the manager and the logger into the file.
 #include <gtest/gtest.h>
 
 #include <dlfcn.h>
@@ -7,9 +5,7 @@
 #include <chrono>
 #include <filesystem>
 #include <fstream>
-#include <string>
 #include <thread>
-#include <vector>
 
 #include <nlohmann/json.hpp>
 
@@ -24,7 +20,6 @@ using Lines = std::vector<std::string>;
 
 namespace {
 
-// The session files of `folder`, each as its lines without their times.
 std::vector<Lines> sessions(const std::string& folder) {
     std::vector<Lines> out;
     for (const auto& entry : std::filesystem::directory_iterator(folder)) {
@@ -59,7 +54,6 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     zyrtest::TempDir dir;
     const std::string folder = dir.file("deep/logs");
 
-    // Opted out: a session that records nothing and makes no file.
     setOptIn(0);
     Kelvrin* session = nullptr;
     start(session, "Print", "P", "1.2.3.4", "1.2", "", folder.c_str());
@@ -95,7 +89,6 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
          R"({"type":"session_close"})"}};
     EXPECT_EQ(sessions(folder), expected);
 
-    // A folder that cannot be made: no session.
     zyrtest::writeFile(dir.file("plain"), "x");
     start(session, "Print", "P", "1", "1", "", (dir.file("plain") + "/logs").c_str());
     EXPECT_EQ(session, nullptr);
@@ -103,7 +96,6 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     dlclose(lib);
 }
 
-// The library the logger finds by name is ours, beside libZYRStd; records reach its file.
 TEST(KelvrinTest, RecordsReachTheSessionFile) {
     zyrtest::TempDir dir;
     const std::u16string folder(dir.path().begin(), dir.path().end());
@@ -115,7 +107,6 @@ TEST(KelvrinTest, RecordsReachTheSessionFile) {
     record.set(CZYRUniString("DataGroupName"), CZYRUniString("DripSessionInfo"));
     record.set(CZYRUniString("NumWorkers"), 3u);
     record.finalize();
-    // Logged before termination: wait until the worker wrote the value.
     for (int i = 0;
          i < 10000 && (sessions(dir.path()).size() != 1 || sessions(dir.path())[0].size() < 3); ++i)
         std::this_thread::sleep_for(std::chrono::milliseconds(1));

@@ -1,15 +1,8 @@
-// The zyrstd command-line tool, run as a separate program on files in a fresh directory:
-// its arguments, exit codes, messages and output files; the codecs and digests are the
-// library's and have suites of their own.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstdlib>
 #include <filesystem>
-#include <sstream>
-#include <string>
-#include <tuple>
-#include <vector>
 
 #include "TestSupport.h"
 
@@ -34,14 +27,12 @@ protected:
             ADD_FAILURE() << "cannot start " << tool_;
         return outcome;
     }
-    // A file of the directory with `bytes` in it (directories made as needed).
     std::string file(const std::string& name, const std::string& bytes) {
         const fs::path path = fs::path(dir_.path()) / name;
         fs::create_directories(path.parent_path());
         zyrtest::writeFile(path.string(), bytes);
         return path.string();
     }
-    // The names in the directory, but for the captured output streams.
     Args listing() const {
         Args names;
         for (const auto& entry : fs::directory_iterator(dir_.path()))
@@ -50,7 +41,6 @@ protected:
         std::sort(names.begin(), names.end());
         return names;
     }
-    // `o` failed with `exitCode`, printed nothing and said `message` somewhere on stderr.
     void expectFailure(const Outcome& o, int exitCode, const std::string& message) {
         EXPECT_TRUE(o.exitCode == exitCode && o.out.empty()) << o.exitCode << " " << o.out;
         EXPECT_NE(o.err.find(message), std::string::npos) << o.err;
@@ -60,7 +50,6 @@ protected:
     zyrtest::TempDir dir_;
 };
 
-// Every option with its default, in print order; the RAM budget depends on the machine.
 constexpr const char* kDefaults =
     R"(NumMTRThreads=-1 NumMTBThreads=-1 MTRThreshold=100000 MTRFallbackPerBand=true
 HasExternalCompositor=false XObjDLCacheMaxRAM= XObjDLCacheMaxDisk=9223372036854775807
@@ -90,8 +79,6 @@ XObjDLCachePurgePercentage=0 DisableXPImageDLOptimization=false EmitIMG_META=tru
 AtomicRegionDirectCMYKOption=1 ThreadPriority=false UseNullXPDevice=false
 UseNullXPImage=false XPShadeCache=true RasterizeAllTransparencyShades=false)";
 
-// The defaults as printed ("Key = value" lines), with the RAM budget `ram` and the lines
-// of `changed` in place of theirs.
 std::string defaultsWith(const std::string& ram, const Args& changed) {
     std::istringstream in(kDefaults);
     std::string out;
@@ -121,8 +108,6 @@ TEST_F(ZyrstdToolTest, CommandLineAndMd5) {
     expectFailure(zyrstd({"no-such-command"}), 2, "'no-such-command'");
     expectFailure(zyrstd({}), 2, "\nTry 'zyrstd --help'.\n");
 
-    // Names with a backslash or a line end are escaped as md5sum does; unreadable files are
-    // reported and the others still done.
     const std::string empty = file("empty", ""), abc = file("abc", "abc");
     const std::string odd = file("back\\slash\nnew line", "abc"), missing = dir_.file("missing");
     const std::string kEmpty = "d41d8cd98f00b204e9800998ecf8427e",
@@ -147,13 +132,10 @@ TEST_F(ZyrstdToolTest, ConfigPrintsTheEffectiveOptions) {
     ASSERT_TRUE(!ram.empty() && ram.find_first_not_of("0123456789") == ram.npos) << ram;
     EXPECT_TRUE(std::stoull(ram) > 0 && std::stoull(ram) % 4096 == 0) << "whole pages: " << ram;
     EXPECT_EQ(defaults.out, defaultsWith(ram, {}));
-    // An empty setup file and one of comments only change nothing.
     EXPECT_EQ(
         zyrstd({"config", file("empty.cfg", ""), file("notes.cfg", "# a\r\n%b c\r\n\r\n")}).out,
         defaults.out);
 
-    // Later files win; unknown keys are reported where they are; the rules are the library's
-    // (a shared cache without a budget gets 1 GiB only in a fresh process, as this one is).
     const std::string first =
         file("first.cfg", "# setup\r\nNumMTRThreads = 4\r\nMaxCacheShades 3\r\n"
                           "Typo = 1\r\nSLCompressionRatio 0.75\r\n");
@@ -167,7 +149,6 @@ TEST_F(ZyrstdToolTest, ConfigPrintsTheEffectiveOptions) {
                                       {"NumMTRThreads = 8", "MaxCacheShades = 10",
                                        "SLCompressionRatio = 0.75", "XObjDLSharedCache = true"}));
 
-    // Bad setups print nothing; an empty expected text: one line naming the directory.
     const std::string good = file("good.cfg", "TrapPixelOverlap 2\n"),
                       missing = dir_.file("no.cfg");
     const std::string bad = file("bad.cfg", "A = 1\r\n\r\n# c\r\nLonely\r\nB = 2\r\n");
@@ -195,7 +176,6 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
         ASSERT_EQ(zyrstd({"encode", kind, in, text}).out, "") << kind;
         ASSERT_EQ(zyrstd({"decode", kind, text, back}).exitCode, 0) << kind;
         EXPECT_EQ(readFile(back), bytes) << kind;
-        // Standard input and output when no file (or "-") is named.
         EXPECT_EQ(zyrstd({"encode", kind}, in).out, readFile(text)) << kind;
         EXPECT_EQ(zyrstd({"decode", kind, "-"}, text).out, bytes) << kind;
     }
@@ -228,14 +208,11 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
         expectFailure(zyrstd(args), 2, "usage: zyrstd");
     EXPECT_EQ(listing(), (Args{"back.bin", "bad.a85", "bad.hex", "in.bin", "in.txt"}))
         << "no output, no temporary file";
-    // A failed decode leaves an existing output as it was.
     zyrtest::writeFile(out, "precious");
     EXPECT_EQ(zyrstd({"decode", "ascii85", badA85, out}).exitCode, 1);
     EXPECT_EQ(readFile(out), "precious");
 }
 
-// The reports' texts are the library's own; the tool prints them in order, in UTF-8, with
-// the timing lines, and reports what it could not read.
 TEST_F(ZyrstdToolTest, HwinfoPrintsTheReportsInUtf8) {
     const std::string root = dir_.file("root");
     file("root/proc/cpuinfo",

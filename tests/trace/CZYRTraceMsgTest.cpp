@@ -1,8 +1,5 @@
-// Trace messages: the log layout, routing, level rules, the process-wide dictionary, the
-// writer's locking, and the failures of construction and of the host.
 #include <gtest/gtest.h>
 
-#include <sstream>
 #include <thread>
 
 #include "EngineFakes.h"
@@ -18,7 +15,6 @@ using Calls = std::vector<std::string>;
 
 namespace {
 
-// Every test starts and ends with the log closed and no process-wide dictionary.
 class CZYRTraceMsgTest : public ::testing::Test {
 protected:
     void SetUp() override { TearDown(); }
@@ -37,13 +33,11 @@ CZYRDict levels(std::initializer_list<std::pair<const char*, int32_t>> entries) 
     return d;
 }
 
-// A trace configuration with its "Path".
 CZYRDict withPath(const std::string& path, CZYRDict config = CZYRDict()) {
     config.set(CZYRUniString("Path"), CZYRUniString(path.c_str()));
     return config;
 }
 
-// Job parameters with "JPJobID" and a trace configuration.
 CZYRDict jobParams(const CZYRDict& config, int32_t jobId = 7) {
     CZYRDict params;
     params.set(CZYRUniString("JPJobID"), jobId);
@@ -51,7 +45,6 @@ CZYRDict jobParams(const CZYRDict& config, int32_t jobId = 7) {
     return params;
 }
 
-// The strings exist only once main() has built their tables.
 CZYRUniString text(const char* s) {
     return CZYRUniString(s);
 }
@@ -67,7 +60,6 @@ TEST_F(CZYRTraceMsgTest, LogLayout) {
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config, 12)));
     ASSERT_EQ(ZYRGetTraceLogPath(), dir.file("t.log"));
 
-    // The writer's heads; records without text write nothing.
     CZYRProgressInterface writer;
     C_Error err;
     const sZYRTraceMsg msg{"band done", nullptr}, none{nullptr, nullptr};
@@ -84,8 +76,6 @@ TEST_F(CZYRTraceMsgTest, LogLayout) {
                      "<ZYRTrace> Job -3 L0 [0.00000000 sec] [C:Render] [Th:worker/5] \n"
                      "band done\n");
 
-    // A message in parts: continuations and ends only while one is open; wide texts take
-    // the path form in the log file.
     const size_t before = log().size();
     CZYRTraceMsg parts(zyrtest::makeJob(jobParams(config, 12)));
     parts.traceMsg("before any begin");
@@ -107,7 +97,6 @@ TEST_F(CZYRTraceMsgTest, LogLayout) {
 }
 
 TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
-    // The kept levels are 0x1FAB1DEA to 0x1FAB1DEE.
     const int32_t values[] = {9, 8, 0, -1, 531308010, 531308014, 531308009, 531308015};
     const int32_t mapped[] = {8, 8, 0, 0, 531308010, 531308014, 8, 8};
     for (size_t i = 0; i < std::size(values); ++i)
@@ -123,9 +112,6 @@ TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
     config.set(text("Known"), levels({{"Other", 2}}));
     config.set(text("NotADict"), 4u);
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config)));
-    // Levels are remembered per string object: asked again, through other objects of the
-    // same text, and with many areas in turn, each pair keeps its own level ("All" wins and
-    // maps; an area without its category takes the configuration's "Default").
     C_Error err;
     const CZYRUniString loose(createUniString("Nine", err), false);
     const CZYRUniString looseCat(createUniString("Cat", err), false);
@@ -147,8 +133,6 @@ TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {
             EXPECT_EQ(trace.getTraceMsgLevel(c.area, c.category), c.level) << round;
 }
 
-// "stdout" opens no file and sends everything to the host; otherwise two areas still go
-// to the host and the rest to the log.
 TEST_F(CZYRTraceMsgTest, LevelsAndRoutingToTheHost) {
     FakeProgress* host = nullptr;
     CZYRDict config = withPath("stdout", levels({{"All", 3}}));
@@ -180,14 +164,11 @@ TEST_F(CZYRTraceMsgTest, LevelsAndRoutingToTheHost) {
     EXPECT_TRUE(log().find("dl") == std::string::npos &&
                 log().find("[C:FontMgr/Other] \nto log\n") != std::string::npos)
         << log();
-    // A later "stdout" configuration keeps the open log and does not send to the host.
     EXPECT_FALSE(CZYRTraceMsg(zyrtest::makeJob(jobParams(withPath("stdout")))).isSendToHost());
     EXPECT_EQ(ZYRGetTraceLogPath(), dir.file("t.log"));
 }
 
 TEST_F(CZYRTraceMsgTest, WithoutALogFile) {
-    // No configuration: only what is always traced, on standard output; without "JPJobID"
-    // the job is 0.
     CZYRDict params;
     params.set(text("JPJobID"), 3);
     FakeProgress* host = nullptr;
@@ -203,7 +184,6 @@ TEST_F(CZYRTraceMsgTest, WithoutALogFile) {
     EXPECT_TRUE(out.find("dropped") == out.npos && host->calls.empty());
     EXPECT_EQ(ZYRGetTraceLogPath(), "");
 
-    // A log that cannot be opened: a warning, then standard output.
     ::testing::internal::CaptureStdout();
     CZYRTraceMsg failed(
         zyrtest::makeJob(jobParams(withPath(dir.file("missing/dir/t.log"), levels({{"All", 8}})))));
@@ -215,8 +195,6 @@ TEST_F(CZYRTraceMsgTest, WithoutALogFile) {
     EXPECT_NE(out.find("\nshown\n"), std::string::npos);
     EXPECT_EQ(ZYRGetTraceLogPath(), "");
 
-    // Without a "Path": "traceLog.log" in the configured temporary directory, else in the
-    // process's one.
     const char* saved = std::getenv("TMPDIR");
     const std::string savedText = saved ? saved : "";
     ::setenv("TMPDIR", dir.path().c_str(), 1);
@@ -230,7 +208,6 @@ TEST_F(CZYRTraceMsgTest, ProcessWideDictionaryMerges) {
     CZYRDict global = withPath("stdout", levels({{"Default", 1}}));
     global.set(text("Render"), levels({{"All", 6}}));
     ZYRTracingDict::getInstance().setTracingDict(global);
-    // The stored dictionary is a clone: later changes to the original do not reach it.
     global.set(text("Late"), levels({{"All", 4}}));
     CZYRDict noConfig;
     noConfig.set(text("JPJobID"), 1);
@@ -285,8 +262,6 @@ TEST_F(CZYRTraceMsgTest, ConstructionAndHostFailures) {
     const auto failing = zyrtest::makeJob(jobParams(withPath("stdout")), &host);
     static_cast<zyrtest::FakeJob&>(*failing).failWith = ZYRPublic::kZYRErrorTypeCheck;
     EXPECT_EQ(thrown([&] { CZYRTraceMsg trace(failing); }), "14: getter failed (fake:1)");
-    // A surface whose walk meets a null step; one whose steps record errors still finds its
-    // job, since the walk's own errors are not reported.
     const auto fromSurface = [](const C_SmartPtr<ZYRPublic::I_Surface>& surface) {
         return thrown(
             [&] { CZYRTraceMsg(surface).traceMsg(text("R"), text("R"), level(0), "ok"); });
@@ -301,7 +276,6 @@ TEST_F(CZYRTraceMsgTest, ConstructionAndHostFailures) {
     EXPECT_EQ(fromSurface(surface), "no error");
     EXPECT_EQ(host->calls, Calls{"whole R/R L0: ok"});
 
-    // The host's errors are thrown; anything else it throws becomes the unknown error.
     CZYRTraceMsg trace(zyrtest::makeJob(jobParams(withPath("stdout")), &host));
     host->failWith = ZYRPublic::kZYRErrorTypeCheck;
     const std::string failed = "14: host failed (fake:1)";
@@ -329,7 +303,6 @@ TEST_F(CZYRTraceMsgTest, CallbackWritesLevelFourTextsAndTakesTheLeakReport) {
     ZYRTraceMsgCallbackInternal(nullptr, &four, nullptr);
     ZYRTraceMsgCallbackInternal(&wide, &four, nullptr);
     EXPECT_EQ(log(), "four a/b|");
-    // The front's leak report: only its level-4 peak line reaches the log.
     zyrtest::installFront(1);
     ZYRStdInit_ZYRMemMgrDumpMemList(ZYRTraceMsgCallbackInternal, nullptr);
     zyrtest::installFront(0);

@@ -1,6 +1,3 @@
-// Memory reports: the address-space map, the usage snapshots, their counters and the
-// surface step. The counters live for the process, so their first values are checked in a
-// fresh process (death-test children re-run this program).
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -15,7 +12,6 @@ using zyrtest::FakeProgress;
 
 namespace {
 
-// A trace whose messages all reach the fake host, at configured level `all`.
 struct HostTrace {
     FakeProgress* host = nullptr;
     CZYRTraceMsg trace;
@@ -60,7 +56,6 @@ bool countersFromTheirFirstValues() {
         expectPrefix(t.report(kReportMemoryUsageAfterPlacedObject),
                      "After interpreting PlacedObject 2 ") &&
         expectPrefix(t.report(static_cast<ReportMemoryUsageType>(0)), "Current Memory: ");
-    // The step was read once: changing it later has no effect.
     ::setenv("ZYR_MEMORY_SURFACE_COUNT_STEP", "1", 1);
     return ok && expectPrefix(t.report(surface), "<none>") &&
            expectPrefix(t.report(surface), "After interpreting Surface 4 ");
@@ -108,8 +103,6 @@ TEST(ZYRMemReportsTest, UsageReportLevelsAndLayout) {
     EXPECT_EQ(four.substr(four.size() - 10), " Other: 0\n");
 }
 
-// Level 4 gives the totals, level 5 also the regions, which follow one another without gaps
-// up to the top of user space.
 TEST(ZYRMemReportsTest, AddressSpaceMap) {
     HostTrace low(3), totals(4), full(5);
     for (HostTrace* t : {&low, &totals, &full})
