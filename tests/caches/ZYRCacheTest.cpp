@@ -209,6 +209,12 @@ TEST(ZYRCacheTest, HeadTablesLongChainsRefusalsAndRelocation) {
             (std::array<bool, 3>{n < 250, true, false}))
             << n;
     }
+    TestCache recycling(100, 4, 4); // entries dropped by a sweep wait for its report
+    recycling.recycle = true;
+    recycling.add(0);
+    Entry* second = recycling.add(1);
+    recycling.CleanupUnTouched(recycling.head(1), nullptr); // entry 1 is no longer touched
+    EXPECT_TRUE(recycling.hcScavenger(1, &recycling) == 1 && recycling.add(4) == second);
 }
 
 // The cache's rules written out plainly over vectors of keys, front first.

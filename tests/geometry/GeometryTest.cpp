@@ -170,64 +170,6 @@ std::vector<float> samples(std::vector<CZYRSampledFunc<float>::Point> points,
     return out.values;
 }
 
-TEST(CZYRRectTest, RectanglesAndResampling) {
-    const sZYRRect rec = CZYRRect(1, 2, 3, 4); // left, bottom, right, top
-    EXPECT_EQ(std::pair(rec.top, rec.right), std::pair(4.0, 3.0)) << "top before right";
-    const double huge = std::numeric_limits<double>::max();
-    CZYRRect r;
-    EXPECT_TRUE(is(r, huge, huge, -huge, -huge) && r.isempty() && !r.isBoundingBox());
-    r.updateBBoxPoint(5, 6);
-    EXPECT_TRUE(is(r, 5, 6, 5, 6) && r.isBoundingBox() && r.isempty()) << "a point has no area";
-    r.updateBBoxPoint(-1, 10);
-    r.updateBBoxPoint(2, 0);
-    EXPECT_TRUE(is(r, -1, 0, 5, 10) && !r.isempty());
-    EXPECT_TRUE(CZYRRect(0, 0, 1, 0).isempty() && CZYRRect(0, 0, 0, 1).isempty());
-    CZYRRect u; // the default is neutral for union
-    u.unionRect(CZYRRect(1, 2, 3, 4));
-    u.unionRect(CZYRRect(-5, 3, 0, 9));
-    EXPECT_TRUE(is(u, -5, 2, 3, 9));
-    r.setRect(CZYRRect(3, 0, 1, 1));
-    EXPECT_TRUE(is(r, 3, 0, 1, 1)) << "setRect does not check";
-    EXPECT_NO_THROW(r.setBoundingBox(CZYRRect(0, 0, 0, 0)));
-    expectBadParam([&] { r.setBoundingBox(CZYRRect(0, 5, 1, 4)); }, "Invalid bounding box set",
-                   "source/zyr/std/CZYRRect");
-    EXPECT_TRUE(is(r, 0, 5, 1, 4)) << "the refused values are kept";
-    r.setRect(CZYRRect(0, 0, 10, 10));
-    r.intersectRect(CZYRRect(5, -5, 15, 8));
-    EXPECT_TRUE(is(r, 5, 0, 10, 8));
-    // Closed rectangles: a shared edge or corner, or containment, touches.
-    const CZYRRect unit(0, 0, 1, 1);
-    for (const CZYRRect& other : {CZYRRect(1, 0, 2, 1), CZYRRect(1, 1, 2, 2),
-                                  CZYRRect(0.25, 0.25, 0.5, 0.5), CZYRRect(-1, -1, 0, 0)})
-        EXPECT_TRUE(unit.touch(other) && other.touch(unit));
-    for (const CZYRRect& other : {CZYRRect(1.5, 0, 2, 1), CZYRRect(0, 1.001, 1, 2),
-                                  CZYRRect(-2, 0, -0.5, 1), CZYRRect(0, -2, 1, -0.5)})
-        EXPECT_FALSE(unit.touch(other) || other.touch(unit));
-    for (const CZYRRect& other :
-         {CZYRRect(1, 0, 2, 1), CZYRRect(0, 1, 1, 2), CZYRRect(5, 5, 6, 6)}) {
-        CZYRRect edge = unit;
-        edge.intersectRect(other);
-        EXPECT_TRUE(is(edge, 0, 0, 0, 0));
-    }
-    using V = std::vector<float>;
-    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0, 1}, 3), (V{0.0f, 127.5f, 255.0f}));
-    // Points cover 0.25..0.75 of the domain: outside them the end values hold.
-    const V held = samples({{0.25f, 0.2f}, {0.5f, 0.6f}, {0.75f, 0.4f}}, {0, 1}, {0, 1}, 5);
-    const V want{0.2f * 255, 0.2f * 255, 0.6f * 255, 0.4f * 255, 0.4f * 255};
-    for (size_t i = 0; i < want.size(); ++i)
-        EXPECT_FLOAT_EQ(held.at(i), want[i]) << i;
-    EXPECT_EQ(samples({{0, -1}, {1, 2}}, {0, 1}, {0, 1}, 2), (V{0, 255})) << "clamped";
-    EXPECT_EQ(samples({{0, 0.5f}, {1, 0.5f}}, {0, 1}, {0.25f, 0.75f}, 2), (V{127.5f, 127.5f}));
-    // A zero-width range is a step at its value.
-    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0.5f, 0.5f}, 5), (V{0, 0, 255, 255, 255}));
-    // Two points at the same x: left of it the first y, from it on the second.
-    EXPECT_EQ(samples({{0.5f, 0}, {0.5f, 1}}, {0, 1}, {0, 1}, 3), (V{0, 255, 255}));
-    EXPECT_TRUE(samples({{0, 0}, {1, 1}}, {0.25f, 1}, {0, 1}, 0).empty());
-    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0.25f, 1}, {0, 1}, 1), (V{0.25f * 255}));
-    const auto onePoint = [] { samples({{0, 0}}, {0, 1}, {0, 1}, 4); };
-    expectBadParam(onePoint, "invalid index", "source/zyr/std/CZYRMemBuffer");
-}
-
 constexpr int32_t kMin = std::numeric_limits<int32_t>::min(), kMax = -(kMin + 1);
 constexpr int32_t kOne = 0x00010000, kFrac = 0x40000000;
 using i128 = __int128;
@@ -296,7 +238,7 @@ int32_t operand(std::mt19937_64& rng) {
     return ::testing::AssertionSuccess();
 }
 
-TEST(ZYRFixedTest, SpecialsAndARandomSweepAgainstExactArithmetic) {
+TEST(GeometryTest, FixedPointRectanglesAndResampling) {
     const float half = 0.5f / 65536, inf = std::numeric_limits<float>::infinity();
     EXPECT_EQ(std::pair(toFixed(1.5f), toFixed(std::nextafter(32768.0f, 0.0f))),
               std::pair(0x00018000, 0x7FFFFF80));
@@ -327,6 +269,60 @@ TEST(ZYRFixedTest, SpecialsAndARandomSweepAgainstExactArithmetic) {
             for (const int32_t c : kSpecial)
                 for (const bool rounded : {false, true})
                     ASSERT_TRUE(exact(a, b, c, rounded));
+    const sZYRRect rec = CZYRRect(1, 2, 3, 4); // left, bottom, right, top
+    EXPECT_EQ(std::pair(rec.top, rec.right), std::pair(4.0, 3.0)) << "top before right";
+    const double huge = std::numeric_limits<double>::max();
+    CZYRRect r;
+    EXPECT_TRUE(is(r, huge, huge, -huge, -huge) && r.isempty() && !r.isBoundingBox());
+    r.updateBBoxPoint(5, 6);
+    EXPECT_TRUE(is(r, 5, 6, 5, 6) && r.isBoundingBox() && r.isempty()) << "a point has no area";
+    r.updateBBoxPoint(-1, 10);
+    r.updateBBoxPoint(2, 0);
+    EXPECT_TRUE(is(r, -1, 0, 5, 10) && !r.isempty());
+    EXPECT_TRUE(CZYRRect(0, 0, 1, 0).isempty() && CZYRRect(0, 0, 0, 1).isempty());
+    CZYRRect u; // the default is neutral for union
+    u.unionRect(CZYRRect(1, 2, 3, 4));
+    u.unionRect(CZYRRect(-5, 3, 0, 9));
+    EXPECT_TRUE(is(u, -5, 2, 3, 9));
+    r.setRect(CZYRRect(3, 0, 1, 1));
+    EXPECT_TRUE(is(r, 3, 0, 1, 1)) << "setRect does not check";
+    EXPECT_NO_THROW(r.setBoundingBox(CZYRRect(0, 0, 0, 0)));
+    expectBadParam([&] { r.setBoundingBox(CZYRRect(0, 5, 1, 4)); }, "Invalid bounding box set",
+                   "source/zyr/std/CZYRRect");
+    EXPECT_TRUE(is(r, 0, 5, 1, 4)) << "the refused values are kept";
+    r.setRect(CZYRRect(0, 0, 10, 10));
+    r.intersectRect(CZYRRect(5, -5, 15, 8));
+    EXPECT_TRUE(is(r, 5, 0, 10, 8));
+    // Closed rectangles: a shared edge or corner, or containment, touches.
+    const CZYRRect unit(0, 0, 1, 1);
+    for (const CZYRRect& other : {CZYRRect(1, 0, 2, 1), CZYRRect(1, 1, 2, 2),
+                                  CZYRRect(0.25, 0.25, 0.5, 0.5), CZYRRect(-1, -1, 0, 0)})
+        EXPECT_TRUE(unit.touch(other) && other.touch(unit));
+    for (const CZYRRect& other : {CZYRRect(1.5, 0, 2, 1), CZYRRect(0, 1.001, 1, 2),
+                                  CZYRRect(-2, 0, -0.5, 1), CZYRRect(0, -2, 1, -0.5)})
+        EXPECT_FALSE(unit.touch(other) || other.touch(unit));
+    for (const CZYRRect& other :
+         {CZYRRect(1, 0, 2, 1), CZYRRect(0, 1, 1, 2), CZYRRect(5, 5, 6, 6)}) {
+        CZYRRect edge = unit;
+        edge.intersectRect(other);
+        EXPECT_TRUE(is(edge, 0, 0, 0, 0));
+    }
+    using V = std::vector<float>;
+    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0, 1}, 3), (V{0.0f, 127.5f, 255.0f}));
+    // Points cover 0.25..0.75 of the domain: outside them the end values hold.
+    const V held = samples({{0.25f, 0.2f}, {0.5f, 0.6f}, {0.75f, 0.4f}}, {0, 1}, {0, 1}, 5);
+    const V want{0.2f * 255, 0.2f * 255, 0.6f * 255, 0.4f * 255, 0.4f * 255};
+    for (size_t i = 0; i < want.size(); ++i)
+        EXPECT_FLOAT_EQ(held.at(i), want[i]) << i;
+    EXPECT_EQ(samples({{0, -1}, {1, 2}}, {0, 1}, {0, 1}, 2), (V{0, 255})) << "clamped";
+    EXPECT_EQ(samples({{0, 0.5f}, {1, 0.5f}}, {0, 1}, {0.25f, 0.75f}, 2), (V{127.5f, 127.5f}));
+    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0, 1}, {0.5f, 0.5f}, 5), (V{0, 0, 255, 255, 255}));
+    // Two points at the same x: left of it the first y, from it on the second.
+    EXPECT_EQ(samples({{0.5f, 0}, {0.5f, 1}}, {0, 1}, {0, 1}, 3), (V{0, 255, 255}));
+    EXPECT_TRUE(samples({{0, 0}, {1, 1}}, {0.25f, 1}, {0, 1}, 0).empty());
+    EXPECT_EQ(samples({{0, 0}, {1, 1}}, {0.25f, 1}, {0, 1}, 1), (V{0.25f * 255}));
+    const auto onePoint = [] { samples({{0, 0}}, {0, 1}, {0, 1}, 4); };
+    expectBadParam(onePoint, "invalid index", "source/zyr/std/CZYRMemBuffer");
 }
 
 } // namespace

@@ -33,8 +33,7 @@ constexpr const char* kWindowsSource = "source/zyr/std/ZYRFileSys_Windows";
 constexpr const char* kHostSource = "source/zyr/std/ZYRFileSys_OEM";
 
 bool exists(const std::string& path) {
-    struct stat st;
-    return ::stat(path.c_str(), &st) == 0;
+    return ::access(path.c_str(), F_OK) == 0;
 }
 
 std::string utf8(const ZYRStd::CZYRUniString& s) {
@@ -67,7 +66,6 @@ public:
     ~FileSysFixture() {
         ZYRStd::ZYRStdInit_SetDefaultFileSysProc(nullptr);
         ZYRStd::ZYRStdInit_SetZYRFactoryProc(nullptr);
-        installed_ = nullptr;
         delete fileSys_;
     }
 
