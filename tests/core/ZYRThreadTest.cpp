@@ -1,12 +1,12 @@
-// Per-thread records, locks, identifiers, the client base and its registry, and reference
-// counts on both schemes with the pointers that hold them.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <functional>
+#include <memory>
 #include <set>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -26,21 +26,17 @@ namespace {
 
 std::atomic<int> liveObjects{0};
 
-class TrackedRecord : public CZYRThreadSpecificPtr {
-public:
+struct TrackedRecord : CZYRThreadSpecificPtr {
     TrackedRecord(const char* name, bool blockable) : CZYRThreadSpecificPtr(name, blockable) {
         ++liveObjects;
     }
     ~TrackedRecord() override { --liveObjects; }
 };
-
-class Counted : public CZYRBaseRefCnt {
-public:
+struct Counted : CZYRBaseRefCnt {
     Counted() { ++liveObjects; }
     ~Counted() override { --liveObjects; }
 };
 
-// A public-interface implementation the way the library writes them.
 class PublicObject : public CZYRClientBase {
 public:
     PublicObject() { ++liveObjects; }
@@ -64,9 +60,9 @@ TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
         auto* first = new TrackedRecord("renderer", true);
         SetCZYRThreadSpecificPtr(first);
         SetCZYRThreadSpecificPtr(first); // the same record again is kept
-        EXPECT_TRUE(liveObjects == 1 && GetCZYRThreadSpecificPtr() == first);
-        EXPECT_STREQ(first->getThreadName(), "renderer");
-        EXPECT_TRUE(first->getZoom() == 1.0f && first->IsThisThreadBlockable());
+        EXPECT_TRUE(liveObjects == 1 && GetCZYRThreadSpecificPtr() == first &&
+                    std::string(first->getThreadName()) == "renderer" && first->getZoom() == 1.0f &&
+                    first->IsThisThreadBlockable());
         auto* second = new TrackedRecord("renderer", false);
         EXPECT_NE(second->getThreadId(), first->getThreadId());
         SetCZYRThreadSpecificPtr(second);
@@ -77,8 +73,6 @@ TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
     EXPECT_FALSE(ZYRSingleThreadProcess());
 }
 
-// The condition's timed wait answers false on time-out; a wait may wake spuriously, so only
-// one that reaches its deadline must time out.
 TEST(ZYRThreadTest, TimedWaitTimesOut) {
     ZYRStd::mutex guard;
     detail::condition_impl nobody;
@@ -87,11 +81,9 @@ TEST(ZYRThreadTest, TimedWaitTimesOut) {
     bool timedOut = false;
     while (!timedOut && std::chrono::steady_clock::now() < deadline + std::chrono::seconds(5))
         timedOut = !nobody.do_timed_wait(lock, deadline);
-    EXPECT_TRUE(timedOut);
-    EXPECT_GE(std::chrono::steady_clock::now(), deadline);
+    EXPECT_TRUE(timedOut && std::chrono::steady_clock::now() >= deadline);
 }
 
-// Unique and client identifiers: distinct across threads, increasing within one, from 1.
 TEST(ZYRThreadTest, IdentifiersAreDistinctAcrossThreads) {
     const std::function<unsigned long long()> makers[] = {
         [] { return createUniqueID(); }, [] { return CZYRClientRegistrar::makeID(nullptr); }};
@@ -107,7 +99,6 @@ TEST(ZYRThreadTest, IdentifiersAreDistinctAcrossThreads) {
         }
         EXPECT_TRUE(all.size() == 2000 && *all.begin() >= 1 && make() > *all.rbegin());
     }
-    // Client identifiers start at 1; each run of this test takes 2001 of them.
     EXPECT_EQ(CZYRClientRegistrar::makeID(nullptr) % 2002, 0u);
 }
 
@@ -121,24 +112,22 @@ TEST(ZYRThreadTest, ClientBaseAllocatesThroughTheFrontAndTheNewHandler) {
     tZYRMemMgr record = host.record();
     zyrtest::installFront(0, &record);
     const unsigned long long before = GetMemUsage();
-    auto* object = new Object;
-    EXPECT_TRUE(ZYRMemSize(object) == sizeof(Object) && GetMemUsage() == before + sizeof(Object));
-    delete object;
+    {
+        const std::unique_ptr<Object> object(new Object);
+        EXPECT_TRUE(ZYRMemSize(object.get()) == sizeof(Object) &&
+                    GetMemUsage() == before + sizeof(Object));
+    }
     EXPECT_EQ(GetMemUsage(), before);
 
-    // A request beyond the front's 32-bit sizes is refused, never cut down.
     EXPECT_THROW(CZYRClientBase::operator new (std::size_t{5} << 30), ZYROutOfMemoryError);
-    // A failing front: the new handler is called until it recovers (without one the fault
-    // sweep sees ZYROutOfMemoryError).
     host.failAll = true;
     const std::new_handler previous = std::set_new_handler([] {
         ++handlerCalls;
         host.failAll = false;
     });
-    object = new Object;
+    const std::unique_ptr<Object> object(new Object);
     std::set_new_handler(previous);
     EXPECT_EQ(handlerCalls, 1);
-    delete object;
     zyrtest::installFront(0);
 }
 
@@ -147,13 +136,13 @@ TEST(ZYRThreadTest, ClientRegistryNotifications) {
     EXPECT_TRUE(registry.allNotificationsReceived());
     registry.registerClient(5);
     registry.markNotification(5);
-    EXPECT_TRUE(registry.notificationReceived(5));
+    const bool marked = registry.notificationReceived(5);
     registry.registerClient(5);
-    EXPECT_FALSE(registry.notificationReceived(5)) << "registering again resets";
+    EXPECT_TRUE(marked && !registry.notificationReceived(5)) << "registering again resets";
     registry.markNotification(9);
-    EXPECT_FALSE(registry.allNotificationsReceived());
+    const bool early = registry.allNotificationsReceived();
     registry.markNotification(5);
-    EXPECT_TRUE(registry.allNotificationsReceived());
+    EXPECT_TRUE(!early && registry.allNotificationsReceived());
     EXPECT_EQ(zyrtest::thrown([&] { registry.notificationReceived(3); }),
               "6: CZYRClientRegistry:: Unknown clientID (source/zyr/std/CZYRClientRegistry:61)");
 }
@@ -166,9 +155,8 @@ TEST(CZYRSmartPtrTest, CountsOnBothSchemes) {
     object->release();
     EXPECT_EQ(object->peekRefCnt(), 1);
     object->release();
-    EXPECT_EQ(liveObjects, 0);
     CZYRPublicRefCountBase rc;
-    EXPECT_FALSE(rc.isShared());
+    EXPECT_TRUE(liveObjects == 0 && !rc.isShared());
     rc.addRef();
     EXPECT_TRUE(rc.isShared() && !rc.release());
     EXPECT_TRUE(rc.release()) << "true exactly on the 1 -> 0 step";
@@ -185,8 +173,7 @@ TEST(CZYRSmartPtrTest, CountsOnBothSchemes) {
     std::thread other(churn);
     churn();
     other.join();
-    EXPECT_EQ(ZYRPeekValue_ThreadSafe(&count), 100001u) << "counts must never tear";
-    EXPECT_TRUE(ZYRIsShared_ThreadSafe(&count));
+    EXPECT_TRUE(ZYRPeekValue_ThreadSafe(&count) == 100001u && ZYRIsShared_ThreadSafe(&count));
     count = 1;
     EXPECT_EQ(ZYRDecrementRefCnt_ThreadSafe(&count), 0u);
 }
@@ -196,27 +183,21 @@ TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
     {
         C_SmartPtr<PublicObject> first(raw, false); // adopts the creator's reference
         C_SmartPtr<PublicObject> second(first);
-        EXPECT_EQ(raw->debugGetRefCount(), 2u);
         first = first;
         EXPECT_EQ(raw->debugGetRefCount(), 2u);
         second.reset();
         EXPECT_EQ(raw->debugGetRefCount(), 1u);
-        // `first` holds the last reference; assigning the same object through another
-        // pointer must not let it die in between.
         C_SmartPtr<PublicObject> third(raw, true);
         first = third;
         EXPECT_EQ(raw->debugGetRefCount(), 2u);
         C_SmartPtr<PublicObject> other(new PublicObject, false);
         first = other; // releases raw once, leaving third's reference
-        EXPECT_EQ(raw->debugGetRefCount(), 1u);
-        EXPECT_EQ(liveObjects, 2);
+        EXPECT_TRUE(raw->debugGetRefCount() == 1 && liveObjects == 2);
     }
     EXPECT_EQ(liveObjects, 0);
     {
-        CZYRSmartZYRRefPtr<Counted> a(new Counted);
-        CZYRSmartZYRRefPtr<Counted> b(a);
+        CZYRSmartZYRRefPtr<Counted> a(new Counted), b(a), c(new Counted);
         EXPECT_EQ(a->peekRefCnt(), 2);
-        CZYRSmartZYRRefPtr<Counted> c(new Counted);
         b = c;
         EXPECT_TRUE(a->peekRefCnt() == 1 && c->peekRefCnt() == 2);
         a = c; // the first object's last reference goes
@@ -227,8 +208,7 @@ TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
     C_SmartPtr<PublicObject> shared(new PublicObject, false);
     auto copies = [&shared] {
         for (int i = 0; i < 50000; ++i) {
-            C_SmartPtr<PublicObject> copy(shared);
-            C_SmartPtr<PublicObject> another;
+            C_SmartPtr<PublicObject> copy(shared), another;
             another = copy;
         }
     };
@@ -236,8 +216,6 @@ TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
     copies();
     other.join();
     EXPECT_EQ(shared->debugGetRefCount(), 1u) << "copies on two threads";
-    shared.reset();
-    EXPECT_EQ(liveObjects, 0);
 }
 
 TEST(CZYRSmartPtrTest, ContainerLendsACountAndUsesTheDeleter) {

@@ -1,4 +1,3 @@
-// Tests of the MD5 digest.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -25,7 +24,6 @@ std::string hex(const ZYRDigest& digest) {
     return out;
 }
 
-// The digest of `text` fed in pieces of the given sizes (the rest in one piece).
 std::string md5Of(std::string_view text, const std::vector<size_t>& pieces = {}) {
     HashPtr hash(ZYRStd::createMD5Hash());
     for (size_t piece : pieces) {
@@ -40,22 +38,14 @@ constexpr const char* kEmptyDigest = "d41d8cd98f00b204e9800998ecf8427e";
 
 } // namespace
 
-// The RFC 1321 suite, then runs of 'a' about the block boundaries: 55 bytes still leave room
-// for the length in the last block, 56 do not. Each whole, through the constructor, and in
-// pieces that leave the buffer partly filled.
 TEST(CZYRHashTest, KnownDigests) {
     const std::string a(128, 'a');
     const std::pair<std::string, const char*> suite[] = {
         {"", kEmptyDigest},
         {"a", "0cc175b9c0f1b6a831c399e269772661"},
         {"abc", "900150983cd24fb0d6963f7d28e17f72"},
-        {"message digest", "f96b697d7cb7938d525a2f31aaf161d0"},
-        {"abcdefghijklmnopqrstuvwxyz", "c3fcd3d76192e4007dfb496cca67e13b"},
         {"ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789",
          "d174ab98d277d9f5a5611c2c9f419d9f"},
-        {"1234567890123456789012345678901234567890"
-         "1234567890123456789012345678901234567890",
-         "57edf4a22be3c955ac49da2e2107b67a"},
         {a.substr(0, 55), "ef1772b6dff9a122358552954ad0df65"},
         {a.substr(0, 56), "3b0c8ac703f828b04c6c197006d17218"},
         {a.substr(0, 57), "652b906d60af96844ebd21b674f35e93"},
@@ -74,8 +64,6 @@ TEST(CZYRHashTest, KnownDigests) {
     }
 }
 
-// Mostly short pieces so that the buffered path is taken often, with some long ones; unaligned
-// starting addresses; and 2^29 bytes plus some, where the low word of the bit count wraps.
 TEST(CZYRHashTest, LongInputsInPieces) {
     const std::string million(1000000, 'a');
     EXPECT_EQ(md5Of(million), "7707d6ae4e027c70eea2a935c2296f21");
@@ -99,8 +87,6 @@ TEST(CZYRHashTest, LongInputsInPieces) {
     EXPECT_EQ(hex(hash->getDigest()), "b0b9022bf39b2600fd66892a61a628c7");
 }
 
-// Null and empty input change nothing; the digest is final: a second getDigest does not pad
-// again, and a later update throws. Creation fails softly when the front refuses.
 TEST(CZYRHashTest, EmptyInputFinalityAndFailedCreation) {
     unsigned char bytes[] = {'a', 'b', 'c'};
     for (CZYRHash* made : {ZYRStd::createMD5Hash(), ZYRStd::createMD5Hash(nullptr, 3),
@@ -111,7 +97,6 @@ TEST(CZYRHashTest, EmptyInputFinalityAndFailedCreation) {
         EXPECT_EQ(hex(hash->getDigest()), kEmptyDigest);
     }
     HashPtr hash(ZYRStd::createMD5Hash(bytes, 3));
-    hash->update(nullptr, 0);
     const ZYRDigest first = hash->getDigest();
     EXPECT_EQ(hex(first), "900150983cd24fb0d6963f7d28e17f72");
     for (const char* data : {"more", static_cast<const char*>(nullptr)})
