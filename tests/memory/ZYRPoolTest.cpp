@@ -17,7 +17,7 @@
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/core/ZYRVirtualMem.h"
 #include "zyr/std/memory/ZYRPool.h"
-#include "zyr/std/memory/redblack_tree.h"
+#include "zyr/std/memory/internal/redblack_tree.h"
 
 using namespace ZYRStd;
 

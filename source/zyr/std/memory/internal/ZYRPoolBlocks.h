@@ -5,7 +5,7 @@
 #include <cstring>
 
 #include "zyr/std/memory/ZYRPool.h"
-#include "zyr/std/memory/redblack_tree.h"
+#include "zyr/std/memory/internal/redblack_tree.h"
 
 // The boundary tag in front of every block of a VariableSizeAllocator page.
 struct BlkHeader {
