@@ -33,24 +33,18 @@ std::set<std::string> changedSince(const Snapshot& before) {
 }
 
 const char* samplesFor(eZYRStartupReading reading) {
-    switch (reading) {
-    case eZYRStartupReading::kBool:
-        return "TRUE=true yes=false 7=true True=true true_=false 0=false";
-    case eZYRStartupReading::kHighLow:
-        return "LOW=false lo=true low=false high=true";
-    case eZYRStartupReading::kInt:
-        return "42=42 123abc=123 2147483648=2147483647 57=57";
-    case eZYRStartupReading::kUnsigned:
-        return "42=42 77=77";
-    case eZYRStartupReading::kInt64:
-        return "12345678901=12345678901 99999999999999999999=9223372036854775807 -5=0 4096=4096";
-    case eZYRStartupReading::kFloat:
-        return "2.5=2.5 0.125=0.125 75=75";
-    case eZYRStartupReading::kText:
-        return "/opt/trap/libtrap.so=/opt/trap/libtrap.so";
-    default:
-        return "";
-    }
+    using R = eZYRStartupReading;
+    static const std::map<R, const char*> samples = {
+        {R::kBool, "TRUE=true yes=false 7=true True=true true_=false 0=false"},
+        {R::kHighLow, "LOW=false lo=true low=false high=true"},
+        {R::kInt, "42=42 123abc=123 2147483648=2147483647 57=57"},
+        {R::kUnsigned, "42=42 77=77"},
+        {R::kInt64,
+         "12345678901=12345678901 99999999999999999999=9223372036854775807 -5=0 4096=4096"},
+        {R::kFloat, "2.5=2.5 0.125=0.125 75=75"},
+        {R::kText, "/opt/trap/libtrap.so=/opt/trap/libtrap.so"}};
+    const auto found = samples.find(reading);
+    return found == samples.end() ? "" : found->second;
 }
 
 struct Host {

@@ -66,32 +66,30 @@ TEST(CZYRSurfaceRenderAttributesTest, DeviceValidationAndEquality) {
     EXPECT_STREQ(d.make().getColorantOrder().getEntry(3).name.c_str(), "Black");
     EXPECT_THROW(d.make().getColorantOrder().getEntry(4), CZYRError);
 
+    const CZYRRasterDeviceAttributes base = Device().make();
+    EXPECT_TRUE(base == Device().make());
+    const auto differs = [&](const std::function<void(Device&)>& change) {
+        Device d;
+        change(d);
+        return !(base == d.make()) && !(d.make() == base) && d.make() == d.make();
+    };
+    for (auto m :
+         {&Device::components, &Device::first, &Device::fourth, &Device::second, &Device::third})
+        EXPECT_TRUE(differs([m](Device& d) { ++(d.*m); }));
+    for (auto m : {&Device::xRes, &Device::yRes})
+        EXPECT_TRUE(differs([m](Device& d) { ++(d.*m); }));
+    for (auto m : {&Device::firstFlag, &Device::secondFlag, &Device::thirdFlag})
+        EXPECT_TRUE(differs([m](Device& d) { d.*m = !(d.*m); }));
     const std::function<void(Device&)> changes[] = {
-        [](auto& d) { d.components = 4; },
-        [](auto& d) { d.first = 9; },
-        [](auto& d) { d.xRes = 73; },
-        [](auto& d) { d.yRes = 145; },
         [](auto& d) { d.rect = CZYRRect(0, 0, 10, 21); },
-        [](auto& d) { d.fourth = 2; },
         [](auto& d) { d.block.value[2] = 513; },
-        [](auto& d) { d.firstFlag = true; },
-        [](auto& d) { d.second = 2; },
-        [](auto& d) { d.third = 2; },
-        [](auto& d) { d.secondFlag = true; },
-        [](auto& d) { d.thirdFlag = false; },
         [](auto& d) { d.order.setValue(1); },
         [](auto& d) { d.order = colorants(4); },
         [](auto& d) { (d.order = colorants(2)).add("Other", 2); },
         [](auto& d) { (d.order = colorants(2)).add("Yellow", 3); },
         [](auto& d) { (d.array = CZYRArray()).set(0, 1u); }};
-    const CZYRRasterDeviceAttributes base = Device().make();
-    EXPECT_TRUE(base == Device().make());
-    for (size_t i = 0; i < std::size(changes); ++i) {
-        Device changed;
-        changes[i](changed);
-        EXPECT_TRUE(!(base == changed.make()) && !(changed.make() == base)) << "change " << i;
-        EXPECT_TRUE(changed.make() == changed.make()) << "change " << i;
-    }
+    for (size_t i = 0; i < std::size(changes); ++i)
+        EXPECT_TRUE(differs(changes[i])) << "change " << i;
 }
 
 TEST(CZYRSurfaceRenderAttributesTest, DeviceExtentsRoundUpAndSaturate) {
@@ -143,16 +141,12 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
         link.failWith = ZYRPublic::kZYRErrorTypeCheck;
         next.reset();
     };
-    for (int step = 0; step < 3; ++step) {
-        auto surface = makeSurface(3, job);
-        if (step == 0)
-            fail(*surface, surface->owner);
-        if (step == 1)
-            fail(*surface->owner, surface->owner->parent);
-        if (step == 2)
-            fail(*surface->owner->parent, surface->owner->parent->job);
-        EXPECT_EQ(attempt(surface, full), "14: getter failed (fake:1)") << "step " << step;
-    }
+    const auto s0 = makeSurface(3, job), s1 = makeSurface(3, job), s2 = makeSurface(3, job);
+    fail(*s0, s0->owner);
+    fail(*s1->owner, s1->owner->parent);
+    fail(*s2->owner->parent, s2->owner->parent->job);
+    for (const auto& broken : {s0, s1, s2})
+        EXPECT_EQ(attempt(broken, full), "14: getter failed (fake:1)");
 
     const auto surface = makeSurface(77, job);
     const unsigned int flags = kZYRFirstSurface | kZYRFrontSurface;
@@ -239,8 +233,8 @@ TEST(CZYRSurfaceRenderAttributesTest, StrokeParams) {
     EXPECT_TRUE(s.dashArray == storage && s.dashArray[0] == 1.0f) << "the storage never shrinks";
     p.setDashedArray(nullptr, 0);
     EXPECT_TRUE(s.dashCount == 0 && s.dashArray == storage);
-    EXPECT_THROW(p.setDashedArray(dashes, -1), CZYRError);
-    EXPECT_THROW(p.setDashedArray(nullptr, 2), CZYRError);
+    for (const auto& [values, count] : {std::pair{dashes, -1}, {nullptr, 2}})
+        EXPECT_THROW(p.setDashedArray(values, count), CZYRError);
 
     CZYRStrokeParams base;
     base.setDashedArray(dashes, 3);

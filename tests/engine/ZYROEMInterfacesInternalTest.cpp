@@ -53,24 +53,20 @@ void checkLookup(const char* name, C_SmartPtr<I> FakeInterfaceSet::*slot, bool r
 } // namespace
 
 TEST(ZYROEMInterfacesInternalTest, EveryLookupAndItsRule) {
-    checkLookup("calibration", &FakeInterfaceSet::calibration, true,
-                GetOEMCalibrationMgrInterfaceFromJob);
-    checkLookup("cutting", &FakeInterfaceSet::cutting, false, GetOEMCuttingInfoMgrInterfaceFromJob);
-    checkLookup("color", &FakeInterfaceSet::colorAdjustment, false,
-                GetDeviceColorAdjustmentFromJob);
-    checkLookup("frame marker", &FakeInterfaceSet::frameMarker, true,
-                GetOEMFrameMarkerFactoryInterfaceFromJob);
-    checkLookup("preprocessor", &FakeInterfaceSet::preProcessor, false,
-                GetOEMPDFPreProcessorFromJob);
-    checkLookup("progress", &FakeInterfaceSet::progress, true, GetOEMProgressInterfaceFromJob);
-    checkLookup("raster buffer", &FakeInterfaceSet::rasterBuffer, true,
-                GetOEMRasterBufferMgrInterfaceFromJob);
-    checkLookup("raster", &FakeInterfaceSet::raster, true, GetOEMRasterInterfaceFromJob);
-    checkLookup("tag evaluator", &FakeInterfaceSet::tagEvaluator, false,
-                GetOEMTagEvaluatorInterfaceFromJob);
-    checkLookup("xobj", &FakeInterfaceSet::xobjMgr, false, GetOEMXObjMgrFromJob);
-    checkLookup("xobject resolver", &FakeInterfaceSet::xobjectResolver, false,
-                GetOEMXObjectResolverFromJob);
+#define ZYRTEST_LOOKUP(slot, required, lookup)                                                     \
+    checkLookup(#slot, &FakeInterfaceSet::slot, required, lookup)
+    ZYRTEST_LOOKUP(calibration, true, GetOEMCalibrationMgrInterfaceFromJob);
+    ZYRTEST_LOOKUP(cutting, false, GetOEMCuttingInfoMgrInterfaceFromJob);
+    ZYRTEST_LOOKUP(colorAdjustment, false, GetDeviceColorAdjustmentFromJob);
+    ZYRTEST_LOOKUP(frameMarker, true, GetOEMFrameMarkerFactoryInterfaceFromJob);
+    ZYRTEST_LOOKUP(preProcessor, false, GetOEMPDFPreProcessorFromJob);
+    ZYRTEST_LOOKUP(progress, true, GetOEMProgressInterfaceFromJob);
+    ZYRTEST_LOOKUP(rasterBuffer, true, GetOEMRasterBufferMgrInterfaceFromJob);
+    ZYRTEST_LOOKUP(raster, true, GetOEMRasterInterfaceFromJob);
+    ZYRTEST_LOOKUP(tagEvaluator, false, GetOEMTagEvaluatorInterfaceFromJob);
+    ZYRTEST_LOOKUP(xobjMgr, false, GetOEMXObjMgrFromJob);
+    ZYRTEST_LOOKUP(xobjectResolver, false, GetOEMXObjectResolverFromJob);
+#undef ZYRTEST_LOOKUP
     for (const bool required : {true, false})
         checkLookup("screen", &FakeInterfaceSet::screenMgr, required,
                     [required](const C_SmartPtr<ZYRPublic::I_Job>& job, ZYRPublic::I_Error& err) {

@@ -84,13 +84,13 @@ protected:
 TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
     const std::string fresh = dir.file("logs");
     ASSERT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str()));
-    EXPECT_TRUE(std::filesystem::is_directory(fresh));
-    EXPECT_FALSE(std::filesystem::exists(fresh + "/test.txt"));
+    EXPECT_TRUE(std::filesystem::is_directory(fresh) &&
+                !std::filesystem::exists(fresh + "/test.txt"));
     EXPECT_EQ(recorder.take(), (Calls{"UTInitialize(ZYRStd,0,<null>)", "UTSetOptIn(1)",
                                       "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,," + fresh + ")"}));
-    EXPECT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str())) << "a second start keeps it";
-    EXPECT_EQ(recorder.take(), Calls{});
-    EXPECT_EQ(drainErrorStack(), u"");
+    EXPECT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str()) && recorder.take().empty() &&
+                drainErrorStack().empty())
+        << "a second start keeps it";
 
     zyrtest::writeFile(dir.file("plain"), "x");
     const std::string kDefault = "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,,./AnalyticsLogs)";
@@ -121,8 +121,7 @@ TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
     EXPECT_EQ(recorder.take(), Calls{"UTCloseSession()"}) << "nothing logged while off";
 
     recorder.refuseSessions(true);
-    EXPECT_FALSE(Farlamp::StartSession(true, wide(fresh).c_str()));
-    EXPECT_FALSE(Farlamp::LoggingEnabled());
+    EXPECT_FALSE(Farlamp::StartSession(true, wide(fresh).c_str()) || Farlamp::LoggingEnabled());
 }
 
 TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
@@ -209,8 +208,8 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
                          "Parameter3,", "Fatal,1"}));
     EXPECT_EQ(drainErrorStack(), u"");
     Farlamp::LogZYRError(static_cast<eZYRErrorType>(35), nullptr, nullptr);
-    EXPECT_EQ(recorder.take()[2], "UTAddToGroup(104,Type,kZYRErrorModuleNotInitialized)");
-    EXPECT_EQ(drainErrorStack(), u"");
+    EXPECT_TRUE(recorder.take()[2] == "UTAddToGroup(104,Type,kZYRErrorModuleNotInitialized)" &&
+                drainErrorStack().empty());
     int id = 105;
     for (const int type : {2, 36}) {
         Farlamp::LogZYRError(static_cast<eZYRErrorType>(type), "Area", nullptr);

@@ -178,8 +178,8 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
     const auto rec = zeroed<HardwareInfoRec>();
     std::memset(rec.get(), 0xAB, sizeof *rec); // every query zero-fills the record first
     ASSERT_TRUE(info->getProcessorAndOSInfo(rec.get()));
-    EXPECT_TRUE(rec->reserved1[0] == 0 && rec->numberOfDisks == 0);
-    EXPECT_EQ(std::u16string(rec->computerName), u"printhost");
+    EXPECT_TRUE(rec->reserved1[0] == 0 && rec->numberOfDisks == 0 &&
+                std::u16string(rec->computerName) == u"printhost");
     std::wstring processor = L"\tProcessor 1\n\t\tCaption: x86_64 Family 6 Model 158 Stepping 9\n"
                              L"\t\tCurrentClockSpeed: 1200 Mhz\n\t\tExtClock: 0 MHz\n"
                              L"\t\tL2CacheSize: 512 KB\n\t\tL3CacheSize: 8192 KB\n"
@@ -197,9 +197,9 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
 
     ASSERT_TRUE(info->getMemoryInfo(rec.get()));
     ASSERT_EQ(rec->numberOfMemoryModules, 3u);
-    EXPECT_TRUE(rec->memory[0].capacity == 8192ull << 20 && rec->memory[0].speed == 3200);
-    EXPECT_TRUE(rec->memory[1].capacity == 32768ull << 20 && rec->memory[1].speed == 2666);
-    EXPECT_EQ(rec->memory[2].capacity, 512ull << 10);
+    EXPECT_TRUE(rec->memory[0].capacity == 8192ull << 20 && rec->memory[0].speed == 3200 &&
+                rec->memory[1].capacity == 32768ull << 20 && rec->memory[1].speed == 2666 &&
+                rec->memory[2].capacity == 512ull << 10);
 
     ASSERT_TRUE(info->getDiskInfo(rec.get()));
     std::wostringstream disks;
@@ -239,8 +239,8 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
                 "\nmodel name\t: " + std::string(100, 'x') + "\n");
         ASSERT_TRUE(info->getProcessorAndOSInfo(rec.get()));
         EXPECT_EQ(std::u16string(rec->processors[0].manufacturer), v.manufacturer);
-        EXPECT_EQ(std::u16string(rec->processors[0].name), std::u16string(59, u'x'));
-        EXPECT_EQ(rec->processors[0].numberOfCores, 1u) << "one per processor without cpu cores";
+        EXPECT_TRUE(std::u16string(rec->processors[0].name) == std::u16string(59, u'x') &&
+                    rec->processors[0].numberOfCores == 1u);
     }
 
     put(root.path(), "sys/firmware/dmi/tables/DMI", dmiTable().substr(0, 70));
@@ -252,8 +252,7 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
                 rec->memory[0].speed == 0);
 
     fs::remove_all(root.path() + "/etc");
-    EXPECT_FALSE(info->getProcessorAndOSInfo(rec.get()));
-    EXPECT_EQ(rec->numberOfProcessors, 1u);
+    EXPECT_TRUE(!info->getProcessorAndOSInfo(rec.get()) && rec->numberOfProcessors == 1u);
     put(root.path(), "usr/lib/os-release", "PRETTY_NAME=Plain\n");
     ASSERT_TRUE(info->getProcessorAndOSInfo(rec.get()));
     EXPECT_EQ(std::u16string(rec->osCaption), u"Plain");
@@ -299,9 +298,8 @@ TEST(IHardwareInfoTest, PerformanceFromMeminfoAndTwoStatSamples) {
     ASSERT_TRUE(source.run("SELECT * FROM Win32_PerfFormattedData_PerfOS_Memory", rows));
     EXPECT_EQ(text(), "CommitLimit=12641974272 CommittedBytes=4213991424 "
                       "PercentCommittedBytesInUse=33 ");
-    EXPECT_FALSE(source.run("SELECT * FROM Win32_BIOS", rows));
-    EXPECT_FALSE(source.run("SELECT Name FROM Win32_Processor", rows));
-    EXPECT_TRUE(rows.empty());
+    EXPECT_FALSE(source.run("SELECT * FROM Win32_BIOS", rows) ||
+                 source.run("SELECT Name FROM Win32_Processor", rows) || !rows.empty());
 
     const auto info = infoFor(root.path());
     auto perf = zeroed<PerformanceRec>();

@@ -54,10 +54,9 @@ TEST_F(IImpZYRAnalyticsManagerTest, InitFollowsTheSession) {
     EXPECT_TRUE(ZYRAnalyticsManagerInit());
     IZYRAnalyticsManager* const first = GetZYRAnalyticsManager();
     EXPECT_TRUE(first && !ZYRIsAnalyticsActive() && !CZYRAnalyticsData().isAnalyticsEnabled());
-    EXPECT_TRUE(ZYRAnalyticsManagerInit()); // a no-op while running
-    EXPECT_EQ(GetZYRAnalyticsManager(), first);
-    EXPECT_TRUE(ZYRAnalyticsManagerTerm());
-    EXPECT_EQ(GetZYRAnalyticsManager(), nullptr);
+    EXPECT_TRUE(ZYRAnalyticsManagerInit() && GetZYRAnalyticsManager() == first)
+        << "a no-op while running";
+    EXPECT_TRUE(ZYRAnalyticsManagerTerm() && !GetZYRAnalyticsManager());
     EXPECT_EQ(recorder.take(), (Calls{"UTInitialize(ZYRStd,0,<null>)", "UTSetOptIn(0)",
                                       "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,,./AnalyticsLogs)",
                                       "UTCloseSession()"}));
@@ -68,8 +67,7 @@ TEST_F(IImpZYRAnalyticsManagerTest, InitFollowsTheSession) {
     EXPECT_TRUE(ZYRAnalyticsManagerInit());
     EXPECT_TRUE(!GetZYRAnalyticsManager() && !ZYRIsAnalyticsActive() && !Farlamp::LoggingEnabled());
     (void)recorder.take();
-    EXPECT_TRUE(ZYRAnalyticsManagerTerm() && ZYRAnalyticsManagerTerm());
-    EXPECT_EQ(recorder.take(), Calls{});
+    EXPECT_TRUE(ZYRAnalyticsManagerTerm() && ZYRAnalyticsManagerTerm() && recorder.take().empty());
 }
 
 TEST_F(IImpZYRAnalyticsManagerTest, RecordsAreLoggedInEnqueueOrder) {

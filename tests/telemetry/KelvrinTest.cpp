@@ -60,10 +60,8 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     ASSERT_NE(session, nullptr);
     int group = 7;
     newGroup(session, "G", "", "G", group, nullptr, 0);
-    EXPECT_EQ(group, 0);
     close(session);
-    EXPECT_EQ(session, nullptr);
-    EXPECT_FALSE(std::filesystem::exists(folder));
+    EXPECT_TRUE(group == 0 && session == nullptr && !std::filesystem::exists(folder));
 
     setOptIn(1);
     start(session, "Print", "P", "1.2.3.4", "1.2", nullptr, folder.c_str());
@@ -113,11 +111,10 @@ TEST(KelvrinTest, RecordsReachTheSessionFile) {
     ZYRAnalyticsManagerTerm();
     ZYRSetAnalyticsActive(false);
     ZYRSetAnalyticsLogFolder(nullptr);
-
     const std::vector<Lines> files = sessions(dir.path());
-    ASSERT_EQ(files.size(), 1u);
-    ASSERT_GE(files[0].size(), 4u);
+    ASSERT_TRUE(files.size() == 1 && files[0].size() >= 4);
     EXPECT_NE(files[0][0].find(R"("folder":")" + dir.path() + "\""), std::string::npos);
-    EXPECT_EQ(files[0][2], R"({"group":0,"key":"NumWorkers","type":"value","value":"3"})");
-    EXPECT_EQ(files[0].back(), R"({"type":"session_close"})");
+    EXPECT_EQ(
+        files[0][2] + files[0].back(),
+        R"({"group":0,"key":"NumWorkers","type":"value","value":"3"}{"type":"session_close"})");
 }

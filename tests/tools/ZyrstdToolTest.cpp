@@ -209,8 +209,8 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
     EXPECT_EQ(listing(), (Args{"back.bin", "bad.a85", "bad.hex", "in.bin", "in.txt"}))
         << "no output, no temporary file";
     zyrtest::writeFile(out, "precious");
-    EXPECT_EQ(zyrstd({"decode", "ascii85", badA85, out}).exitCode, 1);
-    EXPECT_EQ(readFile(out), "precious");
+    EXPECT_TRUE(zyrstd({"decode", "ascii85", badA85, out}).exitCode == 1 &&
+                readFile(out) == "precious");
 }
 
 TEST_F(ZyrstdToolTest, HwinfoPrintsTheReportsInUtf8) {
@@ -241,8 +241,8 @@ TEST_F(ZyrstdToolTest, HwinfoPrintsTheReportsInUtf8) {
     file("root/proc/meminfo", "MemTotal:        1048576 kB\n");
     const Outcome partial = zyrstd({"hwinfo", "--root", root});
     EXPECT_EQ(partial.exitCode, 1);
-    EXPECT_NE(partial.out.find("\tMemory 1\n\t\tCapacity: 1024 MB\n"), std::string::npos);
-    EXPECT_NE(partial.out.find("\nTimer Accuracy -- "), std::string::npos);
+    EXPECT_TRUE(partial.out.find("\tMemory 1\n\t\tCapacity: 1024 MB\n") != std::string::npos &&
+                partial.out.find("\nTimer Accuracy -- ") != std::string::npos);
     std::string err;
     for (const char* what : {"processors and operating system", "disks", "memory performance",
                              "processor performance"})

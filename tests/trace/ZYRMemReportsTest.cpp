@@ -26,10 +26,9 @@ struct HostTrace {
 private:
     C_SmartPtr<ZYRPublic::I_Job> makeJob(uint32_t all) {
         closeTraceLogPath();
-        CZYRDict config;
+        CZYRDict config, params;
         config.set(CZYRUniString("Path"), CZYRUniString("stdout"));
         config.set(CZYRUniString("All"), all);
-        CZYRDict params;
         params.set(CZYRUniString("ZYRTraceMsg"), config);
         return zyrtest::makeJob(params, &host);
     }
@@ -80,9 +79,9 @@ TEST(ZYRMemReportsTest, UsageReportLevelsAndLayout) {
                           &current, &tuma, &tumaInterp, &jov, &jovInterp),
               5)
         << one;
-    EXPECT_GT(current, 0u);
-    EXPECT_EQ(one.find('\n'), one.size() - 1) << "no process figures below level 4";
-    EXPECT_TRUE(startsWith(brief.host->calls.back(), "whole Memory/General L2: L Current "));
+    EXPECT_TRUE(current > 0 && one.find('\n') == one.size() - 1 &&
+                startsWith(brief.host->calls.back(), "whole Memory/General L2: L Current "))
+        << "no process figures below level 4";
 
     HostTrace detailed(4);
     const std::string four = detailed.report(static_cast<ReportMemoryUsageType>(9));
@@ -109,9 +108,9 @@ TEST(ZYRMemReportsTest, AddressSpaceMap) {
         DumpVMStatistics(t->trace);
     EXPECT_TRUE(low.host->calls.empty());
     ASSERT_EQ(totals.host->calls.size(), 5u);
-    EXPECT_EQ(totals.host->calls[0], "begin Memory/Performance L4: Virtual Memory Statistics");
-    EXPECT_TRUE(startsWith(totals.host->calls[1], "text: Totals: Commit "));
-    EXPECT_EQ(totals.host->calls[4], "end");
+    EXPECT_TRUE(totals.host->calls[0] == "begin Memory/Performance L4: Virtual Memory Statistics" &&
+                startsWith(totals.host->calls[1], "text: Totals: Commit ") &&
+                totals.host->calls[4] == "end");
     std::vector<std::string> calls; // the texts of the message's parts
     for (const std::string& call : full.host->calls)
         calls.push_back(call.substr(call.find(": ") + 2));
