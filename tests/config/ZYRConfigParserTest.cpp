@@ -14,22 +14,18 @@ using namespace ZYRStd;
 namespace {
 
 struct Parsed {
-    std::string pairs;
-    std::string lines;
-    void add(const std::string& item, unsigned int line) {
-        pairs += (pairs.empty() ? "" : "|") + item;
-        lines += (lines.empty() ? "" : ",") + std::to_string(line);
-    }
+    std::string pairs, lines;
 };
 
 class Collector : public IZYRConfigParserLineCBProc {
 public:
     explicit Collector(Parsed& out) : out_(out) {}
     void atLine(unsigned int line) override { line_ = line; }
-    void proc(const char* key, const char* value) override {
-        out_.add(std::string(key) + "=" + value, line_);
+    void proc(const char* key, const char* value) override { add(std::string(key) + "=" + value); }
+    void add(const std::string& item) {
+        out_.pairs += (out_.pairs.empty() ? "" : "|") + item;
+        out_.lines += (out_.lines.empty() ? "" : ",") + std::to_string(line_);
     }
-    unsigned int line() const { return line_; }
 
 private:
     Parsed& out_;
@@ -61,7 +57,7 @@ Parsed collect(const std::function<void(Collector&)>& parse) {
     if (error != "no error") {
         EXPECT_EQ(error,
                   "13: Setup file is missing Key Value (source/zyr/std/ZYRConfigParser:178)");
-        out.add("!", collector.line());
+        collector.add("!");
     }
     return out;
 }
