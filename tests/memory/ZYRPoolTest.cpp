@@ -36,6 +36,7 @@ struct Supplier {
         if (self->failAll || (self->failEvery && self->allocCalls % self->failEvery == 0))
             return nullptr;
         void* p = std::malloc(bytes ? bytes : 1);
+        std::memset(p, 0xA5, bytes); // no zero word by chance
         self->live[p] = bytes;
         return p;
     }
@@ -188,7 +189,8 @@ TEST(VariableSizeAllocatorTest, RandomTraceAgainstModel) {
                         got = cachedSize;
                     } else if (large) {
                         ASSERT_EQ(s.freedBytes - freed, cached ? cachedSize + 16ull : 0ull);
-                        ASSERT_TRUE(!p || (obtained == size && s.live.at(p - 16) == size + 16));
+                        ASSERT_TRUE(!p || (obtained == size && s.live.at(p - 16) == size + 16 &&
+                                           word(p - 16) == 0));
                     } else if (p) {
                         ASSERT_EQ(expected ? p - 8 : nullptr, expected) << "best fit and order";
                         ASSERT_TRUE(expected ? s.allocCalls == calls : word(p - 16) == pageSize);
