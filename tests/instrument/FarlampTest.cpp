@@ -258,6 +258,11 @@ TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
               (Calls{"UTLogEvent(Job,,GlobalRasterization,0)", "UTLogEvent(Job,,ZYREnableMTR,0)"}));
     Farlamp::FlushJob(1.0); // no job group: only the events
     EXPECT_EQ(recorder.take(), Calls{"UTLogEvent(Job,,CachePlacedObject,0)"});
+    Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false);
+    Farlamp::CloseSession();
+    start();
+    EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, true), 0u)
+        << "a closed session's counts are dropped";
 }
 
 TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {

@@ -50,7 +50,7 @@ std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB 
 }
 
 std::string dmiTable() {
-    return std::string("\4\10\0\0\0\0\0\0\0\0", 10) + memoryDevice(8192, 3200) +
+    return std::string("\4\10\0\0\0\0\0\0\0\0\1\4\0\0\0\0", 16) + memoryDevice(8192, 3200) +
            memoryDevice(0, 0) + memoryDevice(0x7FFF, 2666, 32768) + memoryDevice(0x8000 | 512, 0) +
            std::string("\177\4\0\0\0\0", 6);
 }
