@@ -303,8 +303,9 @@ TEST(IHardwareInfoTest, PerformanceFromMeminfoAndTwoStatSamples) {
 
     const auto info = infoFor(root.path());
     auto perf = zeroed<PerformanceRec>();
+    std::memset(perf.get(), 0xAB, sizeof *perf);
     ASSERT_TRUE(info->getCPUPerformance(perf.get()));
-    EXPECT_TRUE(perf->numberOfCores == 2 && perf->totalProcessorUse == 0);
+    EXPECT_TRUE(perf->numberOfCores == 2 && perf->totalProcessorUse == 0 && perf->commitLimit == 0);
     ASSERT_TRUE(info->getMemoryPerformance(perf.get()));
     EXPECT_EQ(perf->numberOfCores, 0u) << "the second query zero-filled the first one's data";
     EXPECT_TRUE(perf->commitLimit == 12641974272ull && perf->committedBytes == 4213991424ull &&
