@@ -118,7 +118,9 @@ TEST_F(ZYRDMMTest, NormalFlushAsksOnlyClientsLargeEnoughLargestFirst) {
         text = "---- flushable client\x92s total memory (before call): <" + text +
                " bytes> \t\t\t\t\t\t   \n---- flushable client\x92s total memory (after call): <" +
                text + " bytes> \n";
-    EXPECT_EQ(closeLog(),
+    const std::string whileOpen = zyrtest::readFile(logPath_); // written line by line
+    EXPECT_EQ(closeLog(), whileOpen);
+    EXPECT_EQ(whileOpen,
               "Client unknown is asking for 40 bytes with severity <0>\n"
               "-- Calling flushing client : <large> to arrange memory with severity <0> "
               "[memory need to be flushed = 40 bytes]\n-- Status :<flushing : Failed> \n" +
