@@ -1,7 +1,6 @@
 // Reference counting: the internal count base, the public count member, and their pointers.
 #pragma once
 
-#include <atomic>
 #include <utility>
 
 #include "CZYRBaseRefCnt.h"

@@ -5,6 +5,7 @@
 #include <dlfcn.h>
 
 #include <array>
+#include <atomic>
 #include <cstdio>
 #include <cstring>
 #include <filesystem>
