@@ -25,7 +25,7 @@ public:
     ZYRStd::CZYRSmartZYRRefPtr<ZYRFileName::IZYRFileName>
     createFileName(const ZYRStd::CZYRUniString& path) override {
         return ZYRStd::CZYRSmartZYRRefPtr<ZYRFileName::IZYRFileName>(
-            new CPosixFileName(ZYRStd::UniStringToWString(path)));
+            new CPosixFileName(ZYRFileSys::pathUnitsOf(path)));
     }
 };
 
@@ -79,47 +79,7 @@ ZYRFactory::IZYRFactory* posixFileNameFactory() {
 
 CZYRWString utf8ToUTF16(const char* text) {
     CZYRWString out;
-    const auto* p = reinterpret_cast<const unsigned char*>(text);
-    while (*p) {
-        const unsigned char lead = *p;
-        char32_t c = lead;
-        unsigned int extra = 0;
-        if (lead >= 0xC2 && lead <= 0xDF) {
-            c = lead & 0x1F;
-            extra = 1;
-        } else if (lead >= 0xE0 && lead <= 0xEF) {
-            c = lead & 0x0F;
-            extra = 2;
-        } else if (lead >= 0xF0 && lead <= 0xF4) {
-            c = lead & 0x07;
-            extra = 3;
-        } else if (lead >= 0x80) {
-            out += u'\uFFFD';
-            ++p;
-            continue;
-        }
-        ++p;
-        bool ok = true;
-        for (unsigned int i = 0; i < extra; ++i, ++p) {
-            if ((*p & 0xC0) != 0x80) {
-                ok = false;
-                break;
-            }
-            c = (c << 6) | (*p & 0x3F);
-        }
-        const char32_t lowest[] = {0, 0x80, 0x800, 0x10000};
-        if (!ok || c < lowest[extra] || c > 0x10FFFF || (c >= 0xD800 && c <= 0xDFFF)) {
-            out += u'\uFFFD';
-            continue;
-        }
-        if (c >= 0x10000) {
-            c -= 0x10000;
-            out += static_cast<char16_t>(0xD800 + (c >> 10));
-            out += static_cast<char16_t>(0xDC00 + (c & 0x3FF));
-        } else {
-            out += static_cast<char16_t>(c);
-        }
-    }
+    ZYRStd::detail::appendPathUnits(out, text, std::char_traits<char>::length(text));
     return out;
 }
 

@@ -55,7 +55,8 @@ ZYRFactory::IZYRFactory* posixFileNameFactory();
 // descriptor; both go back through the record's `free` and `close`.
 ZYRPublic::_t_ZYRPDLFileSysRec posixFileProcs();
 
-// UTF-8 to UTF-16; malformed bytes become U+FFFD.
+// Path bytes to UTF-16: UTF-8, and each byte outside it as the lone surrogate U+DC80 +
+// (byte - 0x80), which the library turns back into that byte.
 ZYRStd::CZYRWString utf8ToUTF16(const char* text);
 
 // The host memory procedures over the C runtime heap (malloc, realloc, free).

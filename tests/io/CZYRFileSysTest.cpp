@@ -17,6 +17,7 @@
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/io/CZYRBaseStream.h"
 #include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/io/posix/ZYRPosixIO.h"
 
 namespace {
@@ -416,6 +417,41 @@ TEST_F(FileOperationsTest, CopyRemoveRenameEnumerateAndMap) {
                    "Error mapping empty file");
     expectOpFailed([&] { ZYRStd::CZYRMemMapFStream m(name("missing.bin"), kZYRStreamRead, 0, 0); },
                    "error opening file");
+}
+
+// Names in several scripts, and bytes that are not UTF-8 (a lone byte, an overlong form, an
+// encoded surrogate, a cut sequence, a lead byte past U+10FFFF), open and round-trip.
+TEST_F(FileOperationsTest, PathsAreBytesAndEveryNameRoundTrips) {
+    EXPECT_TRUE(ZYRHostKit::utf8ToUTF16("d\xc3\xa9j\xc3\xa0\xf0\x9f\x98\x80\xff") ==
+                ZYRStd::CZYRWString(u"d\u00e9j\u00e0\U0001F600\xDCFF"));
+    const std::string names[] = {"d\xc3\xa9j\xc3\xa0",       "\xce\x95\xce\xbb\xce\xbb",
+                                 "\xe6\x97\xa5\xe6\x9c\xac", "\xf0\x9f\x98\x80 smile",
+                                 "latin1 \xe9t\xe9",         "\xc0\xaf overlong",
+                                 "\xed\xa0\x80 surrogate",   "cut \xe2\x82",
+                                 "\xf5\x80\x80\x80 beyond"};
+    const std::string dir = fx_.dir_.file("names");
+    CZYRFileSys::makeDirectory(CZYRFileName(dir.c_str()));
+    for (const std::string& leaf : names) {
+        const std::string path = dir + "/" + leaf;
+        const ZYRStd::CZYRWString wide = ZYRHostKit::utf8ToUTF16(path.c_str());
+        EXPECT_EQ(ZYRFileSys::utf16ToUTF8(wide).c_str(), path);
+        {
+            CZYRSmartZYRRefPtr<IZYRFStream> out =
+                CZYRFileSys::createFileStream(CZYRFileName(wide), kZYRStreamWrite, false);
+            out->write(leaf.data(), 1, static_cast<unsigned int>(leaf.size()));
+        }
+        EXPECT_EQ(readFile(path), leaf) << "created under its own bytes";
+    }
+    struct Bytes : ZYRFileSys::IDirEnumCBProc {
+        bool operator()(const ZYRStd::CZYRUniString& path, unsigned int) override {
+            const std::string bytes = ZYRFileSys::nativePathOf(path).c_str();
+            found.insert(bytes.substr(bytes.rfind('/') + 1));
+            return true;
+        }
+        std::set<std::string> found;
+    } listed;
+    EXPECT_TRUE(CZYRFileSys::enumDirectory(CZYRFileName(dir.c_str()), listed));
+    EXPECT_EQ(listed.found, std::set<std::string>(std::begin(names), std::end(names)));
 }
 
 // A scripted system call: each step is the result of one call (with errno for -1).

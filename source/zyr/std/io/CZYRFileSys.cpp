@@ -3,6 +3,7 @@
 
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 
 namespace ZYRStd {
 
@@ -33,7 +34,7 @@ CZYRSmartZYRRefPtr<IZYRFileName> fromFactory(const CZYRUniString& path) {
 
 CZYRFileName::CZYRFileName(IZYRFileName* name, bool addRef) : name_(name, addRef) {}
 
-CZYRFileName::CZYRFileName(const char* path) : name_(fromFactory(CZYRUniString(path, "UTF-8"))) {}
+CZYRFileName::CZYRFileName(const char* path) : name_(fromFactory(ZYRFileSys::uniPathOf(path))) {}
 
 CZYRFileName::CZYRFileName(const CZYRWString& path)
     : name_(fromFactory(CZYRUniString(path.c_str()))) {}

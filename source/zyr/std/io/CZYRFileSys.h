@@ -21,7 +21,7 @@ public:
     CZYRFileName& operator=(const CZYRFileName& other) = default;
     // `addRef` false adopts the caller's reference.
     CZYRFileName(ZYRFileName::IZYRFileName* name, bool addRef);
-    // Narrow text is UTF-8, as POSIX path bytes are.
+    // Narrow text is path bytes: UTF-8, and any other byte kept as it is.
     CZYRFileName(const char* path);
     CZYRFileName(const CZYRWString& path);
     CZYRFileName(const CZYRUniString& path);

@@ -1,10 +1,10 @@
 // A file through the host's procedure record.
 #include "zyr/std/io/internal/ZYRFileSys_OEM.h"
 
-#include <cstring>
 #include <memory>
 
 #include "zyr/std/core/CZYRError.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 
 namespace ZYROEMFileSys {
 
@@ -69,8 +69,7 @@ CFile::CFile(void* diPath, unsigned int mode, ZYRPublic::_t_ZYRPDLFileSysRec* re
             const std::unique_ptr<char, decltype(hostFree)> text(record_->diPathToPath(diPath_, 0),
                                                                  hostFree);
             if (text)
-                path_ = ZYRStd::CZYRUniString(
-                    text.get(), static_cast<unsigned int>(std::strlen(text.get())), "UTF-8");
+                path_ = ZYRFileSys::uniPathOf(text.get());
         }
     } catch (...) {
         freeDIPath();

@@ -41,13 +41,15 @@ bool allAscii(const char* text, size_t length) {
     return true;
 }
 
-bool wellFormedUtf16(const char16_t* text, size_t length) {
+// Well-formed UTF-16, or a path: a lone U+DC80..U+DCFF is a file-name byte outside UTF-8,
+// kept as it is so that the name converts back to the same bytes.
+bool keepsUnits(const char16_t* text, size_t length) {
     for (size_t i = 0; i < length; ++i) {
         if (U16_IS_LEAD(text[i])) {
             if (i + 1 == length || !U16_IS_TRAIL(text[i + 1]))
                 return false;
             ++i;
-        } else if (U16_IS_TRAIL(text[i])) {
+        } else if (U16_IS_TRAIL(text[i]) && (text[i] < 0xDC80 || text[i] > 0xDCFF)) {
             return false;
         }
     }
@@ -105,7 +107,7 @@ public:
         ZYRErrorBoundaryVoid(err, "Error in IImp_ZYRUniString constructor", kSource, __LINE__, [&] {
             id_ = createUniqueID();
             const size_t n = unitLength(text);
-            if (wellFormedUtf16(text, n)) {
+            if (keepsUnits(text, n)) {
                 text_.setTo(text, static_cast<int32_t>(n));
                 if (text_.isBogus()) {
                     text_ = icu::UnicodeString();

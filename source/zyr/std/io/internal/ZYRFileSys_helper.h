@@ -2,6 +2,8 @@
 // call of the streams and the conversions between path texts.
 #pragma once
 
+#include <string>
+#include <string_view>
 #include <utility>
 
 #include "IZYRFileName.h"
@@ -27,12 +29,24 @@ unsigned int reportStreamError(ZYRPublic::eZYRErrorType& err, Body&& body) noexc
     return 0;
 }
 
-// UTF-16 to UTF-8, the encoding of POSIX path bytes. A lone surrogate becomes U+FFFD.
+// A UTF-16 path as the bytes the file system is given (UTF-8, with escaped bytes restored).
 inline ZYRStd::CZYRString utf16ToUTF8(const char16_t* text, unsigned int length) {
     ZYRStd::CZYRString out;
     out.str().reserve(length);
-    ZYRStd::detail::appendUTF8(out.str(), text, length);
+    ZYRStd::detail::appendPathBytes(out.str(), text, length);
     return out;
+}
+
+// Path bytes as the library's path text; bytes outside UTF-8 travel as lone surrogates.
+inline ZYRStd::CZYRUniString uniPathOf(const char* bytes, std::size_t length) {
+    std::u16string units;
+    units.reserve(length);
+    ZYRStd::detail::appendPathUnits(units, bytes, length);
+    return ZYRStd::CZYRUniString(units.c_str());
+}
+
+inline ZYRStd::CZYRUniString uniPathOf(const char* bytes) {
+    return uniPathOf(bytes, std::char_traits<char>::length(bytes));
 }
 
 inline ZYRStd::CZYRString utf16ToUTF8(const ZYRStd::CZYRWString& text) {
@@ -49,9 +63,21 @@ inline ZYRStd::CZYRUniString uniStringOf(const ZYRStd::CZYRWString& text) {
     return ZYRStd::CZYRUniString(text.c_str());
 }
 
+// The units of a path as they are, up to the first zero unit: the wide conversion of strings
+// would make the lone surrogate of an escaped byte into U+FFFD.
+inline ZYRStd::CZYRWString pathUnitsOf(const ZYRStd::CZYRUniString& path) {
+    unsigned int bytes = 0;
+    const char* data = path.isValid() ? path.getImpl()->getUTF16LEBuffer(&bytes) : nullptr;
+    if (!data)
+        return {};
+    std::u16string_view units(reinterpret_cast<const char16_t*>(data), bytes / 2);
+    units = units.substr(0, units.find(u'\0'));
+    return ZYRStd::CZYRWString(units.data(), static_cast<unsigned int>(units.size()));
+}
+
 // The path bytes the operating system is given.
 inline ZYRStd::CZYRString nativePathOf(const ZYRStd::CZYRUniString& path) {
-    return utf16ToUTF8(ZYRStd::UniStringToWString(path));
+    return utf16ToUTF8(pathUnitsOf(path));
 }
 
 } // namespace ZYRFileSys

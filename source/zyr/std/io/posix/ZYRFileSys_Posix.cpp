@@ -76,7 +76,7 @@ CZYRSmartZYRRefPtr<IZYRFStream> IImpZYRFileSys_Posix::createTmpFileStream(IZYRFi
     Descriptor fd(::mkostemps(pattern.str().data(), 4, O_CLOEXEC));
     checkCall(fd.get() >= 0, "File rename failed", __LINE__);
     fd.close();
-    const CZYRUniString path(pattern.c_str(), pattern.length(), "UTF-8");
+    const CZYRUniString path = uniPathOf(pattern.c_str(), pattern.length());
     std::unique_ptr<IFile> file(new CFile(path, mode));
     return CZYRSmartZYRRefPtr<IZYRFStream>(new IImpZYRFStream(std::move(file), mode));
 }
@@ -231,7 +231,7 @@ bool IImpZYRFileSys_Posix::enumDirectory(IZYRFileName* dir, ZYRFileSys::IDirEnum
             attributes |= ZYRFileSys::kZYRFileAttrHidden;
         CZYRString full = path;
         full += name;
-        result = cb(CZYRUniString(full.c_str(), full.length(), "UTF-8"), attributes);
+        result = cb(uniPathOf(full.c_str(), full.length()), attributes);
         if (!result)
             break;
     }

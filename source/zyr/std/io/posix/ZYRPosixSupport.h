@@ -25,6 +25,7 @@ namespace ZYRPosixFileSys {
 using namespace ZYRStreams;
 using ZYRFileSys::IImpZYRMemStream;
 using ZYRFileSys::reportStreamError;
+using ZYRFileSys::uniPathOf;
 using ZYRFileSys::utf16ToUTF8;
 using ZYRFileSys::widePathOf;
 using ZYRStd::CZYRError;
@@ -108,7 +109,7 @@ inline CZYRString systemTempDir() {
 
 // One level: the parent must exist.
 inline void prepareDirectory(const CZYRUniString& dir, const char* tooLong, int line) {
-    const CZYRWString wide = ZYRStd::UniStringToWString(dir);
+    const CZYRWString wide = ZYRFileSys::pathUnitsOf(dir);
     if (wide.length() >= 246)
         throw CZYRError(ZYRPublic::kZYRErrorLimitCheck, tooLong, kSource, line);
     if (wide.empty())
