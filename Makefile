@@ -1,7 +1,7 @@
 # Two commands do everything on a fresh Debian machine: `make demo` and `make test`.
 # Each target installs the Debian packages it needs and no more.
 BUILD_PACKAGES   := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev nlohmann-json3-dev
-TEST_PACKAGES    := $(BUILD_PACKAGES) googletest libgtest-dev python3 binutils
+TEST_PACKAGES    := $(BUILD_PACKAGES) googletest libgtest-dev python3 binutils abigail-tools
 BENCH_PACKAGES   := $(BUILD_PACKAGES) libbenchmark-dev libssl-dev libinih-dev libabsl-dev
 FUZZ_PACKAGES    := $(BUILD_PACKAGES) clang libclang-rt-14-dev
 PACKAGE_PACKAGES := $(BUILD_PACKAGES) dpkg-dev file
@@ -20,7 +20,7 @@ FUZZ_SECONDS ?= 60
 SOAK_SECONDS ?= 60
 
 .PHONY: all deps deps-test deps-bench deps-fuzz deps-package build demo test test-normal \
-        test-asan test-tsan bench fuzz soak install package package-check clean format
+        test-asan test-tsan bench fuzz soak install package package-check clean format abi-baseline
 
 all: build
 
@@ -130,6 +130,13 @@ package-check: package
 	  cmake --build $(PACKAGE_BUILD)/consumer && ./$(PACKAGE_BUILD)/consumer/app
 	zyrstd --help > /dev/null
 	DEBIAN_FRONTEND=noninteractive apt-get remove -y -qq libzyrstd-dev libzyrstd0
+
+# Records the exported interface of a normal build as the new baseline: only for a deliberate
+# change (an incompatible one also bumps the SONAME; see the README).
+abi-baseline: deps-test
+	cmake -S . -B $(BUILD)-test $(CMAKE_FLAGS) -DZYRSTD_BUILD_TESTS=ON -DZYRSTD_SANITIZE=
+	cmake --build $(BUILD)-test
+	tests/install/abi_test.sh $(BUILD)-test abi/libZYRStd.abi --write
 
 format:
 	clang-format -i $$(git ls-files '*.cpp' '*.h')

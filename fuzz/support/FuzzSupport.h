@@ -24,6 +24,18 @@ inline void setUpOnce() {
     (void)done;
 }
 
+// The above, and a file system: the setup-file parser reads through its memory streams.
+inline void setUpWithFileSystemOnce() {
+    setUpOnce();
+    static const ZYRHostKit::HostSession session;
+}
+
+// A broken promise of the code under test: stop here, so that the fuzzer keeps the input.
+inline void require(bool holds) {
+    if (!holds)
+        std::abort();
+}
+
 // Reads the input front to back; past its end every read answers zero.
 class Input {
 public:

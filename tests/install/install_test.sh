@@ -44,6 +44,15 @@ cmake -S "$here/consumer" -B "$work/consumer" -G Ninja -DCMAKE_PREFIX_PATH="$pre
 cmake --build "$work/consumer" >/dev/null
 "$work/consumer/app"
 
+# The worked examples, each built against the prefix and run.
+cmake -S "$here/../../examples" -B "$work/examples" -G Ninja -DCMAKE_PREFIX_PATH="$prefix" >/dev/null
+cmake --build "$work/examples" >/dev/null
+for example in startup flush_client values setup_and_trace ascii85_file; do
+    TMPDIR="$work" "$work/examples/$example" >"$work/$example.out" 2>&1 || {
+        cat "$work/$example.out"; echo "example $example failed"; exit 1
+    }
+done
+
 # The demo logs analytics through the libKelvrin.so installed beside the library; without
 # it (a host that ships none) the demo still runs and analytics stay inactive.
 export TMPDIR="$work"
