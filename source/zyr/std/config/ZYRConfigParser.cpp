@@ -13,6 +13,7 @@
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/io/CZYRBaseStream.h"
 #include "zyr/std/io/CZYRFileSys.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/memory/CZYRMemBuffer.h"
 #include "zyr/std/values/CZYRUniString.h"
 
@@ -216,9 +217,9 @@ void ParseConfigData(unsigned char* data, ZYRPublic::eZYRConfigDataType type, un
     if (type != ZYRPublic::kZYRConfigDataFilePath && type != ZYRPublic::kZYRConfigDataFilePathW)
         throw CZYRError(ZYRPublic::kZYRErrorBadParam, "In valid Config data bufer Type", kSource,
                         kInvalidTypeLine);
-    // Narrow paths are UTF-8, as POSIX path bytes are.
+    // A narrow path is the file system's bytes: UTF-8, and any other byte kept.
     const CZYRUniString path = type == ZYRPublic::kZYRConfigDataFilePath
-                                   ? CZYRUniString(reinterpret_cast<const char*>(data), "UTF-8")
+                                   ? ZYRFileSys::uniPathOf(reinterpret_cast<const char*>(data))
                                    : CZYRUniString(reinterpret_cast<const char16_t*>(data));
     CZYRBaseStream stream(CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>(
         CZYRFileSys::createFileStream(CZYRFileName(path), ZYRStreams::kZYRStreamRead, false)));

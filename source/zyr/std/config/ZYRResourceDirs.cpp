@@ -8,6 +8,7 @@
 
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
 #include "zyr/std/values/CZYRDict.h"
 #include "zyr/std/values/CZYRString.h"
@@ -194,7 +195,7 @@ void ZYRSetIccProfileDir(const char16_t* dir) {
 }
 
 void ZYRSetTempDirectory(const CZYRUniString& dir) {
-    dirs().tempDir = UniStringToString(dir).c_str();
+    dirs().tempDir = ZYRFileSys::nativePathOf(dir).c_str(); // path bytes, any name kept
 }
 
 bool ZYRFontCacheDirExist() {

@@ -4,7 +4,9 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <fcntl.h>
 #include <string_view>
+#include <unistd.h>
 
 #include "zyr/std/config/ZYRResourceDirs.h"
 #include "zyr/std/core/CZYRError.h"
@@ -14,6 +16,7 @@
 #include "zyr/std/core/internal/ZYRNoDestructor.h"
 #include "zyr/std/core/internal/ZYRUTF8.h"
 #include "zyr/std/engine/ZYROEMInterfacesInternal.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
 #include "zyr/std/values/CZYRString.h"
 
@@ -59,7 +62,12 @@ void openLogLocked(TraceLog& log, const std::string& path) {
         log.file = nullptr;
         log.path.clear();
     }
-    log.file = std::fopen(path.c_str(), "a");
+    // Appending, as fopen's "a" does, but never through a link someone else placed there.
+    const int fd =
+        ::open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0666);
+    log.file = fd >= 0 ? ::fdopen(fd, "a") : nullptr;
+    if (fd >= 0 && !log.file)
+        ::close(fd);
     if (log.file) {
         log.path = path;
     } else {
@@ -462,7 +470,7 @@ void CZYRTraceMsg::internalInit() {
                 if (textIs(path, u"stdout"))
                     sendToHost_ = true;
                 else if (path.isValid())
-                    openLogLocked(log, UniStringToUTF8String(path).c_str());
+                    openLogLocked(log, ZYRFileSys::nativePathOf(path).c_str());
                 else
                     openLogLocked(log, defaultLogPath());
             }

@@ -1,0 +1,73 @@
+// Lock annotations for clang's thread-safety analysis (-Wthread-safety): which mutex
+// guards which data, and which helpers expect it held. Other compilers see nothing.
+#pragma once
+
+#include <mutex>
+
+#if defined(__clang__)
+#define ZYR_THREAD_ANNOTATION(x) __attribute__((x))
+#else
+#define ZYR_THREAD_ANNOTATION(x)
+#endif
+
+#define ZYR_CAPABILITY(name) ZYR_THREAD_ANNOTATION(capability(name))
+#define ZYR_SCOPED_CAPABILITY ZYR_THREAD_ANNOTATION(scoped_lockable)
+#define ZYR_GUARDED_BY(m) ZYR_THREAD_ANNOTATION(guarded_by(m))
+#define ZYR_PT_GUARDED_BY(m) ZYR_THREAD_ANNOTATION(pt_guarded_by(m))
+#define ZYR_REQUIRES(...) ZYR_THREAD_ANNOTATION(requires_capability(__VA_ARGS__))
+#define ZYR_ACQUIRE(...) ZYR_THREAD_ANNOTATION(acquire_capability(__VA_ARGS__))
+#define ZYR_RELEASE(...) ZYR_THREAD_ANNOTATION(release_capability(__VA_ARGS__))
+#define ZYR_TRY_ACQUIRE(...) ZYR_THREAD_ANNOTATION(try_acquire_capability(__VA_ARGS__))
+#define ZYR_EXCLUDES(...) ZYR_THREAD_ANNOTATION(locks_excluded(__VA_ARGS__))
+#define ZYR_RETURN_CAPABILITY(m) ZYR_THREAD_ANNOTATION(lock_returned(m))
+#define ZYR_NO_THREAD_SAFETY_ANALYSIS ZYR_THREAD_ANNOTATION(no_thread_safety_analysis)
+
+namespace ZYRStd::detail {
+
+// A standard mutex the analysis can follow (libstdc++'s own carries no annotations).
+template <class Native> class ZYR_CAPABILITY("mutex") AnnotatedMutex {
+public:
+    void lock() ZYR_ACQUIRE() { native_.lock(); }
+    void unlock() ZYR_RELEASE() { native_.unlock(); }
+    bool try_lock() ZYR_TRY_ACQUIRE(true) { return native_.try_lock(); }
+    // For condition variables, which need the standard type.
+    Native& native() noexcept { return native_; }
+
+private:
+    Native native_;
+};
+
+using Mutex = AnnotatedMutex<std::mutex>;
+using RecursiveMutex = AnnotatedMutex<std::recursive_mutex>;
+
+// Holds a mutex for its scope, like std::lock_guard.
+template <class M> class ZYR_SCOPED_CAPABILITY LockGuard {
+public:
+    explicit LockGuard(M& m) ZYR_ACQUIRE(m) : m_(m) { m_.lock(); }
+    ~LockGuard() ZYR_RELEASE() { m_.unlock(); }
+    LockGuard(const LockGuard&) = delete;
+    LockGuard& operator=(const LockGuard&) = delete;
+
+private:
+    M& m_;
+};
+
+// Holds a mutex for its scope and lends it to a condition variable's wait, like
+// std::unique_lock; the analysis treats the wait as keeping the lock.
+template <class M> class ZYR_SCOPED_CAPABILITY UniqueLock {
+public:
+    explicit UniqueLock(M& m) ZYR_ACQUIRE(m) : lock_(m.native()) {}
+    ~UniqueLock() ZYR_RELEASE() = default;
+    UniqueLock(const UniqueLock&) = delete;
+    UniqueLock& operator=(const UniqueLock&) = delete;
+    void unlock() ZYR_RELEASE() { lock_.unlock(); }
+    void lock() ZYR_ACQUIRE() { lock_.lock(); }
+    std::unique_lock<std::remove_reference_t<decltype(std::declval<M&>().native())>>& native() {
+        return lock_;
+    }
+
+private:
+    std::unique_lock<std::remove_reference_t<decltype(std::declval<M&>().native())>> lock_;
+};
+
+} // namespace ZYRStd::detail
