@@ -22,7 +22,7 @@ protected:
         (void)recorder.take();
     }
     void TearDown() override {
-        recorder.setDelay(0);
+        recorder.hold(false);
         ZYRAnalyticsManagerTerm();
         ZYRSetAnalyticsActive(false);
         ZYRSetAnalyticsLogFolder(nullptr);
@@ -86,16 +86,14 @@ TEST_F(IImpZYRAnalyticsManagerTest, RecordsAreLoggedInEnqueueOrder) {
 
 TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) {
     start();
-    recorder.setDelay(50);
-    const int startedBefore = recorder.callsStarted();
-    for (unsigned int i = 0; i < 5; ++i)
-        produce(i);
-    while (recorder.callsStarted() == startedBefore)
-        std::this_thread::yield();
+    recorder.hold(true);
+    produce(0);
+    recorder.awaitHeldCall(); // the worker is inside the library with record 0
     std::thread terminator([] { ZYRAnalyticsManagerTerm(); });
     std::string error;
-    for (unsigned int i = 0; error == "no error" || error.empty(); ++i)
+    for (unsigned int i = 1; error == "no error" || error.empty(); ++i)
         error = produce(i);
+    recorder.hold(false);
     terminator.join();
     EXPECT_TRUE(zyrtest::startsWith(error, "20: Attempt to enqueue Job after ZYRTerminate "
                                            "called. (source/zyr/std/IImpZYRAnalyticsManager:"))
@@ -110,15 +108,24 @@ TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) 
                "UTCloseSession()"}));
 }
 
-TEST_F(IImpZYRAnalyticsManagerTest, ProducersNeverWaitForASleepingLibrary) {
+// Producers never wait for a stalled library, and the queue behind it stays bounded: what
+// does not fit is dropped and counted into the session at close.
+TEST_F(IImpZYRAnalyticsManagerTest, QueueBehindAStalledLibraryIsBounded) {
     start();
-    recorder.setDelay(1000);
-    std::thread producer([] {
-        for (unsigned int i = 0; i < 20; ++i)
-            produce(i);
-    });
-    producer.join();
-    for (unsigned int i = 20; i < 40; ++i)
-        produce(i);
+    recorder.hold(true);
+    produce(0);
+    recorder.awaitHeldCall();
+    constexpr unsigned int kBound = 1024, kOver = 5;
+    for (unsigned int i = 1; i <= kBound + kOver; ++i)
+        ASSERT_EQ(produce(i), "no error");
     EXPECT_EQ(recorder.take(), Calls{});
+    recorder.hold(false);
+    const Calls calls = recorder.waitFor(2 * (kBound + 1));
+    ASSERT_EQ(calls.size(), 2 * (kBound + 1));
+    EXPECT_EQ(calls.back(), "UTAddToGroup(1124,NumWorkers,1024)");
+    ZYRAnalyticsManagerTerm();
+    const Calls closing = recorder.take();
+    EXPECT_TRUE(closing.size() >= 2 &&
+                closing[closing.size() - 2] ==
+                    "UTAddToSession(DroppedRecords," + std::to_string(kOver) + ")");
 }
