@@ -5,7 +5,6 @@
 #include <unistd.h>
 
 #include <atomic>
-#include <chrono>
 #include <csignal>
 #include <cstring>
 #include <ctime>
@@ -17,11 +16,7 @@
 
 #include "Kelvrin.h"
 #include "TestSupport.h"
-#include "zyr/std/config/ZYRStartupOptions.h"
-#include "zyr/std/instrument/CZYRAnalyticsData.h"
-#include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
 
-using namespace ZYRStd;
 using Lines = std::vector<std::string>;
 
 namespace {
@@ -162,29 +157,4 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
         ::testing::ExitedWithCode(0), "");
     setOptIn(0);
     dlclose(lib);
-}
-
-TEST(KelvrinTest, RecordsReachTheSessionFile) {
-    zyrtest::TempDir dir;
-    const std::u16string folder(dir.path().begin(), dir.path().end());
-    ZYRSetAnalyticsLogFolder(folder.c_str());
-    ZYRSetAnalyticsActive(true);
-    ASSERT_TRUE(ZYRAnalyticsManagerInit());
-    ASSERT_TRUE(ZYRIsAnalyticsActive()) << "libKelvrin.so was not found beside the library";
-    CZYRAnalyticsData record;
-    record.set(CZYRUniString("DataGroupName"), CZYRUniString("DripSessionInfo"));
-    record.set(CZYRUniString("NumWorkers"), 3u);
-    record.finalize();
-    for (int i = 0;
-         i < 10000 && (sessions(dir.path()).size() != 1 || sessions(dir.path())[0].size() < 3); ++i)
-        std::this_thread::sleep_for(std::chrono::milliseconds(1));
-    ZYRAnalyticsManagerTerm();
-    ZYRSetAnalyticsActive(false);
-    ZYRSetAnalyticsLogFolder(nullptr);
-    const std::vector<Lines> files = sessions(dir.path());
-    ASSERT_TRUE(files.size() == 1 && files[0].size() >= 4);
-    EXPECT_NE(files[0][0].find(R"("folder":")" + dir.path() + "\""), std::string::npos);
-    EXPECT_EQ(
-        files[0][2] + files[0].back(),
-        R"({"group":0,"key":"NumWorkers","type":"value","value":"3"}{"type":"session_close"})");
 }

@@ -230,7 +230,8 @@ TEST_F(ZyrstdToolTest, DemoKeepsToAFolderOfItsOwn) {
     const Outcome o = zyrstd({"demo"});
     saved ? ::setenv("TMPDIR", savedText.c_str(), 1) : ::unsetenv("TMPDIR");
     EXPECT_EQ(o.exitCode, 0) << o.err;
-    EXPECT_NE(o.out.find("\"type\":\"session_close\""), std::string::npos) << o.out;
+    for (const char* line : {R"("key":"SurfaceCount","time":)", R"("type":"session_close")"})
+        EXPECT_NE(o.out.find(line), std::string::npos) << "the session file holds " << line;
     EXPECT_EQ(readFile(precious), "keep");
     EXPECT_EQ(listing(), (Args{"precious", "zyrstd-demo-dmm.log", "zyrstd-demo-trace.log"}));
 }
