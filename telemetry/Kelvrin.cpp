@@ -2,14 +2,16 @@
 // object a line) into its session folder. The format is described in the README.
 #include "Kelvrin.h"
 
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <atomic>
+#include <cerrno>
 #include <chrono>
 #include <cstdio>
+#include <cstring>
 #include <ctime>
 #include <filesystem>
-#include <fstream>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -17,8 +19,11 @@
 #include <nlohmann/json.hpp>
 
 struct Kelvrin {
-    std::mutex lock; // guards the file and the group numbers: any thread may log
-    std::ofstream out;
+    std::mutex lock; // guards the fields below: any thread may log
+    int fd = -1;     // the session file, or -1 for a session that records nothing
+    std::string path;
+    int writeError = 0; // the first write that failed; reported at close
+    unsigned long long linesLost = 0;
     int nextGroup = 0;
 };
 
@@ -26,7 +31,9 @@ namespace {
 
 using nlohmann::json;
 
+// Relaxed: a setting read on its own; nothing else is published with it.
 std::atomic<int> optInSetting{0};
+// Relaxed: only a source of distinct numbers for file names.
 std::atomic<unsigned> sessionsStarted{0};
 std::mutex productLock; // guards productName
 std::string productName = "unknown";
@@ -48,25 +55,55 @@ json bytes(const unsigned char* data, int size) {
     return out;
 }
 
-// One line per object. Texts that are not UTF-8 get U+FFFD instead of failing the line.
+// One line per object, time-stamped under the session's lock so that the lines are in time
+// order. Texts that are not UTF-8 get U+FFFD instead of failing the line.
 void write(Kelvrin* session, json object) {
-    if (!session || !session->out.is_open())
+    if (!session)
+        return;
+    const std::lock_guard guard(session->lock);
+    if (session->fd < 0)
         return;
     object["time"] = nowMs();
-    const std::string line = object.dump(-1, ' ', false, json::error_handler_t::replace);
-    const std::lock_guard guard(session->lock);
-    session->out << line << '\n';
-    session->out.flush(); // a crash later in the job keeps what was logged so far
+    const std::string line = object.dump(-1, ' ', false, json::error_handler_t::replace) + '\n';
+    // Written at once, unbuffered: a crash later in the job keeps what was logged so far.
+    size_t done = 0;
+    while (done < line.size() && session->writeError == 0) {
+        const ssize_t n = ::write(session->fd, line.data() + done, line.size() - done);
+        if (n > 0)
+            done += static_cast<size_t>(n);
+        else if (n < 0 && errno != EINTR)
+            session->writeError = errno;
+    }
+    if (done < line.size())
+        ++session->linesLost;
 }
 
-std::string sessionFileName(const std::string& product) {
+// A product name becomes part of a file name: one plain component only.
+bool plainComponent(const std::string& name) {
+    return !name.empty() && name.find_first_of("/\\") == std::string::npos &&
+           name.find("..") == std::string::npos;
+}
+
+// Creates a new session file exclusively, never through a link: a name that exists (another
+// session in the same second, or anything planted there) moves on to the next number.
+int createSessionFile(const std::filesystem::path& folder, const std::string& product,
+                      std::string& path) {
     char stamp[32];
     const std::time_t now = std::time(nullptr);
     std::tm utc{};
     gmtime_r(&now, &utc);
     std::strftime(stamp, sizeof stamp, "%Y%m%dT%H%M%SZ", &utc);
-    return product + "-" + stamp + "-" + std::to_string(getpid()) + "-" +
-           std::to_string(sessionsStarted.fetch_add(1, std::memory_order_relaxed)) + ".jsonl";
+    for (int attempt = 0; attempt < 1000; ++attempt) {
+        const unsigned n = sessionsStarted.fetch_add(1, std::memory_order_relaxed);
+        path = (folder / (product + "-" + stamp + "-" + std::to_string(getpid()) + "-" +
+                          std::to_string(n) + ".jsonl"))
+                   .string();
+        const int fd =
+            ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0644);
+        if (fd >= 0 || errno != EEXIST)
+            return fd;
+    }
+    return -1;
 }
 
 } // namespace
@@ -92,8 +129,10 @@ void UTStartSession(Kelvrin*& handle, const char* kind, const char* product, con
             const std::filesystem::path folder(folderUTF8 && *folderUTF8 ? folderUTF8 : ".");
             std::error_code ec;
             std::filesystem::create_directories(folder, ec);
-            session->out.open(folder / sessionFileName(name), std::ios::out | std::ios::trunc);
-            if (!session->out.is_open())
+            if (!plainComponent(name))
+                return; // a name that would leave the folder records nothing
+            session->fd = createSessionFile(folder, name, session->path);
+            if (session->fd < 0)
                 return; // a session that cannot record is no session
             write(session.get(), {{"type", "session_start"},
                                   {"kind", text(kind)},
@@ -162,6 +201,14 @@ void UTCloseSession(Kelvrin*& handle) {
     try {
         write(handle, {{"type", "session_close"}});
     } catch (...) {
+    }
+    if (handle->fd >= 0) {
+        // A record that did not reach the disk (a full disk) is reported, not ignored.
+        if (::close(handle->fd) != 0 && handle->writeError == 0)
+            handle->writeError = errno;
+        if (handle->writeError != 0)
+            std::fprintf(stderr, "libKelvrin: %s: %s: %llu records lost\n", handle->path.c_str(),
+                         std::strerror(handle->writeError), handle->linesLost);
     }
     delete handle;
     handle = nullptr;

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <future>
 
 #include "RecordingKelvrin.h"
 #include "TestSupport.h"
@@ -65,6 +66,7 @@ protected:
         drainErrorStack();
     }
     void TearDown() override {
+        recorder.hold(false);
         Farlamp::CloseSession();
         ZYRSetAnalyticsActive(false);
         (void)recorder.take();
@@ -74,6 +76,11 @@ protected:
         ASSERT_TRUE(Farlamp::LoggingEnabled());
         (void)recorder.take();
     }
+    // The calls made so far: a record waits for the writer, which runs calls in order.
+    Calls settled() {
+        Farlamp::LogDataObject(record("NoSuchGroup"));
+        return recorder.take();
+    }
 
     RecordingKelvrin& recorder = RecordingKelvrin::get();
     zyrtest::TempDir dir;
@@ -82,10 +89,16 @@ protected:
 } // namespace
 
 TEST_F(FarlampTest, SessionFolderIsProbedWithFallback) {
-    const std::string fresh = dir.file("logs");
+    // The probe neither follows a link into someone's file nor deletes a file of that name.
+    const std::string fresh = dir.file("logs"), precious = dir.file("precious");
+    zyrtest::writeFile(precious, "keep");
+    std::filesystem::create_directory(fresh);
+    std::filesystem::create_symlink(precious, fresh + "/test.txt");
+    zyrtest::writeFile(fresh + "/.zyrstd-probe-XXXXXX", "mine");
     ASSERT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str()));
-    EXPECT_TRUE(std::filesystem::is_directory(fresh) &&
-                !std::filesystem::exists(fresh + "/test.txt"));
+    EXPECT_TRUE(zyrtest::readFile(precious) == "keep" &&
+                zyrtest::readFile(fresh + "/.zyrstd-probe-XXXXXX") == "mine" &&
+                std::distance(std::filesystem::directory_iterator(fresh), {}) == 2);
     EXPECT_EQ(recorder.take(), (Calls{"UTInitialize(ZYRStd,0,<null>)", "UTSetOptIn(1)",
                                       "UTStartSession(Print,ZYRStd,0.1.0.0,0.1,," + fresh + ")"}));
     EXPECT_TRUE(Farlamp::StartSession(true, wide(fresh).c_str()) && recorder.take().empty() &&
@@ -148,7 +161,7 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
     Farlamp::LogDataObject(record("NoSuchGroup"));
     Farlamp::LogDataObject(record(nullptr));
     Farlamp::LogDataObject(C_SmartPtr<I_AnalyticsData>());
-    EXPECT_EQ(recorder.take(),
+    EXPECT_EQ(settled(),
               group(100, "ProductInfo",
                     {"OEMName,Acme", "OEMModelName,P1", "NumDevices,2", "InstanceMode,Single",
                      "xobjMode,2"}) +
@@ -166,17 +179,16 @@ TEST_F(FarlampTest, EveryGroupIsDispatchedByName) {
 
     Farlamp::LogEvent(kZYRAnalyticsEventHasTransparency, false);
     Farlamp::FlushJob(12.345);
-    EXPECT_EQ(recorder.take(),
+    EXPECT_EQ(settled(),
               group(105, nullptr, {"CompletionTime,2.35", "HasTrapping,0", "HasTransparency,1"}));
     Farlamp::LogDataObject(job);
-    EXPECT_EQ(recorder.take().front(), "UTNewDataGroup(JobInfo,,JobInfo)=106");
+    EXPECT_EQ(settled().front(), "UTNewDataGroup(JobInfo,,JobInfo)=106");
     Farlamp::LogDataObject(record("ProductInfo", "xobjMode", 1u));
     Farlamp::LogDataObject(raster);
     Farlamp::LogDataObject(dl);
-    EXPECT_EQ(recorder.take(), group(100, nullptr, {"xobjMode,1"}))
-        << "the product group is reused";
+    EXPECT_EQ(settled(), group(100, nullptr, {"xobjMode,1"})) << "the product group is reused";
     Farlamp::CloseSession();
-    EXPECT_EQ(recorder.take(), Calls{"UTCloseSession()"});
+    EXPECT_EQ(settled(), Calls{"UTCloseSession()"});
 }
 
 TEST_F(FarlampTest, DocumentFactsAndErrors) {
@@ -187,42 +199,41 @@ TEST_F(FarlampTest, DocumentFactsAndErrors) {
                          true, "PDFCreatorApp", S("Writer"), "PDFPreTrapped", S("False"),
                          "SecurityType", 0u, "NumPages", 12u);
     Farlamp::LogDict(info);
-    EXPECT_EQ(recorder.take(), group(100, "PDFInfo",
-                                     {"PDFVersion,1.7", "PDFX,1", "creatorApp,Writer",
-                                      "PreTrapped,False", "HasPassword,0", "NumPages,12"}));
+    EXPECT_EQ(settled(), group(100, "PDFInfo",
+                               {"PDFVersion,1.7", "PDFX,1", "creatorApp,Writer", "PreTrapped,False",
+                                "HasPassword,0", "NumPages,12"}));
     info.remove(CZYRUniString("PDFMinorVersion"));
     Farlamp::LogDict(info);
-    EXPECT_EQ(recorder.take()[1], "UTAddToGroup(101,PDFX,1)") << "no version without both parts";
+    EXPECT_EQ(settled()[1], "UTAddToGroup(101,PDFX,1)") << "no version without both parts";
     info.set(CZYRUniString("DataGroupName"), CZYRUniString("Other"));
     Farlamp::LogDict(info);
-    EXPECT_EQ(recorder.take(), Calls{});
+    EXPECT_EQ(settled(), Calls{});
 
     Farlamp::LogZYRError(kZYRErrorBadParam, "Streams", "source/zyr/std\\deep/CZYRDict.cpp");
     Farlamp::LogZYRError(kZYRErrorFatal, "Init", "plain.cpp");
-    EXPECT_EQ(recorder.take(),
-              group(102, "ErrorInfo",
-                    {"Area,Streams", "Type,kZYRErrorBadParam", "Parameter1,CZYRDict.cpp",
-                     "Parameter2,", "Parameter3,", "Fatal,0"}) +
-                  group(103, "ErrorInfo",
-                        {"Area,Init", "Type,kZYRErrorFatal", "Parameter1,plain.cpp", "Parameter2,",
-                         "Parameter3,", "Fatal,1"}));
+    EXPECT_EQ(settled(), group(102, "ErrorInfo",
+                               {"Area,Streams", "Type,kZYRErrorBadParam", "Parameter1,CZYRDict.cpp",
+                                "Parameter2,", "Parameter3,", "Fatal,0"}) +
+                             group(103, "ErrorInfo",
+                                   {"Area,Init", "Type,kZYRErrorFatal", "Parameter1,plain.cpp",
+                                    "Parameter2,", "Parameter3,", "Fatal,1"}));
     EXPECT_EQ(drainErrorStack(), u"");
     Farlamp::LogZYRError(static_cast<eZYRErrorType>(35), nullptr, nullptr);
-    EXPECT_TRUE(recorder.take()[2] == "UTAddToGroup(104,Type,kZYRErrorModuleNotInitialized)" &&
+    EXPECT_TRUE(settled()[2] == "UTAddToGroup(104,Type,kZYRErrorModuleNotInitialized)" &&
                 drainErrorStack().empty());
     int id = 105;
     for (const int type : {2, 36}) {
         Farlamp::LogZYRError(static_cast<eZYRErrorType>(type), "Area", nullptr);
         EXPECT_EQ(drainErrorStack(), u" Error code not updated in Analytics \n");
-        EXPECT_EQ(recorder.take()[2],
+        EXPECT_EQ(settled()[2],
                   "UTAddToGroup(" + std::to_string(id++) + ",Type," + std::to_string(type) + ")");
     }
 
     Farlamp::CloseSession();
-    EXPECT_EQ(recorder.take(), group(107, "ProductInfo",
-                                     {"OEMName,NoData", "OEMModelName,NoData", "NumDevices,NoData",
-                                      "InstanceMode,NoData"}) +
-                                   Calls{"UTCloseSession()"});
+    EXPECT_EQ(settled(), group(107, "ProductInfo",
+                               {"OEMName,NoData", "OEMModelName,NoData", "NumDevices,NoData",
+                                "InstanceMode,NoData"}) +
+                             Calls{"UTCloseSession()"});
 }
 
 TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
@@ -237,9 +248,9 @@ TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
         Farlamp::LogEvent(type, false);
     for (const int outside : {13, -1})
         EXPECT_EQ(Farlamp::LogEvent(static_cast<eZYRAnalyticsEventType>(outside), false), 0u);
-    EXPECT_EQ(recorder.take(), Calls{}) << "counting logs nothing";
+    EXPECT_EQ(settled(), Calls{}) << "counting logs nothing";
     Farlamp::LogEvent(kZYRAnalyticsEventAll, false);
-    EXPECT_EQ(recorder.take(),
+    EXPECT_EQ(settled(),
               (Calls{"UTLogEvent(Job,,EnableCutContourProcessing,0)",
                      "UTLogEvent(Job,,EnableLowResRasterization,0)",
                      "UTLogEvent(Job,,TextAntiAliasing,0)", "UTLogEvent(Job,,ZYREnableMTR,0)"}))
@@ -254,10 +265,10 @@ TEST_F(FarlampTest, EventsAreCountedAndFlushed) {
     Farlamp::LogEventNow(kZYRAnalyticsEventZYREnableMTR);
     Farlamp::LogEventNow(kZYRAnalyticsEventHasTrapping); // has no event name
     Farlamp::LogEventNow(static_cast<eZYRAnalyticsEventType>(-1));
-    EXPECT_EQ(recorder.take(),
+    EXPECT_EQ(settled(),
               (Calls{"UTLogEvent(Job,,GlobalRasterization,0)", "UTLogEvent(Job,,ZYREnableMTR,0)"}));
     Farlamp::FlushJob(1.0); // no job group: only the events
-    EXPECT_EQ(recorder.take(), Calls{"UTLogEvent(Job,,CachePlacedObject,0)"});
+    EXPECT_EQ(settled(), Calls{"UTLogEvent(Job,,CachePlacedObject,0)"});
     Farlamp::LogEvent(kZYRAnalyticsEventTextAntiAliasing, false);
     Farlamp::CloseSession();
     start();
@@ -273,20 +284,55 @@ TEST_F(FarlampTest, RunsOfEqualSurfacesAreLoggedOnce) {
     };
     for (int i = 0; i < 3; ++i)
         surface(2480, 3508, 4);
-    EXPECT_EQ(recorder.take(), Calls{}) << "the run is still open";
+    EXPECT_EQ(settled(), Calls{}) << "the run is still open";
     surface(1000.9, 500, 0);
-    EXPECT_EQ(recorder.take(),
+    EXPECT_EQ(settled(),
               group(100, "SurfaceInfo",
                     {"Surface Resolution,2480X3508", "Placed Objects,4", "count,3"}, "Surface"));
     Farlamp::FlushJob(0);
-    EXPECT_EQ(recorder.take(),
+    EXPECT_EQ(settled(),
               group(101, "SurfaceInfo",
                     {"Surface Resolution,1000X500", "Placed Objects,0", "count,1"}, "Surface"));
     Farlamp::FlushJob(0);
-    EXPECT_EQ(recorder.take(), Calls{}) << "a flushed run is not logged again";
+    EXPECT_EQ(settled(), Calls{}) << "a flushed run is not logged again";
     surface(1e300, -1e300, 1);
     Farlamp::FlushJob(0);
-    EXPECT_EQ(recorder.take().at(1), "UTAddToGroup(102,Surface Resolution,2147483647X-2147483648)");
+    EXPECT_EQ(settled().at(1), "UTAddToGroup(102,Surface Resolution,2147483647X-2147483648)");
+}
+
+// Engine threads only queue their calls, and the counts a job end takes keep every
+// increment made while the library was still busy with that job.
+TEST_F(FarlampTest, EngineThreadsNeverWaitForTheLibrary) {
+    start();
+    Farlamp::LogEvent(kZYRAnalyticsEventEnableLowResRasterization, false);
+    recorder.hold(true);
+    auto flush = std::async(std::launch::async, [] { Farlamp::FlushJob(1); });
+    recorder.awaitHeldCall(); // the library is logging the counted event
+    for (const auto type :
+         {kZYRAnalyticsEventEnableLowResRasterization, kZYRAnalyticsEventHasTransparency})
+        Farlamp::LogEvent(type, false);
+    auto engine = std::async(std::launch::async, [] {
+        Farlamp::UpdateCurrentSurfaceInfo(1, 1, 1);
+        Farlamp::LogSurfaceDataGroup();
+        Farlamp::LogEventNow(kZYRAnalyticsEventGlobalRasterization);
+        Farlamp::LogZYRError(kZYRErrorBadParam, "Area", "f.cpp");
+    });
+    // A generous bound, only so that a waiting call fails instead of hanging.
+    const bool returned = flush.wait_for(std::chrono::seconds(10)) == std::future_status::ready &&
+                          engine.wait_for(std::chrono::seconds(10)) == std::future_status::ready;
+    recorder.hold(false);
+    EXPECT_TRUE(returned) << "an engine call waited for the library";
+    flush.wait();
+    engine.wait();
+    EXPECT_EQ(Farlamp::LogEvent(kZYRAnalyticsEventEnableLowResRasterization, true) +
+                  10 * Farlamp::LogEvent(kZYRAnalyticsEventHasTransparency, true),
+              11u)
+        << "increments made during the flush are kept for the next job";
+    const Calls calls = settled();
+    ASSERT_GE(calls.size(), 2u);
+    EXPECT_EQ(Calls(calls.begin(), calls.begin() + 2),
+              (Calls{"UTLogEvent(Job,,EnableLowResRasterization,0)",
+                     "UTLogEvent(Job,,GlobalRasterization,0)"}));
 }
 
 TEST(FarlampLibraryTest, IncompleteLibraryLeavesTheLoggerIdle) {

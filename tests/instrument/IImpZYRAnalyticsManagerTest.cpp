@@ -22,7 +22,7 @@ protected:
         (void)recorder.take();
     }
     void TearDown() override {
-        recorder.setDelay(0);
+        recorder.hold(false);
         ZYRAnalyticsManagerTerm();
         ZYRSetAnalyticsActive(false);
         ZYRSetAnalyticsLogFolder(nullptr);
@@ -70,32 +70,16 @@ TEST_F(IImpZYRAnalyticsManagerTest, InitFollowsTheSession) {
     EXPECT_TRUE(ZYRAnalyticsManagerTerm() && ZYRAnalyticsManagerTerm() && recorder.take().empty());
 }
 
-TEST_F(IImpZYRAnalyticsManagerTest, RecordsAreLoggedInEnqueueOrder) {
-    start();
-    GetZYRAnalyticsManager()->enqueue(C_SmartPtr<ZYRPublic::I_AnalyticsData>()); // ignored
-    constexpr unsigned int kRecords = 50;
-    Calls expected;
-    for (unsigned int i = 0; i < kRecords; ++i) {
-        EXPECT_EQ(produce(i), "no error");
-        const std::string id = std::to_string(100 + i);
-        expected.push_back("UTNewDataGroup(DripSessionInfo,,DripSessionInfo)=" + id);
-        expected.push_back("UTAddToGroup(" + id + ",NumWorkers," + std::to_string(i) + ")");
-    }
-    EXPECT_EQ(recorder.waitFor(2 * kRecords), expected);
-}
-
 TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) {
     start();
-    recorder.setDelay(50);
-    const int startedBefore = recorder.callsStarted();
-    for (unsigned int i = 0; i < 5; ++i)
-        produce(i);
-    while (recorder.callsStarted() == startedBefore)
-        std::this_thread::yield();
+    recorder.hold(true);
+    produce(0);
+    recorder.awaitHeldCall(); // the worker is inside the library with record 0
     std::thread terminator([] { ZYRAnalyticsManagerTerm(); });
     std::string error;
-    for (unsigned int i = 0; error == "no error" || error.empty(); ++i)
+    for (unsigned int i = 1; error == "no error" || error.empty(); ++i)
         error = produce(i);
+    recorder.hold(false);
     terminator.join();
     EXPECT_TRUE(zyrtest::startsWith(error, "20: Attempt to enqueue Job after ZYRTerminate "
                                            "called. (source/zyr/std/IImpZYRAnalyticsManager:"))
@@ -110,15 +94,29 @@ TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) 
                "UTCloseSession()"}));
 }
 
-TEST_F(IImpZYRAnalyticsManagerTest, ProducersNeverWaitForASleepingLibrary) {
+// Producers never wait for a stalled library, and the queue behind it stays bounded: what
+// does not fit is dropped and counted into the session at close.
+TEST_F(IImpZYRAnalyticsManagerTest, QueueBehindAStalledLibraryIsBounded) {
     start();
-    recorder.setDelay(1000);
-    std::thread producer([] {
-        for (unsigned int i = 0; i < 20; ++i)
-            produce(i);
-    });
-    producer.join();
-    for (unsigned int i = 20; i < 40; ++i)
-        produce(i);
+    GetZYRAnalyticsManager()->enqueue(C_SmartPtr<ZYRPublic::I_AnalyticsData>()); // ignored
+    recorder.hold(true);
+    produce(0);
+    recorder.awaitHeldCall();
+    constexpr unsigned int kBound = 1024, kOver = 5;
+    for (unsigned int i = 1; i <= kBound + kOver; ++i)
+        ASSERT_EQ(produce(i), "no error");
     EXPECT_EQ(recorder.take(), Calls{});
+    recorder.hold(false);
+    Calls expected; // the first kBound + 1 records, in enqueue order
+    for (unsigned int i = 0; i <= kBound; ++i) {
+        const std::string id = std::to_string(100 + i);
+        expected.push_back("UTNewDataGroup(DripSessionInfo,,DripSessionInfo)=" + id);
+        expected.push_back("UTAddToGroup(" + id + ",NumWorkers," + std::to_string(i) + ")");
+    }
+    EXPECT_EQ(recorder.waitFor(expected.size()), expected);
+    ZYRAnalyticsManagerTerm();
+    const Calls closing = recorder.take();
+    EXPECT_TRUE(closing.size() >= 2 &&
+                closing[closing.size() - 2] ==
+                    "UTAddToSession(DroppedRecords," + std::to_string(kOver) + ")");
 }

@@ -1,8 +1,7 @@
 #include <atomic>
-#include <chrono>
+#include <condition_variable>
 #include <mutex>
 #include <string>
-#include <thread>
 #include <utility>
 #include <vector>
 
@@ -14,12 +13,13 @@ struct Kelvrin {
 
 namespace {
 
-std::mutex callsLock; // guards calls
+std::mutex callsLock; // guards calls, held and waiting
+std::condition_variable released;
 std::vector<std::string> calls;
-std::atomic<int> delayMs{0};
+bool held = false; // while set, every call waits before it is recorded
+int waiting = 0;
 std::atomic<bool> refuseSessions{false};
 std::atomic<int> optIn{0};
-std::atomic<int> started{0};
 Kelvrin session;
 
 std::string text(const char* s) {
@@ -27,10 +27,10 @@ std::string text(const char* s) {
 }
 
 void record(std::string call) {
-    started.fetch_add(1);
-    if (const int ms = delayMs.load())
-        std::this_thread::sleep_for(std::chrono::milliseconds(ms));
-    const std::lock_guard guard(callsLock);
+    std::unique_lock guard(callsLock);
+    ++waiting;
+    released.wait(guard, [] { return !held; });
+    --waiting;
     calls.push_back(std::move(call));
 }
 
@@ -42,11 +42,16 @@ KELVRIN_API void RecordingTakeCalls(std::vector<std::string>& out) {
     const std::lock_guard guard(callsLock);
     out = std::exchange(calls, {});
 }
-KELVRIN_API void RecordingSetDelay(int ms) {
-    delayMs = ms;
+KELVRIN_API void RecordingHold(bool hold) {
+    {
+        const std::lock_guard guard(callsLock);
+        held = hold;
+    }
+    released.notify_all();
 }
-KELVRIN_API int RecordingCallsStarted() {
-    return started;
+KELVRIN_API int RecordingWaiting() {
+    const std::lock_guard guard(callsLock);
+    return waiting;
 }
 KELVRIN_API void RecordingRefuseSessions(bool refuse) {
     refuseSessions = refuse;

@@ -22,9 +22,14 @@ public:
         take_(calls);
         return calls;
     }
-    void setDelay(int ms) { setDelay_(ms); } // each call sleeps this long before it is recorded
+    // While held, every library call waits (the library is "slow") until released.
+    void hold(bool held) { hold_(held); }
     void refuseSessions(bool refuse) { refuse_(refuse); }
-    int callsStarted() { return started_(); }
+    // Returns once a call waits at the hold.
+    void awaitHeldCall() {
+        while (waiting_() == 0)
+            std::this_thread::yield();
+    }
     std::vector<std::string> waitFor(size_t count) {
         std::vector<std::string> all;
         for (int i = 0; i < 10000 && all.size() < count; ++i) {
@@ -41,9 +46,9 @@ private:
         if (!handle_)
             throw std::runtime_error(dlerror());
         symbol(take_, "RecordingTakeCalls");
-        symbol(setDelay_, "RecordingSetDelay");
+        symbol(hold_, "RecordingHold");
         symbol(refuse_, "RecordingRefuseSessions");
-        symbol(started_, "RecordingCallsStarted");
+        symbol(waiting_, "RecordingWaiting");
     }
     template <class F> void symbol(F& f, const char* name) {
         f = reinterpret_cast<F>(dlsym(handle_, name));
@@ -53,9 +58,9 @@ private:
 
     void* handle_ = nullptr;
     void (*take_)(std::vector<std::string>&) = nullptr;
-    void (*setDelay_)(int) = nullptr;
+    void (*hold_)(bool) = nullptr;
     void (*refuse_)(bool) = nullptr;
-    int (*started_)() = nullptr;
+    int (*waiting_)() = nullptr;
 };
 
 } // namespace zyrtest

@@ -1,8 +1,13 @@
 #include <gtest/gtest.h>
 
 #include <dlfcn.h>
+#include <sys/resource.h>
+#include <unistd.h>
 
-#include <chrono>
+#include <atomic>
+#include <csignal>
+#include <cstring>
+#include <ctime>
 #include <filesystem>
 #include <fstream>
 #include <thread>
@@ -11,11 +16,7 @@
 
 #include "Kelvrin.h"
 #include "TestSupport.h"
-#include "zyr/std/config/ZYRStartupOptions.h"
-#include "zyr/std/instrument/CZYRAnalyticsData.h"
-#include "zyr/std/instrument/IImpZYRAnalyticsManager.h"
 
-using namespace ZYRStd;
 using Lines = std::vector<std::string>;
 
 namespace {
@@ -88,33 +89,72 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     EXPECT_EQ(sessions(folder), expected);
 
     zyrtest::writeFile(dir.file("plain"), "x");
-    start(session, "Print", "P", "1", "1", "", (dir.file("plain") + "/logs").c_str());
-    EXPECT_EQ(session, nullptr);
+    for (const char* product : {"P", "../P", "a/b"}) {
+        start(session, "Print", product, "1", "1", "",
+              (product[0] == 'P' ? dir.file("plain") + "/logs" : folder).c_str());
+        EXPECT_EQ(session, nullptr) << product << ": no folder, or a name that leaves it";
+    }
+
+    // Names already taken (another session in this second, a planted link) are passed over;
+    // what they point to is left alone.
+    const std::string taken = dir.file("taken");
+    std::filesystem::create_directories(taken);
+    const std::time_t now = std::time(nullptr);
+    for (std::time_t t = now; t <= now + 1; ++t) {
+        char stamp[32];
+        std::strftime(stamp, sizeof stamp, "%Y%m%dT%H%M%SZ", std::gmtime(&t));
+        for (int n = 0; n < 10; ++n)
+            std::filesystem::create_symlink(dir.file("plain"), taken + "/P-" + stamp + "-" +
+                                                                   std::to_string(getpid()) + "-" +
+                                                                   std::to_string(n) + ".jsonl");
+    }
+    start(session, "Print", "P", "1", "1", "", taken.c_str());
+    close(session);
+    EXPECT_EQ(zyrtest::readFile(dir.file("plain")), "x");
+    int files = 0;
+    for (const auto& entry : std::filesystem::directory_iterator(taken))
+        files += !entry.is_symlink();
+    EXPECT_EQ(files, 1);
+
+    // Lines carry their times in order, though a long line is still being formatted.
+    start(session, "Print", "P", "1", "1", "", dir.file("order").c_str());
+    std::atomic<bool> done{false};
+    std::thread longLine([&] {
+        addToGroup(session, 0, "long", std::string(4 << 20, 'x').c_str());
+        done = true;
+    });
+    while (!done)
+        addToSession(session, "short", "x");
+    longLine.join();
+    close(session);
+    std::ifstream in(std::filesystem::directory_iterator(dir.file("order"))->path());
+    long long last = 0;
+    for (std::string line; std::getline(in, line);) {
+        const long long time = nlohmann::json::parse(line)["time"];
+        EXPECT_LE(last, time);
+        last = time;
+    }
+
+    // A write that fails (a full disk, here a file-size limit) is reported at close; the
+    // report goes through a pipe, which the limit does not cut.
+    EXPECT_EXIT(
+        {
+            int report[2];
+            if (pipe(report) != 0 || dup2(report[1], 2) < 0)
+                std::_Exit(2);
+            std::signal(SIGXFSZ, SIG_IGN);
+            rlimit limit;
+            limit.rlim_cur = limit.rlim_max = 1;
+            setrlimit(RLIMIT_FSIZE, &limit);
+            start(session, "Print", "P", "1", "1", "", dir.file("full").c_str());
+            close(session);
+            ::close(report[1]);
+            ::close(2); // the pipe's last writer: a silent close reads as the end
+            char text[512] = {};
+            const ssize_t got = read(report[0], text, sizeof text - 1);
+            std::_Exit(got > 0 && std::strstr(text, ": File too large: 2 records lost\n") ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
     setOptIn(0);
     dlclose(lib);
-}
-
-TEST(KelvrinTest, RecordsReachTheSessionFile) {
-    zyrtest::TempDir dir;
-    const std::u16string folder(dir.path().begin(), dir.path().end());
-    ZYRSetAnalyticsLogFolder(folder.c_str());
-    ZYRSetAnalyticsActive(true);
-    ASSERT_TRUE(ZYRAnalyticsManagerInit());
-    ASSERT_TRUE(ZYRIsAnalyticsActive()) << "libKelvrin.so was not found beside the library";
-    CZYRAnalyticsData record;
-    record.set(CZYRUniString("DataGroupName"), CZYRUniString("DripSessionInfo"));
-    record.set(CZYRUniString("NumWorkers"), 3u);
-    record.finalize();
-    for (int i = 0;
-         i < 10000 && (sessions(dir.path()).size() != 1 || sessions(dir.path())[0].size() < 3); ++i)
-        std::this_thread::sleep_for(std::chrono::milliseconds(1));
-    ZYRAnalyticsManagerTerm();
-    ZYRSetAnalyticsActive(false);
-    ZYRSetAnalyticsLogFolder(nullptr);
-    const std::vector<Lines> files = sessions(dir.path());
-    ASSERT_TRUE(files.size() == 1 && files[0].size() >= 4);
-    EXPECT_NE(files[0][0].find(R"("folder":")" + dir.path() + "\""), std::string::npos);
-    EXPECT_EQ(
-        files[0][2] + files[0].back(),
-        R"({"group":0,"key":"NumWorkers","type":"value","value":"3"}{"type":"session_close"})");
 }

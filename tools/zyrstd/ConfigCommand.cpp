@@ -6,6 +6,7 @@
 #include <memory>
 #include <string>
 #include <string_view>
+#include <sys/stat.h>
 #include <unistd.h>
 #include <vector>
 
@@ -27,14 +28,35 @@ struct Pair {
     unsigned int line;
 };
 
-// Returns 0 and the file's bytes, or the errno value that stopped the reading.
-int readWholeFile(const char* path, std::vector<unsigned char>& bytes) {
-    const int fd = ::open(path, O_RDONLY | O_CLOEXEC);
+// A setup file is a few kilobytes; anything this big is a mistake, and the parser takes a
+// 32-bit size.
+constexpr off_t kMaxSetupFile = 64 * 1024 * 1024;
+
+// Returns 0 and the file's bytes, or the errno value that stopped the reading; `refusal`
+// says why a file that opened is not read at all.
+int readWholeFile(const char* path, std::vector<unsigned char>& bytes, const char*& refusal) {
+    // Non-blocking, so that a FIFO without a writer is refused rather than waited for.
+    const int fd = ::open(path, O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK);
     if (fd < 0)
         return errno;
+    struct stat info {};
+    const int statError = ::fstat(fd, &info) != 0 ? errno : 0;
+    if (statError || !S_ISREG(info.st_mode) || info.st_size > kMaxSetupFile) {
+        ::close(fd);
+        if (statError || S_ISDIR(info.st_mode))
+            return statError ? statError : EISDIR;
+        refusal = S_ISREG(info.st_mode) ? "larger than 64 MiB" : "not a regular file";
+        return EINVAL;
+    }
     int error = 0;
     unsigned char chunk[64 * 1024];
     for (;;) {
+        // A file that grows while it is read is still cut at the bound.
+        if (bytes.size() > static_cast<size_t>(kMaxSetupFile)) {
+            refusal = "larger than 64 MiB";
+            error = EFBIG;
+            break;
+        }
         const ssize_t got = ::read(fd, chunk, sizeof chunk);
         if (got < 0) {
             if (errno == EINTR)
@@ -69,8 +91,10 @@ private:
 // Parses one file into `pairs`; false after printing why it could not.
 bool collectPairs(const char* file, std::vector<Pair>& pairs) {
     std::vector<unsigned char> bytes;
-    if (const int error = readWholeFile(file, bytes)) {
-        std::fprintf(stderr, "zyrstd: config: cannot read '%s': %s\n", file, std::strerror(error));
+    const char* refusal = nullptr;
+    if (const int error = readWholeFile(file, bytes, refusal)) {
+        std::fprintf(stderr, "zyrstd: config: cannot read '%s': %s\n", file,
+                     refusal ? refusal : std::strerror(error));
         return false;
     }
     if (bytes.empty())

@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <sys/stat.h>
 #include <thread>
 #include <vector>
 
@@ -103,14 +104,22 @@ private:
     void* bands_;
 };
 
-std::string tempPath(const char* name) {
-    const char* dir = std::getenv("TMPDIR");
-    return std::string(dir && *dir ? dir : "/tmp") + "/" + name;
-}
+// The demo's files live in a folder of its own, made afresh under a unique name: two demos
+// at once do not meet, and no one else's link stands where a log is opened.
+struct WorkFolder {
+    std::string path = (std::filesystem::temp_directory_path() / "zyrstd-demo-XXXXXX").string();
+    bool made = ::mkdtemp(path.data()) != nullptr;
+    ~WorkFolder() {
+        std::error_code ec;
+        if (made)
+            std::filesystem::remove_all(path, ec);
+    }
+    std::string file(const char* name) const { return path + "/" + name; }
+};
 
-void allocationUnderPressure() {
+void allocationUnderPressure(const WorkFolder& work) {
     section("One allocation under memory pressure");
-    const std::string logPath = tempPath("zyrstd-demo-dmm.log");
+    const std::string logPath = work.file("dmm.log");
     ::setenv("ZYR_DMM_LOG", logPath.c_str(), 1);
     tZYRMemMgr any{};
     ZYRStdInit_ZYRDMMEnv_set(&any); // opens the DMM log named by ZYR_DMM_LOG
@@ -162,12 +171,11 @@ CZYRDict areaLevel(const char* key, unsigned int level) {
     return area;
 }
 
-void tracedJob() {
+void tracedJob(const WorkFolder& work) {
     section("A traced job and its memory report");
     InitCommonUniStrings();
     InitDynamicUniStringCache();
-    const std::string logPath = tempPath("zyrstd-demo-trace.log");
-    std::remove(logPath.c_str());
+    const std::string logPath = work.file("trace.log");
     {
         // The job's trace configuration: where the log goes and how much each area says.
         CZYRDict config;
@@ -213,10 +221,10 @@ void tracedJob() {
 
 // Analytics: records logged on the library's worker into a telemetry session file in a
 // temporary folder, whose path and lines are printed.
-void analyticsSession() {
+void analyticsSession(const WorkFolder& work) {
     section("Analytics records and the telemetry session");
-    std::string folder = (std::filesystem::temp_directory_path() / "zyrstd-analytics-XXXXXX");
-    if (!::mkdtemp(folder.data())) {
+    const std::string folder = work.file("analytics");
+    if (::mkdir(folder.c_str(), 0700) != 0) {
         std::puts("   no temporary folder: analytics skipped");
         return;
     }
@@ -314,9 +322,14 @@ int runDemo(int argc, char**) {
     ZYRFree(retry);
     ZYRFree(tooBig);
 
-    allocationUnderPressure();
-    tracedJob();
-    analyticsSession();
+    const WorkFolder work;
+    if (!work.made) {
+        std::fputs("zyrstd: demo: cannot make a temporary folder\n", stderr);
+        return 1;
+    }
+    allocationUnderPressure(work);
+    tracedJob(work);
+    analyticsSession(work);
     TerminateErrorStk();
 
     section("Memory state and leak report");

@@ -3,42 +3,37 @@
 #include "zyr/std/instrument/Farlamp.h"
 
 #include <dlfcn.h>
+#include <fcntl.h>
+#include <unistd.h>
 
 #include <array>
 #include <atomic>
+#include <condition_variable>
 #include <cstdio>
 #include <cstring>
+#include <deque>
 #include <filesystem>
+#include <functional>
+#include <future>
 #include <limits>
+#include <mutex>
 #include <optional>
 #include <sstream>
 #include <string>
+#include <thread>
 #include <utility>
+#include <vector>
 
 #include "Kelvrin.h"
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/instrument/internal/FarlampInternal.h"
 #include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
 #include "zyr/std/values/CZYRDict.h"
 #include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
-
-std::mutex Farlamp::stateLock;
-void* Farlamp::libInst = nullptr;
-bool Farlamp::libraryFunctionLoaded = false;
-bool Farlamp::initialized = false;
-std::atomic<bool> Farlamp::loggingEnabled{false};
-Kelvrin* Farlamp::logHandle = nullptr;
-int Farlamp::ProductInfoGroupID = -1;
-int Farlamp::JobInfoGroupID = -1;
-double Farlamp::jobStartTime = 0;
-int Farlamp::xobjmode = 0;
-sSurfaceInfo Farlamp::currSurfaceInfo;
-sSurfaceInfo Farlamp::prevSurfaceInfo;
-unsigned int Farlamp::prevSurfaceCount = 0;
-std::atomic<unsigned int> Farlamp::eventCounters[kZYRAnalyticsEventAll];
 
 namespace {
 
@@ -50,7 +45,11 @@ constexpr const char* kLibraryName = "libKelvrin.so";
 constexpr const char* kProductName = "ZYRStd";
 constexpr const char* kSessionKind = "Print";
 constexpr const char* kDefaultFolder = "./AnalyticsLogs";
-constexpr const char* kProbeFile = "/test.txt";
+// A probe of a name no one else uses, made exclusively: never a link into someone's file.
+constexpr const char* kProbeTemplate = "/.zyrstd-probe-XXXXXX";
+// Calls queued for the writer beyond this are dropped (and counted): a stalled library
+// must not make the queue grow without end.
+constexpr size_t kMaxQueuedCalls = 4096;
 constexpr int kVersion[4] = {ZYRSTD_VERSION_MAJOR, ZYRSTD_VERSION_MINOR, ZYRSTD_VERSION_PATCH, 0};
 constexpr short kNoErrorCode = -1;
 
@@ -65,7 +64,6 @@ struct EntryPoints {
     UTGetOptInProc getOptIn = nullptr;
     UTSetOptInProc setOptIn = nullptr;
 };
-EntryPoints entry; // guarded by Farlamp::stateLock; valid while libraryFunctionLoaded
 
 template <class Proc> bool lookUp(void* library, const char* name, Proc& out) {
     out = reinterpret_cast<Proc>(dlsym(library, name));
@@ -208,12 +206,12 @@ bool usableFolder(const std::string& folder) {
         return false;
     if (!std::filesystem::is_directory(path, ec))
         return false;
-    const std::string probe = folder + kProbeFile;
-    FILE* file = std::fopen(probe.c_str(), "w");
-    if (!file)
+    std::string probe = folder + kProbeTemplate;
+    const int fd = ::mkostemp(probe.data(), O_CLOEXEC);
+    if (fd < 0)
         return false;
-    std::fclose(file);
-    std::remove(probe.c_str());
+    ::close(fd);
+    ::unlink(probe.c_str());
     return true;
 }
 
@@ -262,9 +260,156 @@ constexpr std::array<GroupRule, 8> kGroupRules = {{
 
 } // namespace
 
-// ---- loading ------------------------------------------------------------------------------
+// ---- the logger's state and its writer ------------------------------------------------
 
 namespace {
+
+// Runs the logger's calls into the library, one after another in the order they were
+// posted, on a thread of its own: engine threads only queue their calls and never wait for
+// the library's I/O.
+class Writer {
+public:
+    ~Writer() { stop(); }
+
+    void start() {
+        const std::lock_guard guard(lock_);
+        if (running_)
+            return;
+        running_ = true;
+        thread_ = std::thread([this] { run(); });
+    }
+    // Runs everything still queued, then ends the thread.
+    void stop() {
+        {
+            const std::lock_guard guard(lock_);
+            running_ = false;
+        }
+        wake_.notify_one();
+        if (thread_.joinable() && thread_.get_id() != std::this_thread::get_id())
+            thread_.join();
+    }
+    // False when the call was not queued: no writer runs, or the queue is full.
+    bool post(std::function<void()> call);
+
+private:
+    void run();
+
+    std::mutex lock_; // guards queue_ and running_; never held while the library is called
+    std::condition_variable wake_;
+    std::deque<std::function<void()>> queue_;
+    bool running_ = false;
+    std::thread thread_;
+};
+
+// Everything the logger keeps between calls. The fields under `lock` are touched by the
+// writer thread while a session is open, and by StartSession and CloseSession while no
+// writer runs; `lock` is held across the calls into the library, which engine threads
+// never make.
+struct LoggerState {
+    std::mutex lock; // guards the fields from libInst to prevSurfaceCount
+    void* libInst = nullptr;
+    bool libraryFunctionLoaded = false;
+    bool initialized = false;
+    Kelvrin* logHandle = nullptr;
+    int ProductInfoGroupID = -1;
+    int JobInfoGroupID = -1;
+    double jobStartTime = 0;
+    int xobjmode = 0;
+    sSurfaceInfo currSurfaceInfo;
+    sSurfaceInfo prevSurfaceInfo;
+    unsigned int prevSurfaceCount = 0; // surfaces in the run prevSurfaceInfo describes
+    EntryPoints entry;                 // valid while libraryFunctionLoaded
+
+    // Read by every operation without a lock. Relaxed: it only gates work, and what a
+    // logged call needs is handed over through the writer's queue under its lock.
+    std::atomic<bool> loggingEnabled{false};
+    // Relaxed: independent tallies; each is taken with one exchange when a job ends, so
+    // no increment is lost between reading and resetting.
+    std::atomic<unsigned int> eventCounters[kZYRAnalyticsEventAll] = {};
+    // Relaxed: a tally, read at close after the writer and the analytics worker joined.
+    std::atomic<unsigned long long> droppedRecords{0};
+
+    Writer writer; // last: destroyed first, while the state it runs on is still alive
+};
+
+LoggerState state;
+
+bool Writer::post(std::function<void()> call) {
+    {
+        const std::lock_guard guard(lock_);
+        if (!running_)
+            return false;
+        if (queue_.size() >= kMaxQueuedCalls) {
+            state.droppedRecords.fetch_add(1, std::memory_order_relaxed);
+            return false;
+        }
+        queue_.push_back(std::move(call));
+    }
+    wake_.notify_one();
+    return true;
+}
+
+void Writer::run() {
+    for (;;) {
+        std::function<void()> call;
+        {
+            std::unique_lock guard(lock_);
+            wake_.wait(guard, [&] { return !queue_.empty() || !running_; });
+            if (queue_.empty())
+                return;
+            call = std::move(queue_.front());
+            queue_.pop_front();
+        }
+        const std::lock_guard session(state.lock);
+        try {
+            call();
+        } catch (...) {
+            // The writer must survive a call it cannot complete.
+        }
+    }
+}
+
+// Queues `call` when logging is on; the call runs on the writer with state.lock held.
+void postCall(std::function<void()> call) {
+    if (state.loggingEnabled.load(std::memory_order_relaxed))
+        state.writer.post(std::move(call));
+}
+
+using Counts = std::array<unsigned int, kZYRAnalyticsEventAll>;
+
+// Takes every counter and resets it in one step each.
+Counts takeCounters() {
+    Counts counts{};
+    for (int i = 0; i < kZYRAnalyticsEventAll; ++i)
+        counts[i] = state.eventCounters[i].exchange(0, std::memory_order_relaxed);
+    return counts;
+}
+
+// Logs the taken counts as events; expects state.lock held.
+void logCountedEvents(const Counts& counts) {
+    for (int i = 0; i < kZYRAnalyticsEventAll; ++i) {
+        if (counts[i] == 0)
+            continue;
+        const bool logged = (i >= kZYRAnalyticsEventEnableLowResRasterization &&
+                             i <= kZYRAnalyticsEventZYREnableMTR) ||
+                            (i == kZYRAnalyticsEventCachePlacedObject &&
+                             counts[kZYRAnalyticsEventPlacedObjectCached] != 0) ||
+                            (i == kZYRAnalyticsEventEnableCutContourProcessing &&
+                             counts[kZYRAnalyticsEventCutContourProcessed] != 0);
+        if (logged && state.logHandle)
+            state.entry.logEvent(state.logHandle, "Job", "", kEventNames[i], nullptr, 0);
+    }
+}
+
+// A new group holding `values` in order; expects state.lock held.
+void logGroup(const char* name, const std::vector<std::pair<std::string, std::string>>& values) {
+    if (!state.logHandle)
+        return;
+    int group = -1;
+    state.entry.newDataGroup(state.logHandle, name, "", name, group, nullptr, 0);
+    for (const auto& [key, value] : values)
+        state.entry.addToGroup(state.logHandle, group, key.c_str(), value.c_str());
+}
 
 // The path of `name` in this library's own directory. dlopen by name finds it there through
 // the library's RUNPATH, but not when a sanitizer's interceptor makes the call (the search
@@ -278,73 +423,80 @@ std::string besideThisLibrary(const char* name) {
 
 } // namespace
 
+void noteDroppedAnalyticsRecords(unsigned long long count) {
+    state.droppedRecords.fetch_add(count, std::memory_order_relaxed);
+}
+
+// ---- loading ------------------------------------------------------------------------------
+
 void Farlamp::LoadLibraryFunction() {
     // The platform-version test of the original always passes here.
-    libInst = dlopen(kLibraryName, RTLD_NOW | RTLD_LOCAL);
-    if (!libInst)
-        libInst = dlopen(besideThisLibrary(kLibraryName).c_str(), RTLD_NOW | RTLD_LOCAL);
-    if (!libInst)
+    state.libInst = dlopen(kLibraryName, RTLD_NOW | RTLD_LOCAL);
+    if (!state.libInst)
+        state.libInst = dlopen(besideThisLibrary(kLibraryName).c_str(), RTLD_NOW | RTLD_LOCAL);
+    if (!state.libInst)
         return;
+    void* const lib = state.libInst;
     EntryPoints found;
-    libraryFunctionLoaded = lookUp(libInst, "UTInitialize", found.initialize) &&
-                            lookUp(libInst, "UTStartSession", found.startSession) &&
-                            lookUp(libInst, "UTAddToSession", found.addToSession) &&
-                            lookUp(libInst, "UTLogEvent", found.logEvent) &&
-                            lookUp(libInst, "UTNewDataGroup", found.newDataGroup) &&
-                            lookUp(libInst, "UTAddToGroup", found.addToGroup) &&
-                            lookUp(libInst, "UTCloseSession", found.closeSession) &&
-                            lookUp(libInst, "UTGetOptIn", found.getOptIn) &&
-                            lookUp(libInst, "UTSetOptIn", found.setOptIn);
-    if (libraryFunctionLoaded)
-        entry = found;
+    state.libraryFunctionLoaded = lookUp(lib, "UTInitialize", found.initialize) &&
+                                  lookUp(lib, "UTStartSession", found.startSession) &&
+                                  lookUp(lib, "UTAddToSession", found.addToSession) &&
+                                  lookUp(lib, "UTLogEvent", found.logEvent) &&
+                                  lookUp(lib, "UTNewDataGroup", found.newDataGroup) &&
+                                  lookUp(lib, "UTAddToGroup", found.addToGroup) &&
+                                  lookUp(lib, "UTCloseSession", found.closeSession) &&
+                                  lookUp(lib, "UTGetOptIn", found.getOptIn) &&
+                                  lookUp(lib, "UTSetOptIn", found.setOptIn);
+    if (state.libraryFunctionLoaded)
+        state.entry = found;
     else
         UnloadLibraryFunction();
 }
 
 // Forgets everything of the session too: nothing may call into an unloaded library.
 void Farlamp::UnloadLibraryFunction() {
-    if (libInst)
-        dlclose(libInst);
-    libInst = nullptr;
-    entry = EntryPoints{};
-    libraryFunctionLoaded = false;
-    initialized = false;
-    loggingEnabled = false;
-    logHandle = nullptr;
-    ProductInfoGroupID = -1;
-    JobInfoGroupID = -1;
-    jobStartTime = 0;
-    xobjmode = 0;
-    currSurfaceInfo = prevSurfaceInfo = sSurfaceInfo{};
-    prevSurfaceCount = 0;
-    for (auto& counter : eventCounters)
-        counter.store(0, std::memory_order_relaxed);
+    if (state.libInst)
+        dlclose(state.libInst);
+    state.libInst = nullptr;
+    state.entry = EntryPoints{};
+    state.libraryFunctionLoaded = false;
+    state.initialized = false;
+    state.loggingEnabled.store(false, std::memory_order_relaxed);
+    state.logHandle = nullptr;
+    state.ProductInfoGroupID = -1;
+    state.JobInfoGroupID = -1;
+    state.jobStartTime = 0;
+    state.xobjmode = 0;
+    state.currSurfaceInfo = state.prevSurfaceInfo = sSurfaceInfo{};
+    state.prevSurfaceCount = 0;
+    (void)takeCounters();
+    state.droppedRecords.store(0, std::memory_order_relaxed);
 }
 
 void Farlamp::Initialize(bool active) {
     LoadLibraryFunction();
-    if (!libraryFunctionLoaded)
+    if (!state.libraryFunctionLoaded)
         return;
-    entry.initialize(kProductName, false, nullptr);
-    entry.setOptIn(active ? 1 : 0);
-    initialized = true;
-    loggingEnabled = active;
+    state.entry.initialize(kProductName, false, nullptr);
+    state.entry.setOptIn(active ? 1 : 0);
+    state.initialized = true;
+    state.loggingEnabled.store(active, std::memory_order_relaxed);
 }
 
 // ---- the session --------------------------------------------------------------------------
 
 bool Farlamp::StartSession(bool active, const char16_t* folder) {
-    const std::lock_guard lock(stateLock);
-    if (!initialized)
+    const std::lock_guard lock(state.lock);
+    if (!state.initialized)
         Initialize(active);
-    if (!initialized)
+    if (!state.initialized)
         return false;
     char version[64];
     char shortVersion[32];
     std::snprintf(version, sizeof version, "%d.%d.%d.%d", kVersion[0], kVersion[1], kVersion[2],
                   kVersion[3]);
     std::snprintf(shortVersion, sizeof shortVersion, "%d.%d", kVersion[0], kVersion[1]);
-    if (logHandle)
+    if (state.logHandle)
         return true;
 
     std::string sessionFolder = kDefaultFolder;
@@ -356,91 +508,112 @@ bool Farlamp::StartSession(bool active, const char16_t* folder) {
         else
             reportUniqueError(u" Default directory was used to store analytics logs \n");
     }
-    entry.startSession(logHandle, kSessionKind, kProductName, version, shortVersion, "",
-                       sessionFolder.c_str());
-    if (!logHandle)
-        loggingEnabled = false; // nothing to log into
-    return logHandle != nullptr;
+    state.entry.startSession(state.logHandle, kSessionKind, kProductName, version, shortVersion, "",
+                             sessionFolder.c_str());
+    if (!state.logHandle)
+        state.loggingEnabled.store(false, std::memory_order_relaxed); // nothing to log into
+    if (state.loggingEnabled.load(std::memory_order_relaxed))
+        state.writer.start();
+    return state.logHandle != nullptr;
 }
 
 void Farlamp::CloseSession() {
-    const std::lock_guard lock(stateLock);
-    if (loggingEnabled && logHandle && ProductInfoGroupID == -1) {
-        entry.newDataGroup(logHandle, "ProductInfo", "", "ProductInfo", ProductInfoGroupID, nullptr,
-                           0);
-        for (const char* key : {"OEMName", "OEMModelName", "NumDevices", "InstanceMode"})
-            entry.addToGroup(logHandle, ProductInfoGroupID, key, "NoData");
+    state.writer.stop(); // what engine threads queued is written first
+    const std::lock_guard lock(state.lock);
+    if (state.loggingEnabled.load(std::memory_order_relaxed) && state.logHandle) {
+        if (state.ProductInfoGroupID == -1) {
+            state.entry.newDataGroup(state.logHandle, "ProductInfo", "", "ProductInfo",
+                                     state.ProductInfoGroupID, nullptr, 0);
+            for (const char* key : {"OEMName", "OEMModelName", "NumDevices", "InstanceMode"})
+                state.entry.addToGroup(state.logHandle, state.ProductInfoGroupID, key, "NoData");
+        }
+        if (const auto dropped = state.droppedRecords.load(std::memory_order_relaxed))
+            state.entry.addToSession(state.logHandle, "DroppedRecords", decimal(dropped).c_str());
     }
-    if (logHandle)
-        entry.closeSession(logHandle);
-    logHandle = nullptr;
+    if (state.logHandle)
+        state.entry.closeSession(state.logHandle);
+    state.logHandle = nullptr;
     UnloadLibraryFunction();
 }
 
 bool Farlamp::LoggingEnabled() {
-    return loggingEnabled;
+    return state.loggingEnabled.load(std::memory_order_relaxed);
 }
 
 // ---- data groups --------------------------------------------------------------------------
 
-void Farlamp::LogDataObject(const C_SmartPtr<I_AnalyticsData>& record) {
-    if (!loggingEnabled)
-        return; // the common case of an opted-out session, without the lock
-    const std::lock_guard lock(stateLock);
-    if (!loggingEnabled || !logHandle || !record)
+namespace {
+
+// Writes one analytics record; runs on the writer.
+void logRecord(I_AnalyticsData* source) {
+    const auto groupName = readValue<I_UniString*>(source, "DataGroupName");
+    if (!groupName || !*groupName || !state.logHandle)
         return;
-    try {
-        I_AnalyticsData* source = record.get();
-        const auto groupName = readValue<I_UniString*>(source, "DataGroupName");
-        if (!groupName || !*groupName)
+    const CZYRUniString name(*groupName, false);
+    const EntryPoints& entry = state.entry;
+    for (const GroupRule& rule : kGroupRules) {
+        if (!(name == CZYRUniString(rule.name)))
+            continue;
+        if (rule.onlyWithRasterCaching && state.xobjmode != 0 && state.xobjmode != 2)
             return;
-        const CZYRUniString name(*groupName, false);
-        for (const GroupRule& rule : kGroupRules) {
-            if (!(name == CZYRUniString(rule.name)))
-                continue;
-            if (rule.onlyWithRasterCaching && xobjmode != 0 && xobjmode != 2)
-                return;
-            int group = -1;
-            switch (rule.into) {
-            case Into::NewGroup:
-                entry.newDataGroup(logHandle, rule.name, "", rule.name, group, nullptr, 0);
-                break;
-            case Into::ProductInfoGroup:
-                if (ProductInfoGroupID == -1)
-                    entry.newDataGroup(logHandle, "ProductInfo", "", "ProductInfo",
-                                       ProductInfoGroupID, nullptr, 0);
-                group = ProductInfoGroupID;
-                if (const auto mode = readValue<unsigned int>(source, "xobjMode"))
-                    xobjmode = static_cast<int>(*mode);
-                break;
-            case Into::JobInfoGroup:
-                if (JobInfoGroupID == -1)
-                    entry.newDataGroup(logHandle, "JobInfo", "", "JobInfo", JobInfoGroupID, nullptr,
-                                       0);
-                group = JobInfoGroupID;
-                if (const auto start = readValue<double>(source, "StartTime"))
-                    jobStartTime = *start;
-                break;
-            }
-            for (const char* key : rule.keys) {
-                if (!key)
-                    break;
-                if (const auto value = readText(source, key))
-                    entry.addToGroup(logHandle, group, key, value->c_str());
-                else if (std::strcmp(key, "PreferredFont") == 0)
-                    entry.addToGroup(logHandle, group, key, "ERROR : PreferredFont Not Found");
-            }
-            return;
+        int group = -1;
+        switch (rule.into) {
+        case Into::NewGroup:
+            entry.newDataGroup(state.logHandle, rule.name, "", rule.name, group, nullptr, 0);
+            break;
+        case Into::ProductInfoGroup:
+            if (state.ProductInfoGroupID == -1)
+                entry.newDataGroup(state.logHandle, "ProductInfo", "", "ProductInfo",
+                                   state.ProductInfoGroupID, nullptr, 0);
+            group = state.ProductInfoGroupID;
+            if (const auto mode = readValue<unsigned int>(source, "xobjMode"))
+                state.xobjmode = static_cast<int>(*mode);
+            break;
+        case Into::JobInfoGroup:
+            if (state.JobInfoGroupID == -1)
+                entry.newDataGroup(state.logHandle, "JobInfo", "", "JobInfo", state.JobInfoGroupID,
+                                   nullptr, 0);
+            group = state.JobInfoGroupID;
+            if (const auto start = readValue<double>(source, "StartTime"))
+                state.jobStartTime = *start;
+            break;
         }
-    } catch (...) {
-        // The worker thread must survive a record it cannot read.
+        for (const char* key : rule.keys) {
+            if (!key)
+                break;
+            if (const auto value = readText(source, key))
+                entry.addToGroup(state.logHandle, group, key, value->c_str());
+            else if (std::strcmp(key, "PreferredFont") == 0)
+                entry.addToGroup(state.logHandle, group, key, "ERROR : PreferredFont Not Found");
+        }
+        return;
     }
 }
 
-void Farlamp::LogDict(const CZYRDict& info) {
-    const std::lock_guard lock(stateLock);
-    if (!loggingEnabled || !logHandle || !info.isValid())
+} // namespace
+
+// Runs on the analytics worker, which waits for the writer: the worker's own queue is where
+// records wait, bounded, while the library is slow.
+void Farlamp::LogDataObject(const C_SmartPtr<I_AnalyticsData>& record) {
+    if (!LoggingEnabled() || !record)
         return;
+    std::promise<void> written;
+    C_SmartPtr<I_AnalyticsData> held = record;
+    if (state.writer.post([&written, held] {
+            const struct Done {
+                std::promise<void>& done;
+                ~Done() { done.set_value(); }
+            } done{written};
+            logRecord(held.get());
+        }))
+        written.get_future().wait();
+}
+
+void Farlamp::LogDict(const CZYRDict& info) {
+    if (!LoggingEnabled() || !info.isValid())
+        return;
+    // The facts are read here, the group written by the writer.
+    std::vector<std::pair<std::string, std::string>> values;
     try {
         I_Dict* source = info.getImpl();
         const auto groupName = readValue<I_UniString*>(source, "DataGroupName");
@@ -448,12 +621,10 @@ void Farlamp::LogDict(const CZYRDict& info) {
             return;
         if (!(CZYRUniString(*groupName, false) == CZYRUniString("PDFInfo")))
             return;
-        int group = -1;
-        entry.newDataGroup(logHandle, "PDFInfo", "", "PDFInfo", group, nullptr, 0);
         const auto major = readText(source, "PDFMajorVersion");
         const auto minor = readText(source, "PDFMinorVersion");
         if (major && minor)
-            entry.addToGroup(logHandle, group, "PDFVersion", (*major + "." + *minor).c_str());
+            values.emplace_back("PDFVersion", *major + "." + *minor);
         constexpr std::pair<const char*, const char*> kFacts[] = {{"PDFE", "PDFE"},
                                                                   {"PDFX", "PDFX"},
                                                                   {"PDFA", "PDFA"},
@@ -465,131 +636,115 @@ void Farlamp::LogDict(const CZYRDict& info) {
                                                                   {"NumPages", "NumPages"}};
         for (const auto& [logged, key] : kFacts)
             if (const auto value = readText(source, key))
-                entry.addToGroup(logHandle, group, logged, value->c_str());
+                values.emplace_back(logged, *value);
     } catch (...) {
-        // Facts that cannot be read are not logged.
+        return; // facts that cannot be read are not logged
     }
+    postCall([values = std::move(values)] { logGroup("PDFInfo", values); });
 }
 
 void Farlamp::LogZYRError(eZYRErrorType type, const char* area, const char* file) {
-    const std::lock_guard lock(stateLock);
-    if (!loggingEnabled || !logHandle)
+    if (!LoggingEnabled())
         return;
     const char* name = errorTypeName(type);
     if (!name)
         reportUniqueError(u" Error code not updated in Analytics \n");
-    const std::string typeText = name ? name : decimal(static_cast<int>(type));
     std::string fileName = file ? file : "";
     if (const auto slash = fileName.find_last_of("/\\"); slash != std::string::npos)
         fileName.erase(0, slash + 1);
-    int group = -1;
-    entry.newDataGroup(logHandle, "ErrorInfo", "", "ErrorInfo", group, nullptr, 0);
-    entry.addToGroup(logHandle, group, "Area", area ? area : "");
-    entry.addToGroup(logHandle, group, "Type", typeText.c_str());
-    entry.addToGroup(logHandle, group, "Parameter1", fileName.c_str());
-    entry.addToGroup(logHandle, group, "Parameter2", "");
-    entry.addToGroup(logHandle, group, "Parameter3", "");
-    entry.addToGroup(logHandle, group, "Fatal", type == kZYRErrorFatal ? "1" : "0");
+    std::vector<std::pair<std::string, std::string>> values = {
+        {"Area", area ? area : ""}, {"Type", name ? name : decimal(static_cast<int>(type))},
+        {"Parameter1", fileName},   {"Parameter2", ""},
+        {"Parameter3", ""},         {"Fatal", type == kZYRErrorFatal ? "1" : "0"}};
+    postCall([values = std::move(values)] { logGroup("ErrorInfo", values); });
 }
 
 // ---- events -------------------------------------------------------------------------------
 
 unsigned int Farlamp::LogEvent(eZYRAnalyticsEventType type, bool peek) {
-    if (!loggingEnabled)
+    if (!LoggingEnabled())
         return 0;
     if (type >= 0 && type < kZYRAnalyticsEventAll) {
-        // Relaxed: the counters are independent tallies read when a job ends.
-        auto& counter = eventCounters[type];
+        auto& counter = state.eventCounters[type];
         return peek ? counter.load(std::memory_order_relaxed)
                     : counter.fetch_add(1, std::memory_order_relaxed) + 1;
     }
-    if (type != kZYRAnalyticsEventAll)
-        return 0;
-    const std::lock_guard lock(stateLock);
-    for (int i = 0; i < kZYRAnalyticsEventAll; ++i) {
-        if (eventCounters[i].load(std::memory_order_relaxed) == 0)
-            continue;
-        const bool logged =
-            (i >= kZYRAnalyticsEventEnableLowResRasterization &&
-             i <= kZYRAnalyticsEventZYREnableMTR) ||
-            (i == kZYRAnalyticsEventCachePlacedObject &&
-             eventCounters[kZYRAnalyticsEventPlacedObjectCached].load(std::memory_order_relaxed)) ||
-            (i == kZYRAnalyticsEventEnableCutContourProcessing &&
-             eventCounters[kZYRAnalyticsEventCutContourProcessed].load(std::memory_order_relaxed));
-        if (logged && logHandle)
-            entry.logEvent(logHandle, "Job", "", kEventNames[i], nullptr, 0);
-        eventCounters[i].store(0, std::memory_order_relaxed);
-    }
+    if (type == kZYRAnalyticsEventAll)
+        postCall([counts = takeCounters()] { logCountedEvents(counts); });
     return 0;
 }
 
 void Farlamp::LogEventNow(eZYRAnalyticsEventType type) {
-    const std::lock_guard lock(stateLock);
-    if (!loggingEnabled || !logHandle || type < 0 ||
-        static_cast<size_t>(type) >= kEventNames.size())
+    if (type < 0 || static_cast<size_t>(type) >= kEventNames.size())
         return;
-    entry.logEvent(logHandle, "Job", "", kEventNames[type], nullptr, 0);
+    postCall([type] {
+        if (state.logHandle)
+            state.entry.logEvent(state.logHandle, "Job", "", kEventNames[type], nullptr, 0);
+    });
 }
 
 void Farlamp::FlushJob(double time) {
-    if (!loggingEnabled)
+    if (!LoggingEnabled())
         return;
-    {
-        const std::lock_guard lock(stateLock);
-        if (!logHandle)
+    // One set of counts serves the job's values and its events.
+    postCall([time, counts = takeCounters()] {
+        if (!state.logHandle)
             return;
-        if (JobInfoGroupID != -1) {
+        if (state.JobInfoGroupID != -1) {
             char elapsed[64];
-            std::snprintf(elapsed, sizeof elapsed, "%.2f", time - jobStartTime);
-            entry.addToGroup(logHandle, JobInfoGroupID, "CompletionTime", elapsed);
-            entry.addToGroup(logHandle, JobInfoGroupID, "HasTrapping",
-                             eventCounters[kZYRAnalyticsEventHasTrapping] ? "1" : "0");
-            entry.addToGroup(logHandle, JobInfoGroupID, "HasTransparency",
-                             eventCounters[kZYRAnalyticsEventHasTransparency] ? "1" : "0");
+            std::snprintf(elapsed, sizeof elapsed, "%.2f", time - state.jobStartTime);
+            const auto add = [](const char* key, const char* value) {
+                state.entry.addToGroup(state.logHandle, state.JobInfoGroupID, key, value);
+            };
+            add("CompletionTime", elapsed);
+            add("HasTrapping", counts[kZYRAnalyticsEventHasTrapping] ? "1" : "0");
+            add("HasTransparency", counts[kZYRAnalyticsEventHasTransparency] ? "1" : "0");
         }
-    }
-    LogEvent(kZYRAnalyticsEventAll, true);
-    const std::lock_guard lock(stateLock);
-    if (prevSurfaceCount > 0)
-        LogSurfaceDataGroupHelper(prevSurfaceInfo);
-    prevSurfaceInfo = sSurfaceInfo{};
-    prevSurfaceCount = 0;
-    JobInfoGroupID = -1; // the next job gets a group of its own
+        logCountedEvents(counts);
+        if (state.prevSurfaceCount > 0)
+            LogSurfaceDataGroupHelper(state.prevSurfaceInfo);
+        state.prevSurfaceInfo = sSurfaceInfo{};
+        state.prevSurfaceCount = 0;
+        state.JobInfoGroupID = -1; // the next job gets a group of its own
+    });
 }
 
 // ---- surfaces -----------------------------------------------------------------------------
 
 void Farlamp::UpdateCurrentSurfaceInfo(double width, double height, unsigned int placedObjects) {
-    const std::lock_guard lock(stateLock);
-    if (loggingEnabled)
-        currSurfaceInfo = {width, height, placedObjects};
+    postCall([surface = sSurfaceInfo{width, height, placedObjects}] {
+        state.currSurfaceInfo = surface;
+    });
 }
 
 void Farlamp::LogSurfaceDataGroup() {
-    const std::lock_guard lock(stateLock);
-    if (!loggingEnabled || !logHandle)
-        return;
-    if (prevSurfaceCount > 0 && currSurfaceInfo == prevSurfaceInfo) {
-        ++prevSurfaceCount;
-        return;
-    }
-    if (prevSurfaceCount > 0)
-        LogSurfaceDataGroupHelper(prevSurfaceInfo);
-    prevSurfaceInfo = currSurfaceInfo;
-    prevSurfaceCount = 1;
+    postCall([] {
+        if (!state.logHandle)
+            return;
+        if (state.prevSurfaceCount > 0 && state.currSurfaceInfo == state.prevSurfaceInfo) {
+            ++state.prevSurfaceCount;
+            return;
+        }
+        if (state.prevSurfaceCount > 0)
+            LogSurfaceDataGroupHelper(state.prevSurfaceInfo);
+        state.prevSurfaceInfo = state.currSurfaceInfo;
+        state.prevSurfaceCount = 1;
+    });
 }
 
 void Farlamp::LogSurfaceDataGroupHelper(sSurfaceInfo& info) {
-    if (!logHandle)
+    if (!state.logHandle)
         return;
     char resolution[64];
     std::snprintf(resolution, sizeof resolution, "%dX%d", wholeUnits(info.width),
                   wholeUnits(info.height));
     int group = -1;
-    entry.newDataGroup(logHandle, "SurfaceInfo", "", "Surface", group, nullptr, 0);
-    entry.addToGroup(logHandle, group, "Surface Resolution", resolution);
-    entry.addToGroup(logHandle, group, "Placed Objects", decimal(info.placedObjects).c_str());
-    entry.addToGroup(logHandle, group, "count", decimal(prevSurfaceCount).c_str());
+    state.entry.newDataGroup(state.logHandle, "SurfaceInfo", "", "Surface", group, nullptr, 0);
+    state.entry.addToGroup(state.logHandle, group, "Surface Resolution", resolution);
+    state.entry.addToGroup(state.logHandle, group, "Placed Objects",
+                           decimal(info.placedObjects).c_str());
+    state.entry.addToGroup(state.logHandle, group, "count",
+                           decimal(state.prevSurfaceCount).c_str());
 }
 
 } // namespace ZYRStd

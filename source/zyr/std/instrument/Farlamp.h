@@ -2,9 +2,6 @@
 // libKelvrin.so, loaded at run time. Without a complete library every operation does nothing.
 #pragma once
 
-#include <atomic>
-#include <mutex>
-
 #include "C_SmartPtr.h"
 #include "I_AnalyticsData.h"
 #include "ZYRStdExport.h"
@@ -69,27 +66,12 @@ public:
     static bool LoggingEnabled();
 
 private:
+    // The session's state lives in Farlamp.cpp, in one record guarded by one lock; these
+    // helpers expect that lock held.
     static void Initialize(bool active);
     static void LoadLibraryFunction();
     static void UnloadLibraryFunction();
     static void LogSurfaceDataGroupHelper(sSurfaceInfo& info);
-
-    // Every operation but the counting of events runs under this lock: the analytics worker
-    // and the engine's threads share the groups and the session.
-    static std::mutex stateLock;
-    static void* libInst;
-    static bool libraryFunctionLoaded;
-    static bool initialized;
-    static std::atomic<bool> loggingEnabled;
-    static Kelvrin* logHandle;
-    static int ProductInfoGroupID;
-    static int JobInfoGroupID;
-    static double jobStartTime;
-    static int xobjmode;
-    static sSurfaceInfo currSurfaceInfo;
-    static sSurfaceInfo prevSurfaceInfo;
-    static unsigned int prevSurfaceCount; // surfaces in the run prevSurfaceInfo describes
-    static std::atomic<unsigned int> eventCounters[kZYRAnalyticsEventAll];
 };
 
 } // namespace ZYRStd

@@ -13,12 +13,16 @@
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/ZYRThread.h"
 #include "zyr/std/instrument/Farlamp.h"
+#include "zyr/std/instrument/internal/FarlampInternal.h"
 
 namespace ZYRStd {
 
 namespace {
 
 constexpr const char* kSource = "source/zyr/std/IImpZYRAnalyticsManager";
+// Records waiting beyond this are dropped and counted: a slow telemetry library must not
+// make the queue grow without end.
+constexpr size_t kMaxQueuedRecords = 1024;
 
 class IImpZYRAnalyticsManager final : public IZYRAnalyticsManager, public CZYRClientBase {
 public:
@@ -40,6 +44,10 @@ public:
                 throw CZYRError(ZYRPublic::kZYRErrorInvalidFuncCall,
                                 "Attempt to enqueue Job after ZYRTerminate called.", kSource,
                                 __LINE__);
+            if (queue_.size() >= kMaxQueuedRecords) {
+                ++dropped_;
+                return;
+            }
             wasEmpty = queue_.empty();
             queue_.push_back(std::move(record));
         }
@@ -61,6 +69,8 @@ public:
             worker_.join();
         const mutex::scoped_lock lock(lock_);
         queue_.clear();
+        if (dropped_)
+            noteDroppedAnalyticsRecords(std::exchange(dropped_, 0));
     }
 
 private:
@@ -94,8 +104,9 @@ private:
     // Written under lock_; the worker also reads it between records without the lock.
     std::atomic<bool> terminating_{false};
     detail::condition_impl wakeup_; // the queue got a record, or termination began
-    mutex lock_;                    // guards queue_
+    mutex lock_;                    // guards queue_ and dropped_
     std::deque<C_SmartPtr<I_AnalyticsData>> queue_;
+    unsigned long long dropped_ = 0; // records refused because the queue was full
 };
 
 // The manager lives as long as the process, so that a producer holding its pointer while
