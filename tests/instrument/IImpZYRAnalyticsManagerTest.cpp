@@ -85,8 +85,14 @@ TEST_F(IImpZYRAnalyticsManagerTest, TerminationDropsWhatTheWorkerHasNotReached) 
                                            "called. (source/zyr/std/IImpZYRAnalyticsManager:"))
         << error;
     EXPECT_EQ(GetZYRAnalyticsManager(), nullptr);
+    // A slow terminator lets the producer fill the queue past its bound; the count of what
+    // was dropped then joins the session.
+    Calls written = recorder.take();
+    std::erase_if(written, [](const std::string& call) {
+        return zyrtest::startsWith(call, "UTAddToSession(DroppedRecords,");
+    });
     EXPECT_EQ(
-        recorder.take(),
+        written,
         (Calls{"UTNewDataGroup(DripSessionInfo,,DripSessionInfo)=100",
                "UTAddToGroup(100,NumWorkers,0)", "UTNewDataGroup(ProductInfo,,ProductInfo)=101",
                "UTAddToGroup(101,OEMName,NoData)", "UTAddToGroup(101,OEMModelName,NoData)",
