@@ -1,16 +1,19 @@
 # Two commands do everything on a fresh Debian machine: `make demo` and `make test`.
 # Each target installs the Debian packages it needs and no more.
 BUILD_PACKAGES   := cmake ninja-build g++ pkg-config libicu-dev libboost-thread-dev nlohmann-json3-dev
-TEST_PACKAGES    := $(BUILD_PACKAGES) googletest libgtest-dev python3 binutils abigail-tools
+TEST_PACKAGES    := $(BUILD_PACKAGES) googletest libgtest-dev python3 binutils abigail-tools doxygen clang
 BENCH_PACKAGES   := $(BUILD_PACKAGES) libbenchmark-dev libssl-dev libinih-dev libabsl-dev
 FUZZ_PACKAGES    := $(BUILD_PACKAGES) clang libclang-rt-14-dev
-PACKAGE_PACKAGES := $(BUILD_PACKAGES) dpkg-dev file
+PACKAGE_PACKAGES := $(BUILD_PACKAGES) dpkg-dev file doxygen
+DOCS_PACKAGES    := $(BUILD_PACKAGES) doxygen
 
 BUILD       ?= build
 ASAN_BUILD  ?= build-asan
 TSAN_BUILD  ?= build-tsan
 BENCH_BUILD ?= build-bench
 FUZZ_BUILD  ?= build-fuzz
+LOCKS_BUILD ?= build-locks
+DOCS_BUILD  ?= build-docs
 PACKAGE_BUILD ?= build-package
 CMAKE_FLAGS := -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo
 CTEST_FLAGS := --output-on-failure -j2
@@ -20,7 +23,7 @@ FUZZ_SECONDS ?= 60
 SOAK_SECONDS ?= 60
 
 .PHONY: all deps deps-test deps-bench deps-fuzz deps-package build demo test test-normal \
-        test-asan test-tsan bench fuzz soak install package package-check clean format abi-baseline
+        test-asan test-tsan test-locks bench fuzz soak install package package-check clean format abi-baseline docs deps-docs
 
 all: build
 
@@ -48,6 +51,8 @@ deps-bench:
 	$(call install_packages,$(BENCH_PACKAGES))
 deps-fuzz:
 	$(call install_packages,$(FUZZ_PACKAGES))
+deps-docs:
+	$(call install_packages,$(DOCS_PACKAGES))
 deps-package:
 	$(call install_packages,$(PACKAGE_PACKAGES))
 
@@ -83,7 +88,14 @@ test-tsan: deps-test
 	cd $(TSAN_BUILD) && TSAN_OPTIONS="halt_on_error=1 second_deadlock_stack=1" \
 	  setarch $$(uname -m) -R ctest $(CTEST_FLAGS) -L threads
 
-test: test-normal test-asan test-tsan
+# clang's thread-safety analysis over the library: a compile-only check of the lock
+# annotations (no test runs in this build).
+test-locks: deps-test
+	CC=clang CXX=clang++ cmake -S . -B $(LOCKS_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=Debug \
+	  -DCMAKE_CXX_FLAGS=-g0 -DZYRSTD_BUILD_TESTS=OFF
+	cmake --build $(LOCKS_BUILD) --target ZYRStd Kelvrin zyrstd_hostkit
+
+test: test-normal test-asan test-tsan test-locks
 
 bench: deps-bench
 	cmake -S . -B $(BENCH_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=Release -DZYRSTD_BUILD_TESTS=OFF -DZYRSTD_BUILD_BENCH=ON
@@ -115,8 +127,11 @@ soak: deps-test
 
 # Debian packages of the runtime library with the tool, and of the development files.
 package: deps-package
-	cmake -S . -B $(PACKAGE_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=Release -DZYRSTD_BUILD_TESTS=OFF
+	cmake -S . -B $(PACKAGE_BUILD) -G Ninja -DCMAKE_BUILD_TYPE=Release -DZYRSTD_BUILD_TESTS=OFF \
+	  -DZYRSTD_DOCS_DIR=$(CURDIR)/$(PACKAGE_BUILD)/docs
 	cmake --build $(PACKAGE_BUILD)
+	tests/install/docs_check.sh $(PACKAGE_BUILD) . --html $(PACKAGE_BUILD)/docs
+	cmake -S . -B $(PACKAGE_BUILD) # the reference now exists: the -dev package takes it
 	cd $(PACKAGE_BUILD) && cpack -G DEB
 	@ls -1 $(PACKAGE_BUILD)/*.deb
 
@@ -131,6 +146,11 @@ package-check: package
 	zyrstd --help > /dev/null
 	DEBIAN_FRONTEND=noninteractive apt-get remove -y -qq libzyrstd-dev libzyrstd0
 
+# The HTML reference of the installed interface, README as its main page, into
+# $(DOCS_BUILD)/html; an undocumented installed declaration fails it.
+docs: deps-docs build
+	tests/install/docs_check.sh $(BUILD) . --html $(DOCS_BUILD)
+
 # Records the exported interface of a normal build as the new baseline: only for a deliberate
 # change (an incompatible one also bumps the SONAME; see the README).
 abi-baseline: deps-test
@@ -142,4 +162,4 @@ format:
 	clang-format -i $$(git ls-files '*.cpp' '*.h')
 
 clean:
-	rm -rf $(BUILD) $(BUILD)-test $(ASAN_BUILD) $(TSAN_BUILD) $(BENCH_BUILD) $(FUZZ_BUILD) $(PACKAGE_BUILD)
+	rm -rf $(BUILD) $(BUILD)-test $(ASAN_BUILD) $(TSAN_BUILD) $(BENCH_BUILD) $(FUZZ_BUILD) $(PACKAGE_BUILD) $(LOCKS_BUILD) $(DOCS_BUILD)
