@@ -15,6 +15,15 @@ mv "$work/first" "$work/prefix"
 prefix="$work/prefix"
 
 "$prefix/bin/zyrstd" --help >/dev/null
+# The manual page, with the version filled in, where man looks beside bin/.
+grep -q '^\.TH ZYRSTD 1 .*ZYRStd [0-9]' "$prefix/share/man/man1/zyrstd.1" || {
+    echo "no manual page with a version under share/man/man1"; exit 1
+}
+if command -v man >/dev/null; then
+    MANPATH="$prefix/share/man" man zyrstd 2>/dev/null | grep -q 'EXIT STATUS' || {
+        echo "man zyrstd shows no manual page"; exit 1
+    }
+fi
 
 # Only the interface is installed.
 if find "$prefix/include" -name '*.cpp' | grep -q .; then
