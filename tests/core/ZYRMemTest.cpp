@@ -1,4 +1,5 @@
 #include <gtest/gtest.h>
+#include <sys/mman.h>
 #include <sys/resource.h>
 
 #include <algorithm>
@@ -49,14 +50,34 @@ void report(const char16_t* text, bool unique = false) {
            : stack.reportError(ZYRMakeErrorInfo(1, text));
 }
 
+// Takes usage to the limit plus `offset` (a multiple of 8), at any statistics level.
 void* fillToLimit(long long offset = 0) {
     ZYRSetMemLimit(kLimit);
     DisableMemUsageCheck();
-    void* filler = ZYRMalloc(static_cast<unsigned int>(kLimit + offset - GetMemUsage()));
+    const unsigned long long overhead = ZYRGetMemStatLevel() ? 20 : 0; // guards and header
+    void* filler = ZYRMalloc(static_cast<unsigned int>(kLimit + offset - GetMemUsage() - overhead));
     EnableMemUsageCheck();
-    EXPECT_NE(filler, nullptr);
+    EXPECT_TRUE(filler && GetMemUsage() == kLimit + offset);
     return filler;
 }
+
+// A host whose next call, once armed, waits inside the host until it is let go.
+struct GateHost {
+    std::atomic<bool> armed{false};
+    std::promise<void> entered, release;
+    void wait() {
+        if (armed.exchange(false))
+            entered.set_value(), release.get_future().wait();
+    }
+    tZYRMemMgr record() {
+        return {
+            [](size_t n, void* gate) { return static_cast<GateHost*>(gate)->wait(), malloc(n); },
+            [](void* p, size_t n, void* gate) {
+                return static_cast<GateHost*>(gate)->wait(), realloc(p, n);
+            },
+            [](void* p, void*) { free(p); }, this};
+    }
+};
 
 const auto aligned16 = [](const void* p) { return reinterpret_cast<uintptr_t>(p) % 16 == 0; };
 const auto grants = [](unsigned int size) {
@@ -200,6 +221,37 @@ TEST_F(ZYRMemTest, ConcurrentAllocationsNeverPassTheLimit) {
     for (const auto& mine : got)
         std::for_each(mine.begin(), mine.end(), ZYRFree);
     EXPECT_EQ(GetMemUsage(), used);
+}
+
+// Every request reserves its bytes before it asks the host: a resize waiting in the host
+// holds its room, and so does an allocation (usage never passes the limit meanwhile).
+TEST_F(ZYRMemTest, LimitIsAHardCapAtEveryLevel) {
+    for (const int level : {0, 1, 2})
+        for (const bool resizeWaits : {true, false}) {
+            SCOPED_TRACE(std::to_string(level) + (resizeWaits ? " resize" : " allocation"));
+            GateHost gate;
+            tZYRMemMgr record = gate.record();
+            zyrtest::installFront(level, &record);
+            void* small = ZYRMalloc(64);
+            void* filler = fillToLimit(-8);
+            EXPECT_EQ(VirtualMemAlloc(1), nullptr) << "a page is more than the room left";
+            ZYRFree(filler);
+            filler = fillToLimit(-4096);
+            gate.armed = true;
+            void* waiting = nullptr;
+            std::thread first(
+                [&] { waiting = resizeWaits ? ZYRRealloc(small, 3064) : ZYRMalloc(3000); });
+            gate.entered.get_future().wait();
+            void* second = resizeWaits ? ZYRMalloc(2000) : ZYRRealloc(small, 2064);
+            EXPECT_EQ(second, nullptr) << "the waiting request holds the room";
+            gate.release.set_value();
+            first.join();
+            EXPECT_TRUE(waiting && GetMemUsage() <= kLimit);
+            ZYRFree(resizeWaits ? nullptr : small);
+            for (void* p : {waiting, filler})
+                ZYRFree(p);
+            fetch();
+        }
 }
 
 TEST_F(ZYRMemTest, GuardCheckFindsDamageWithoutReadingPastTheBlock) {
@@ -350,6 +402,13 @@ TEST_F(ZYRMemTest, StatusKeepsTheReserveBack) {
     VirtualMemStatus(&info);
     EXPECT_EQ(info.availablePhysical, info.totalPhysical);
     ZYRSetTestAvailablePhysicalMemory(true);
+    // A reservation of address space is no use of memory (sanitizers map terabytes too).
+    void* reserved =
+        mmap(nullptr, 1ull << 40, PROT_NONE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
+    ASSERT_NE(reserved, MAP_FAILED);
+    VirtualMemStatus(&info);
+    munmap(reserved, 1ull << 40);
+    EXPECT_GT(info.availableForAllocation, 0u);
 #if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__) // they map terabytes
     EXPECT_EXIT(
         {

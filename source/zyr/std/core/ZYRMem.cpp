@@ -190,6 +190,9 @@ struct Tracker {
     unsigned int reallocCount = 0;
     unsigned int freeCount = 0;
     unsigned int currentBytes = 0;
+    // Bytes that requests have reserved against the limit and not yet counted as held: the
+    // limit test counts them, the counters and the leak report do not.
+    uint64_t reservedBytes = 0;
     unsigned int peakBytes = 0;
     std::map<void*, AllocationEntry> allocations; // block -> serial and requested size
     std::map<void*, unsigned int> virtualBlocks;  // base -> stack identifier
@@ -198,6 +201,7 @@ struct Tracker {
 
     void reset() {
         allocCount = reallocCount = freeCount = currentBytes = peakBytes = 0;
+        reservedBytes = 0;
         allocations.clear();
         virtualBlocks.clear();
         breakAtSerial = ~0u;
@@ -233,7 +237,18 @@ bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) {
     const uint64_t limit = memLimitBytes.load(std::memory_order_relaxed);
     if (limit >= detail::kGuardedLimitCeiling)
         return true;
-    return !(uint64_t{t.currentBytes} + add - sub > limit && usageCheckOn());
+    return !(t.currentBytes + t.reservedBytes + add - sub > limit && usageCheckOn());
+}
+
+// Caller holds the tracker mutex. The test and the reservation in one hold: a thread that
+// tests after us sees our bytes, so two requests can never both take the last room. A
+// shrink only tests; it gives its bytes back once the host has resized.
+bool trackerReserveLocked(Tracker& t, uint64_t add, uint64_t sub) {
+    if (!trackerLimitTestLocked(t, add, sub))
+        return false;
+    if (add > sub)
+        t.reservedBytes += add - sub;
+    return true;
 }
 
 // ---- plain variants -------------------------------------------------------------------
@@ -251,14 +266,16 @@ void* plainUser(void* block) {
 void* plainAlloc(unsigned int size) {
     if (size == 0)
         return nullptr;
-    void* block = host.allocProc(size + kPlainHeader, host.clientData);
-    if (!block)
-        return nullptr;
+    // The bytes are reserved before the host is asked, so the total never passes the limit.
     const uint64_t accounted = round8(size);
     const bool reused = mayReusePendingFrees() && takePendingFrees(pendingFrees, accounted);
     if (!reused && !detail::plainLimitTest(accounted, 0, true)) {
-        host.freeProc(block, host.clientData);
         detail::sendOutOfMemoryNotice();
+        return nullptr;
+    }
+    void* block = host.allocProc(size + kPlainHeader, host.clientData);
+    if (!block) {
+        detail::plainUsageSub(accounted);
         return nullptr;
     }
     plainSize(block) = size;
@@ -285,19 +302,21 @@ void* plainRealloc(void* p, unsigned int size) {
     void* block = plainBlock(p);
     const uint64_t oldAccounted = round8(plainSize(block));
     const uint64_t newAccounted = round8(size);
-    if (!detail::plainLimitTest(newAccounted, oldAccounted, false)) {
+    const bool grows = newAccounted > oldAccounted;
+    if (!detail::plainLimitTest(newAccounted, oldAccounted, grows)) {
         detail::sendOutOfMemoryNotice();
         return nullptr;
     }
-    void* grown = host.reallocProc(block, size + kPlainHeader, host.clientData);
-    if (!grown)
+    void* resized = host.reallocProc(block, size + kPlainHeader, host.clientData);
+    if (!resized) {
+        if (grows)
+            detail::plainUsageSub(newAccounted - oldAccounted);
         return nullptr;
-    plainSize(grown) = size;
-    if (newAccounted >= oldAccounted)
-        totalUsage.fetch_add(newAccounted - oldAccounted, std::memory_order_relaxed);
-    else
-        totalUsage.fetch_sub(oldAccounted - newAccounted, std::memory_order_relaxed);
-    return plainUser(grown);
+    }
+    plainSize(resized) = size;
+    if (!grows)
+        detail::plainUsageSub(oldAccounted - newAccounted);
+    return plainUser(resized);
 }
 
 // ---- guarded variants -----------------------------------------------------------------
@@ -316,23 +335,26 @@ void writeGuards(unsigned char* block, uint32_t size) {
 
 void* guardedAlloc(unsigned int size) {
     const uint32_t n = std::max(size, 1u);
-    auto* block = static_cast<unsigned char*>(host.allocProc(n + kGuardOverhead, host.clientData));
-    if (!block)
-        return nullptr;
     const uint64_t accounted = guardedAccounted(n);
     Tracker& t = tracker();
+    bool reserved;
     {
         std::lock_guard lock(t.mutex);
-        if (trackerLimitTestLocked(t, accounted, 0)) {
-            recordAllocLocked(t, block, accounted, n);
-            writeGuards(block, n);
-            reinterpret_cast<GuardHeader*>(block)->stackId = t.walker->capture(10, 2, 32, n);
-            return block + kGuardHeader;
-        }
+        reserved = trackerReserveLocked(t, accounted, 0);
     }
-    host.freeProc(block, host.clientData);
-    detail::sendOutOfMemoryNotice();
-    return nullptr;
+    if (!reserved) {
+        detail::sendOutOfMemoryNotice(); // outside the tracker lock: reporting allocates
+        return nullptr;
+    }
+    auto* block = static_cast<unsigned char*>(host.allocProc(n + kGuardOverhead, host.clientData));
+    std::lock_guard lock(t.mutex);
+    t.reservedBytes -= accounted;
+    if (!block)
+        return nullptr;
+    recordAllocLocked(t, block, accounted, n);
+    writeGuards(block, n);
+    reinterpret_cast<GuardHeader*>(block)->stackId = t.walker->capture(10, 2, 32, n);
+    return block + kGuardHeader;
 }
 
 void guardedFree(void* p) {
@@ -358,35 +380,35 @@ void* guardedRealloc(void* p, unsigned int size) {
     const uint64_t oldAccounted = guardedAccounted(oldSize);
     const uint64_t newAccounted = guardedAccounted(size);
     Tracker& t = tracker();
-    bool withinLimit;
+    bool reserved;
     {
         std::lock_guard lock(t.mutex);
-        withinLimit = trackerLimitTestLocked(t, newAccounted, oldAccounted);
+        reserved = trackerReserveLocked(t, newAccounted, oldAccounted);
     }
-    if (!withinLimit) {
+    if (!reserved) {
         detail::sendOutOfMemoryNotice();
         return nullptr;
     }
-    auto* grown = static_cast<unsigned char*>(
+    auto* resized = static_cast<unsigned char*>(
         host.reallocProc(header, size + kGuardOverhead, host.clientData));
-    if (!grown)
+    std::lock_guard lock(t.mutex);
+    if (newAccounted > oldAccounted)
+        t.reservedBytes -= newAccounted - oldAccounted;
+    if (!resized)
         return nullptr;
-    {
-        std::lock_guard lock(t.mutex);
-        t.reallocCount += 1;
-        t.currentBytes += static_cast<unsigned int>(newAccounted - oldAccounted);
-        t.peakBytes = std::max(t.peakBytes, t.currentBytes);
-        if (statLevel >= 2) {
-            if (auto node = t.allocations.extract(header)) {
-                node.key() = grown;
-                node.mapped().size = size;
-                t.allocations.insert(std::move(node));
-            }
+    t.reallocCount += 1;
+    t.currentBytes += static_cast<unsigned int>(newAccounted - oldAccounted);
+    t.peakBytes = std::max(t.peakBytes, t.currentBytes);
+    if (statLevel >= 2) {
+        if (auto node = t.allocations.extract(header)) {
+            node.key() = resized;
+            node.mapped().size = size;
+            t.allocations.insert(std::move(node));
         }
-        t.walker->resize(reinterpret_cast<GuardHeader*>(grown)->stackId, oldSize, size);
     }
-    writeGuards(grown, size);
-    return grown + kGuardHeader;
+    t.walker->resize(reinterpret_cast<GuardHeader*>(resized)->stackId, oldSize, size);
+    writeGuards(resized, size);
+    return resized + kGuardHeader;
 }
 
 // ---- the table the front calls through ------------------------------------------------
@@ -639,15 +661,22 @@ uint64_t plainUsage() {
     return totalUsage.load(std::memory_order_relaxed);
 }
 
-bool trackerLimitTest(uint64_t add, uint64_t sub) {
+bool trackerReserve(uint64_t bytes) {
     Tracker& t = tracker();
     std::lock_guard lock(t.mutex);
-    return trackerLimitTestLocked(t, add, sub);
+    return trackerReserveLocked(t, bytes, 0);
+}
+
+void trackerUnreserve(uint64_t bytes) {
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    t.reservedBytes -= bytes;
 }
 
 void trackerRecordAlloc(void* block, uint64_t bytes) {
     Tracker& t = tracker();
     std::lock_guard lock(t.mutex);
+    t.reservedBytes -= bytes;
     recordAllocLocked(t, block, bytes, 0);
 }
 
@@ -658,6 +687,17 @@ void trackerRecordFree(void* block, uint64_t bytes) {
     t.currentBytes -= static_cast<unsigned int>(bytes);
     if (statLevel >= 2)
         t.allocations.erase(block);
+}
+
+void trackerRecordDecommit(uint64_t before, uint64_t after) {
+    // One hold: freeing `before` and counting `after` anew in two steps would let another
+    // thread take the `after` bytes in between and push the count past the limit.
+    Tracker& t = tracker();
+    std::lock_guard lock(t.mutex);
+    t.freeCount += 1;
+    t.currentBytes -= static_cast<unsigned int>(before);
+    if (after != 0)
+        recordAllocLocked(t, nullptr, after, 0);
 }
 
 void trackerAddVirtualBlock(void* base, unsigned int stackId) {

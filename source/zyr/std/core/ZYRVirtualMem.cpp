@@ -81,27 +81,34 @@ uint64_t limitFileValue(const std::string& path) {
 }
 
 // The smallest value of `file` in the cgroup at `path` below `root` and in each of its
-// ancestors: a parent's cap binds every group beneath it.
-uint64_t smallestAlongPath(const std::string& root, std::string path, const char* file) {
+// ancestors: a parent's cap binds every group beneath it. With `usageFile`, the smallest
+// room instead: each capped group's value less its usage.
+uint64_t smallestAlongPath(const std::string& root, std::string path, const char* file,
+                           const char* usageFile = nullptr) {
     uint64_t smallest = UINT64_MAX;
     for (;;) {
         while (!path.empty() && path.back() == '/')
             path.pop_back();
-        smallest = std::min(smallest, limitFileValue(root + path + "/" + file));
+        uint64_t value = limitFileValue(root + path + "/" + file);
+        if (usageFile && value != UINT64_MAX) {
+            const uint64_t usage = limitFileValue(root + path + "/" + usageFile);
+            if (usage != UINT64_MAX) // an unreadable usage leaves the cap itself
+                value = usage < value ? value - usage : 0;
+        }
+        smallest = std::min(smallest, value);
         if (path.empty())
             return smallest;
         path.erase(path.rfind('/') == std::string::npos ? 0 : path.rfind('/'));
     }
 }
 
-} // namespace
-
-namespace detail {
-
-uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup, const std::string& cgroupRoot) {
+// The cap (or with `room`, the cap less usage) of this process's own memory cgroup.
+uint64_t cgroupMemory(const std::string& procSelfCgroup, const std::string& cgroupRoot, bool room) {
+    const char* usage2 = room ? "memory.current" : nullptr;
+    const char* usage1 = room ? "memory.usage_in_bytes" : nullptr;
     std::ifstream in(procSelfCgroup);
     if (!in)
-        return limitFileValue(cgroupRoot + "/memory.max");
+        return smallestAlongPath(cgroupRoot, "", "memory.max", usage2);
     std::string line;
     std::string unifiedPath;
     bool unified = false;
@@ -121,11 +128,24 @@ uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup, const std::string&
         std::istringstream names(controllers);
         for (std::string name; std::getline(names, name, ',');)
             if (name == "memory") // version 1 (also in a hybrid layout): its own hierarchy
-                return smallestAlongPath(cgroupRoot + "/memory", path, "memory.limit_in_bytes");
+                return smallestAlongPath(cgroupRoot + "/memory", path, "memory.limit_in_bytes",
+                                         usage1);
     }
     if (unified)
-        return smallestAlongPath(cgroupRoot, unifiedPath, "memory.max");
+        return smallestAlongPath(cgroupRoot, unifiedPath, "memory.max", usage2);
     return UINT64_MAX;
+}
+
+} // namespace
+
+namespace detail {
+
+uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup, const std::string& cgroupRoot) {
+    return cgroupMemory(procSelfCgroup, cgroupRoot, false);
+}
+
+uint64_t cgroupMemoryRoom(const std::string& procSelfCgroup, const std::string& cgroupRoot) {
+    return cgroupMemory(procSelfCgroup, cgroupRoot, true);
 }
 
 } // namespace detail
@@ -133,17 +153,22 @@ uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup, const std::string&
 void* VirtualMemAlloc(unsigned int size) {
     if (size == 0)
         return nullptr;
+    // The whole pages are what the block holds and what is counted: they are tested and
+    // reserved before the mapping is made, and given back if it fails.
     const uint64_t bytes = roundUpToPage(size);
-    const int level = detail::memStatLevel();
-    const bool withinLimit =
-        level == 0 ? detail::plainLimitTest(size, 0, false) : detail::trackerLimitTest(size, 0);
-    if (!withinLimit) {
+    const bool plain = detail::memStatLevel() == 0;
+    if (!(plain ? detail::plainLimitTest(bytes, 0, true) : detail::trackerReserve(bytes))) {
         detail::sendOutOfMemoryNotice();
         return nullptr;
     }
+    const auto giveBack = [&] {
+        plain ? detail::plainUsageSub(bytes) : detail::trackerUnreserve(bytes);
+    };
     void* base = ::mmap(nullptr, bytes, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-    if (base == MAP_FAILED)
+    if (base == MAP_FAILED) {
+        giveBack();
         return nullptr;
+    }
     try {
         RegionTable& table = regionTable();
         std::lock_guard lock(table.mutex);
@@ -151,11 +176,10 @@ void* VirtualMemAlloc(unsigned int size) {
     } catch (...) {
         // Without its record the block could never be freed or counted: give it back.
         ::munmap(base, bytes);
+        giveBack();
         return nullptr;
     }
-    if (level == 0) {
-        detail::plainUsageAdd(bytes);
-    } else {
+    if (!plain) {
         detail::trackerRecordAlloc(base, bytes);
         detail::trackerAddVirtualBlock(base, detail::stackWalker().capture(10, 2, 32, size));
     }
@@ -226,9 +250,7 @@ void VirtualMemDecommit(void* base, void* addr, unsigned int size) {
         detail::plainUsageSub(before - after);
     } else {
         // The block is counted anew with what stays committed.
-        detail::trackerRecordFree(nullptr, before);
-        if (after != 0)
-            detail::trackerRecordAlloc(nullptr, after);
+        detail::trackerRecordDecommit(before, after);
         const unsigned int id = detail::trackerVirtualBlockId(base);
         if (id != 0)
             detail::stackWalker().resize(id, static_cast<unsigned int>(before),
@@ -252,13 +274,23 @@ void VirtualMemStatus(tZYRVirtualMemoryInfo* info) {
     const uint64_t swapTotal = procField("/proc/meminfo", "SwapTotal", 0);
     const uint64_t swapFree = procField("/proc/meminfo", "SwapFree", 0);
     rlimit addressSpace{};
+    const bool addressSpaceCapped =
+        ::getrlimit(RLIMIT_AS, &addressSpace) == 0 && addressSpace.rlim_cur != RLIM_INFINITY;
     uint64_t totalVirtual = totalPhys + swapTotal;
-    if (::getrlimit(RLIMIT_AS, &addressSpace) == 0 && addressSpace.rlim_cur != RLIM_INFINITY)
+    if (addressSpaceCapped)
         totalVirtual = std::min<uint64_t>(totalVirtual, addressSpace.rlim_cur);
     totalVirtual =
         std::min(totalVirtual, detail::cgroupMemoryLimit("/proc/self/cgroup", "/sys/fs/cgroup"));
-    const uint64_t vmSize = procField("/proc/self/status", "VmSize", 0);
-    const uint64_t availVirtual = totalVirtual > vmSize ? totalVirtual - vmSize : 0;
+    // What the process can still get: physical memory, its cgroup's room, and only where an
+    // address-space cap is set, that cap less the address space in use. Mapped address space
+    // alone costs nothing: sanitizers and large PROT_NONE reservations map terabytes.
+    uint64_t availVirtual =
+        std::min(availPhys, detail::cgroupMemoryRoom("/proc/self/cgroup", "/sys/fs/cgroup"));
+    if (addressSpaceCapped) {
+        const uint64_t vmSize = procField("/proc/self/status", "VmSize", 0);
+        availVirtual = std::min<uint64_t>(
+            availVirtual, addressSpace.rlim_cur > vmSize ? addressSpace.rlim_cur - vmSize : 0);
+    }
     const uint64_t availPageFile = availPhys + swapFree;
 
     info->totalPhysical = totalPhys;

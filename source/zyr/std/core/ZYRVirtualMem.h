@@ -32,6 +32,10 @@ namespace detail {
 // memory.limit_in_bytes along its memory group's path. Exported for the tests only.
 ZYRSTD_API uint64_t cgroupMemoryLimit(const std::string& procSelfCgroup,
                                       const std::string& cgroupRoot);
+// As cgroupMemoryLimit, but each capped group's room: its cap less its usage
+// (memory.current, or memory.usage_in_bytes in version 1), the smallest along the path.
+ZYRSTD_API uint64_t cgroupMemoryRoom(const std::string& procSelfCgroup,
+                                     const std::string& cgroupRoot);
 } // namespace detail
 
 } // namespace ZYRStd

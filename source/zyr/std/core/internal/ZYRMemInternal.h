@@ -32,17 +32,24 @@ int memStatLevel();
 uint64_t memLimit();
 uint64_t memReserve();
 
-// Plain accounting: the test and the move of the total are one atomic step.
+// Plain accounting: the test and the move of the total are one atomic step. A request
+// reserves its bytes this way before the host is asked and gives them back if the host fails.
 bool plainLimitTest(uint64_t add, uint64_t sub, bool move);
 void plainUsageAdd(uint64_t bytes);
 void plainUsageSub(uint64_t bytes);
 uint64_t plainUsage();
 
 // Tracker accounting (statistics level 1 or more).
-bool trackerLimitTest(uint64_t add, uint64_t sub);
-// Counts one allocation of `bytes` and at level 2 enters `block` into the allocation map.
+// Tests `bytes` against the limit and reserves them, in one lock hold.
+bool trackerReserve(uint64_t bytes);
+// Gives back what trackerReserve took for a request the system refused.
+void trackerUnreserve(uint64_t bytes);
+// Counts one allocation of `bytes` that trackerReserve took; at level 2 enters `block` into
+// the allocation map.
 void trackerRecordAlloc(void* block, uint64_t bytes);
 void trackerRecordFree(void* block, uint64_t bytes);
+// A block of `before` bytes now holds `after`: a free and, when bytes remain, an allocation.
+void trackerRecordDecommit(uint64_t before, uint64_t after);
 void trackerAddVirtualBlock(void* base, unsigned int stackId);
 // Removes the block from the virtual-block map and returns its stack identifier.
 unsigned int trackerEraseVirtualBlock(void* base);
