@@ -67,6 +67,10 @@ void crtFree(void* block, void*) {
 constinit tZYRMemMgr host{crtAlloc, crtRealloc, crtFree, nullptr};
 constinit int statLevel = 0;
 
+// The accounting words are counters, not flags that publish data: every access to them is
+// relaxed. The limit test and the move of the total are one compare-exchange on the total
+// itself, and atomicity alone keeps the sum exact whichever order threads see; no other
+// memory is read on the strength of a count, so nothing needs acquire or release.
 constinit std::atomic<uint64_t> memLimitBytes{0};
 constinit std::atomic<uint64_t> memReserveBytes{detail::kDefaultMemReserve};
 constinit std::atomic<uint64_t> totalUsage{0};
@@ -97,6 +101,8 @@ PendingRegistry& pendingRegistry() {
     return *instance;
 }
 
+// Relaxed: the bytes move from one counter to another; the exchange hands each byte over
+// exactly once, which is all the total needs.
 void flushPendingFrees(PendingFrees& pending) {
     if (pending.bytes.load(std::memory_order_relaxed) != 0)
         totalUsage.fetch_sub(pending.bytes.exchange(0, std::memory_order_relaxed),
@@ -109,6 +115,8 @@ bool drainAllPendingFrees() {
     std::lock_guard lock(registry.mutex);
     bool drained = false;
     for (PendingFrees* pending = registry.head; pending; pending = pending->next) {
+        // Relaxed: the registry lock keeps the record alive; the exchange alone makes the
+        // hand-over exact.
         const uint64_t bytes = pending->bytes.exchange(0, std::memory_order_relaxed);
         if (bytes != 0) {
             totalUsage.fetch_sub(bytes, std::memory_order_relaxed);
@@ -155,6 +163,8 @@ void registerPendingFrees(PendingFrees& pending) {
 }
 
 // Takes `bytes` from this thread's pending frees when it has that many.
+// Relaxed: a draining thread may take the bytes meanwhile; the compare-exchange then fails
+// and nothing is counted twice.
 bool takePendingFrees(PendingFrees& pending, uint64_t bytes) {
     uint64_t available = pending.bytes.load(std::memory_order_relaxed);
     while (available >= bytes)
@@ -164,6 +174,8 @@ bool takePendingFrees(PendingFrees& pending, uint64_t bytes) {
     return false;
 }
 
+// Relaxed: a switch of the check that races with a request may or may not apply to it, as
+// with any lock; it guards no other data.
 bool usageCheckOn() {
     return usageCheckCounter.load(std::memory_order_relaxed) >= 1;
 }
@@ -172,6 +184,7 @@ bool usageCheckOn() {
 // total is within the limit: above it (check switched off and on again, or the limit lowered
 // below usage) every request takes the full test.
 bool mayReusePendingFrees() {
+    // Relaxed: a stale answer only sends the request through the full, atomic test.
     return totalUsage.load(std::memory_order_relaxed) <=
                memLimitBytes.load(std::memory_order_relaxed) ||
            !usageCheckOn();
@@ -234,6 +247,8 @@ void recordAllocLocked(Tracker& t, void* block, uint64_t bytes, uint32_t request
 }
 
 bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) {
+    // Relaxed: the limit is one word read on its own; a lowering racing with this test may
+    // apply from the next request.
     const uint64_t limit = memLimitBytes.load(std::memory_order_relaxed);
     if (limit >= detail::kGuardedLimitCeiling)
         return true;
@@ -288,11 +303,13 @@ void plainFree(void* p) {
     host.freeProc(block, host.clientData);
     PendingFrees& pending = pendingFrees;
     if (pending.exited) {
+        // Relaxed: a counter; only its atomicity matters.
         totalUsage.fetch_sub(accounted, std::memory_order_relaxed);
         return;
     }
     if (!pending.registered)
         registerPendingFrees(pending);
+    // Relaxed: only this thread adds here; a draining thread's exchange takes them all.
     if (pending.bytes.fetch_add(accounted, std::memory_order_relaxed) + accounted >
         kPendingFreeLimit)
         flushPendingFrees(pending);
@@ -514,6 +531,7 @@ sZYRDbgMemState ZYRMemMgr_dbgMemState() {
     return {t.allocCount, t.reallocCount, t.freeCount, t.currentBytes, t.peakBytes};
 }
 
+// Relaxed: the counter is its own state; no data is published through it.
 void EnableMemUsageCheck() {
     int current = usageCheckCounter.load(std::memory_order_relaxed);
     while (current < 1 && !usageCheckCounter.compare_exchange_weak(current, current + 1,
@@ -630,7 +648,8 @@ uint64_t memReserve() {
 }
 
 bool plainLimitTest(uint64_t add, uint64_t sub, bool move) {
-    // One compare-exchange makes the test and the move indivisible without a lock.
+    // One compare-exchange makes the test and the move indivisible without a lock. Relaxed:
+    // the exchange compares the very value it replaces, whatever order other words are seen.
     uint64_t current = totalUsage.load(std::memory_order_relaxed);
     for (;;) {
         const uint64_t next = current + add - sub;
@@ -648,6 +667,7 @@ bool plainLimitTest(uint64_t add, uint64_t sub, bool move) {
     }
 }
 
+// Relaxed, as every move of the total: atomicity keeps the sum exact.
 void plainUsageAdd(uint64_t bytes) {
     totalUsage.fetch_add(bytes, std::memory_order_relaxed);
 }
@@ -658,6 +678,8 @@ uint64_t plainUsage() {
     // Every thread's pending frees go back first: a renderer thread that freed memory must
     // show as a drop to the thread that asked it to catch up.
     drainAllPendingFrees();
+    // Relaxed: frees the caller waited for are ordered before it by that wait (a join, a
+    // lock), and a read-modify-write chain is seen in its own order.
     return totalUsage.load(std::memory_order_relaxed);
 }
 

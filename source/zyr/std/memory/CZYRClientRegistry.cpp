@@ -32,6 +32,7 @@ bool CZYRClientRegistry::allNotificationsReceived() const {
 }
 
 unsigned int CZYRClientRegistrar::makeID(const void*) {
+    // Relaxed: only distinctness matters, which the atomic increment alone guarantees.
     return lastClientID.fetch_add(1, std::memory_order_relaxed) + 1;
 }
 

@@ -56,6 +56,8 @@ bool threadMayBlock() {
 
 bool isInterpreterThread() {
     const CZYRThreadSpecificPtr* record = GetCZYRThreadSpecificPtr();
+    // Relaxed: the identifier is one word compared on its own; nothing else is read on the
+    // strength of it.
     return record && record->getThreadId() == interpreterThreadId.load(std::memory_order_relaxed);
 }
 
