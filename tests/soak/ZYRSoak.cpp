@@ -8,6 +8,9 @@
 #include <utility>
 #include <vector>
 
+#include <sys/wait.h>
+#include <unistd.h>
+
 #include "ZYRHostKit.h"
 #include "ZYRStd.h"
 
@@ -21,7 +24,7 @@ constexpr unsigned long long kHeadroom = 48 * kMiB;
 constexpr unsigned int kWorkers = 4;
 constexpr size_t kCachedBlocksMost = 64;
 
-std::atomic<unsigned long long> allocations{0}, refusals{0}, flushes{0}, syncs{0};
+std::atomic<unsigned long long> allocations{0}, refusals{0}, flushes{0}, syncs{0}, resizes{0};
 
 class Cache : public I_FlushableMemoryClient {
 public:
@@ -63,22 +66,29 @@ private:
     unsigned int bytes_ = 0;
 };
 
+// Fills bands from the heap and from virtual memory (some partly decommitted), and gives
+// them all back when the interpreter asks it to catch up.
 class Renderer : public ZYRPublic::I_SurfaceQueue {
 public:
     bool synchronize(bool) override {
         syncs.fetch_add(1, std::memory_order_relaxed);
         std::lock_guard<std::mutex> hold(guard_);
-        for (void* band : bands_)
-            ZYRFree(band);
+        for (const auto& [band, isVirtual] : bands_)
+            isVirtual ? VirtualMemFree(band) : ZYRFree(band);
         bands_.clear();
         return true;
     }
     void run(const std::atomic<bool>& stop) {
         SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("renderer", false));
-        while (!stop.load(std::memory_order_relaxed)) {
-            if (void* band = ZYRMalloc(256 * 1024)) {
+        for (unsigned int n = 0; !stop.load(std::memory_order_relaxed); ++n) {
+            const bool isVirtual = n % 2 != 0;
+            auto* band = static_cast<char*>(isVirtual ? VirtualMemAlloc(200001 + n % 3 * 4096)
+                                                      : ZYRMalloc(256 * 1024));
+            if (band) {
+                if (isVirtual && n % 4 == 1)
+                    VirtualMemDecommit(band, band + 65536, 65536);
                 std::lock_guard<std::mutex> hold(guard_);
-                bands_.push_back(band);
+                bands_.emplace_back(band, isVirtual);
             }
             std::this_thread::sleep_for(std::chrono::microseconds(200));
         }
@@ -87,8 +97,19 @@ public:
 
 private:
     std::mutex guard_; // bands_
-    std::vector<void*> bands_;
+    std::vector<std::pair<void*, bool>> bands_;
 };
+
+// Resizes one block between 1 and 16 MiB, racing the others for the last bytes.
+void resize(const std::atomic<bool>& stop) {
+    std::mt19937 random(99);
+    void* block = ZYRMalloc(kMiB);
+    while (block && !stop.load(std::memory_order_relaxed))
+        if (void* resized =
+                ZYRRealloc(block, static_cast<unsigned int>((1 + random() % 16) * kMiB)))
+            block = resized, resizes.fetch_add(1, std::memory_order_relaxed);
+    ZYRFree(block);
+}
 
 void work(unsigned int index, Cache& cache, const std::atomic<bool>& stop) {
     static const char* const kNames[] = {"worker0", "worker1", "worker2", "worker3"};
@@ -120,18 +141,18 @@ void work(unsigned int index, Cache& cache, const std::atomic<bool>& stop) {
     SetCZYRThreadSpecificPtr(nullptr);
 }
 
-} // namespace
-
-int main() {
+// One round at the statistics level of ZYR_MEMORY_STAT; usage never passes the limit: the
+// tracker's peak at levels 1 and 2, a sampled usage at level 0.
+int soakRound(int duration) {
     ZYRStd::tZYRMemMgr host = ZYRHostKit::crtMemMgr();
     ZYRStdInit_ZYRMemMgrSet(&host);
     ZYRStdInit_InitializeFlushableMemoryClientRegistry();
-    const char* seconds = std::getenv("ZYRSTD_SOAK_SECONDS");
-    const int duration = seconds ? std::max(1, std::atoi(seconds)) : 2;
+    const int level = ZYRGetMemStatLevel();
 
     const unsigned long long before = GetMemUsage();
     ZYRSetMemLimit(0);
-    void* ballast = ZYRMalloc(static_cast<unsigned int>(ZYRGetMemLimit() - before - kHeadroom));
+    const unsigned long long limit = ZYRGetMemLimit();
+    void* ballast = ZYRMalloc(static_cast<unsigned int>(limit - before - kHeadroom));
     if (!ballast) {
         std::puts("soak: FAILED, no room for the ballast");
         return 1;
@@ -144,11 +165,16 @@ int main() {
     RegisterSurfaceQueueInstance(&renderer);
 
     std::atomic<bool> stop{false};
+    unsigned long long sampled = 0;
     std::vector<std::thread> threads;
     threads.emplace_back([&] { renderer.run(stop); });
+    threads.emplace_back(resize, std::cref(stop));
     for (unsigned int i = 0; i < kWorkers; ++i)
         threads.emplace_back(work, i, std::ref(caches[i]), std::cref(stop));
-    std::this_thread::sleep_for(std::chrono::seconds(duration));
+    for (const auto end = Clock::now() + std::chrono::seconds(duration); Clock::now() < end;) {
+        sampled = std::max(sampled, GetMemUsage());
+        std::this_thread::sleep_for(std::chrono::microseconds(50));
+    }
     stop = true;
     for (std::thread& t : threads)
         t.join();
@@ -161,12 +187,38 @@ int main() {
     ZYRFree(ballast);
     const unsigned long long after = GetMemUsage();
     ZYRStdInit_TerminateFlushableMemoryClientRegistry();
+    const unsigned long long peak = level ? ZYRMemMgr_dbgMemState().peakBytes : sampled;
+    const unsigned long long over = peak > limit ? peak - limit : 0;
 
-    std::printf("soak: %d s, %u workers, %llu allocations, %llu refused, %llu flushes, "
-                "%llu renderer syncs; usage before %llu, after %llu\n",
-                duration, kWorkers, allocations.load(), refusals.load(), flushes.load(),
-                syncs.load(), before, after);
-    const bool ok = after == before && allocations.load() > 0;
-    std::puts(ok ? "soak: ok" : "soak: FAILED, the accounting drifted or nothing was allocated");
+    std::printf("soak: level %d, %d s, %u workers, %llu allocations, %llu refused, %llu resizes, "
+                "%llu flushes, %llu renderer syncs; usage before %llu, after %llu; peak %llu, "
+                "%llu over the limit\n",
+                level, duration, kWorkers, allocations.load(), refusals.load(), resizes.load(),
+                flushes.load(), syncs.load(), before, after, peak, over);
+    const bool ok = after == before && allocations.load() > 0 && over == 0;
+    std::puts(ok ? "soak: ok" : "soak: FAILED, the accounting drifted, passed the limit or idled");
     return ok ? 0 : 1;
+}
+
+} // namespace
+
+// Each statistics level in a process of its own (the level is fixed at start-up).
+int main() {
+    const char* seconds = std::getenv("ZYRSTD_SOAK_SECONDS");
+    const int duration = std::max(1, (seconds ? std::atoi(seconds) : 2) / 3);
+    int failed = 0;
+    for (const char* level : {"0", "1", "2"}) {
+        std::fflush(stdout);
+        const pid_t child = ::fork();
+        if (child == 0) {
+            ::setenv("ZYR_MEMORY_STAT", level, 1);
+            const int rc = soakRound(duration);
+            std::fflush(stdout);
+            std::_Exit(rc);
+        }
+        int status = 0;
+        failed += child < 0 || ::waitpid(child, &status, 0) != child || !WIFEXITED(status) ||
+                  WEXITSTATUS(status) != 0;
+    }
+    return failed ? 1 : 0;
 }
