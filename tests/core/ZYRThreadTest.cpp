@@ -1,23 +1,9 @@
 #include <gtest/gtest.h>
 
-#include <algorithm>
-#include <atomic>
 #include <chrono>
-#include <functional>
-#include <memory>
-#include <set>
-#include <string>
 #include <thread>
-#include <vector>
 
-#include "C_SmartPtr.h"
 #include "TestSupport.h"
-#include "zyr/std/core/CZYRError.h"
-#include "zyr/std/core/CZYRSmartPtr.h"
-#include "zyr/std/core/ZYRMem.h"
-#include "zyr/std/core/ZYRThread.h"
-#include "zyr/std/core/ZYRUniqueID.h"
-#include "zyr/std/memory/CZYRClientRegistry.h"
 
 using namespace ZYRStd;
 using ZYRPublic::C_SmartPtr;
@@ -25,31 +11,23 @@ using ZYRPublic::C_SmartPtr;
 namespace {
 
 std::atomic<int> liveObjects{0};
-
+struct Alive {
+    Alive() { ++liveObjects; }
+    ~Alive() { --liveObjects; }
+};
 struct TrackedRecord : CZYRThreadSpecificPtr {
-    TrackedRecord(const char* name, bool blockable) : CZYRThreadSpecificPtr(name, blockable) {
-        ++liveObjects;
-    }
-    ~TrackedRecord() override { --liveObjects; }
+    using CZYRThreadSpecificPtr::CZYRThreadSpecificPtr;
+    Alive alive;
 };
 struct Counted : CZYRBaseRefCnt {
-    Counted() { ++liveObjects; }
-    ~Counted() override { --liveObjects; }
+    Alive alive;
 };
-
-class PublicObject : public CZYRClientBase {
-public:
-    PublicObject() { ++liveObjects; }
-    ~PublicObject() override { --liveObjects; }
-    void addRef() { rc_.addRef(); }
-    void release() {
-        if (rc_.release())
-            delete this;
-    }
-    unsigned int debugGetRefCount() const { return rc_.debugGetRefCount(); }
-
-private:
-    CZYRPublicRefCountBase rc_;
+struct PublicObject : CZYRClientBase {
+    void addRef() { rc.addRef(); }
+    void release() { rc.release() ? delete this : void(); }
+    unsigned int debugGetRefCount() const { return rc.debugGetRefCount(); }
+    CZYRPublicRefCountBase rc;
+    Alive alive;
 };
 
 } // namespace
@@ -74,14 +52,15 @@ TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
 }
 
 TEST(ZYRThreadTest, TimedWaitTimesOut) {
+    using Clock = std::chrono::steady_clock;
     ZYRStd::mutex guard;
     detail::condition_impl nobody;
     mutex::scoped_lock lock(guard);
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(5);
+    const auto deadline = Clock::now() + std::chrono::milliseconds(5);
     bool timedOut = false;
-    while (!timedOut && std::chrono::steady_clock::now() < deadline + std::chrono::seconds(5))
+    while (!timedOut && Clock::now() < deadline + std::chrono::seconds(5))
         timedOut = !nobody.do_timed_wait(lock, deadline);
-    EXPECT_TRUE(timedOut && std::chrono::steady_clock::now() >= deadline);
+    EXPECT_TRUE(timedOut && Clock::now() >= deadline);
 }
 
 TEST(ZYRThreadTest, IdentifiersAreDistinctAcrossThreads) {
@@ -92,40 +71,34 @@ TEST(ZYRThreadTest, IdentifiersAreDistinctAcrossThreads) {
         std::thread first([&] { std::generate_n(std::back_inserter(ids[0]), 1000, make); });
         std::generate_n(std::back_inserter(ids[1]), 1000, make);
         first.join();
-        std::set<unsigned long long> all;
-        for (const auto& list : ids) {
-            EXPECT_TRUE(std::is_sorted(list.begin(), list.end(), std::less_equal<>()));
-            all.insert(list.begin(), list.end());
-        }
+        std::set<unsigned long long> all(ids[0].begin(), ids[0].end());
+        all.insert(ids[1].begin(), ids[1].end());
+        EXPECT_TRUE(std::ranges::is_sorted(ids[0], std::less_equal<>()) &&
+                    std::ranges::is_sorted(ids[1], std::less_equal<>()));
         EXPECT_TRUE(all.size() == 2000 && *all.begin() >= 1 && make() > *all.rbegin());
     }
     EXPECT_EQ(CZYRClientRegistrar::makeID(nullptr) % 2002, 0u);
 }
 
 TEST(ZYRThreadTest, ClientBaseAllocatesThroughTheFrontAndTheNewHandler) {
-    struct Object : CZYRClientBase {
-        int payload[4];
-    };
     static zyrtest::FailingHost host;
     static int handlerCalls;
     handlerCalls = 0;
     tZYRMemMgr record = host.record();
     zyrtest::installFront(0, &record);
     const unsigned long long before = GetMemUsage();
-    {
-        const std::unique_ptr<Object> object(new Object);
-        EXPECT_TRUE(ZYRMemSize(object.get()) == sizeof(Object) &&
-                    GetMemUsage() == before + sizeof(Object));
-    }
+    auto* object = new PublicObject;
+    EXPECT_TRUE(ZYRMemSize(object) == sizeof(PublicObject) &&
+                GetMemUsage() == before + sizeof(PublicObject));
+    delete object;
     EXPECT_EQ(GetMemUsage(), before);
-
     EXPECT_THROW(CZYRClientBase::operator new (std::size_t{5} << 30), ZYROutOfMemoryError);
     host.failAll = true;
     const std::new_handler previous = std::set_new_handler([] {
         ++handlerCalls;
         host.failAll = false;
     });
-    const std::unique_ptr<Object> object(new Object);
+    delete new PublicObject;
     std::set_new_handler(previous);
     EXPECT_EQ(handlerCalls, 1);
     zyrtest::installFront(0);
@@ -221,17 +194,11 @@ TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
 TEST(CZYRSmartPtrTest, ContainerLendsACountAndUsesTheDeleter) {
     static int deleted;
     deleted = 0;
-    struct Plain {
-        int value = 4;
-    };
     const unsigned long long before = GetMemUsage();
     {
-        CZYRSmartZYRRefPtr<CZYRSmartRefPtrContainer<Plain>> box(
-            CZYRSmartRefPtrContainer<Plain>::create(new Plain, [](Plain* p) {
-                ++deleted;
-                delete p;
-            }));
-        EXPECT_TRUE(GetMemUsage() > before && box->getObject()->value == 4);
+        CZYRSmartZYRRefPtr<CZYRSmartRefPtrContainer<int>> box(
+            CZYRSmartRefPtrContainer<int>::create(new int(4), [](int* p) { ++deleted, delete p; }));
+        EXPECT_TRUE(GetMemUsage() > before && *box->getObject() == 4);
     }
     EXPECT_TRUE(deleted == 1 && GetMemUsage() == before);
     void* one = czyrsmartptralloc(0);

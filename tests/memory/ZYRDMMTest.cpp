@@ -1,19 +1,10 @@
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <chrono>
-#include <functional>
 #include <future>
-#include <memory>
 #include <thread>
-#include <vector>
 
-#include "I_SurfaceQueue.h"
 #include "TestSupport.h"
-#include "zyr/std/core/ZYRMem.h"
-#include "zyr/std/core/ZYRStdInit.h"
-#include "zyr/std/core/ZYRThread.h"
-#include "zyr/std/memory/ZYRDMM.h"
 
 using namespace ZYRStd;
 using ZYRPublic::eFlushMemorySeverityNormal;
@@ -199,28 +190,6 @@ TEST_F(ZYRDMMTest, RendererCatchesUpBeforeAnyFlush) {
     EXPECT_EQ(count(closeLog(), "---- Memory allocation succeed after SyncRendererThread for "
                                 "Client : <TEST> , [memory needed = 1000 bytes ]  \n"),
               1u);
-}
-
-TEST_F(ZYRDMMTest, WhatTheRendererThreadFreesCountsAsADrop) {
-    std::vector<void*> bands;
-    for (int i = 0; i < 10; ++i)
-        bands.push_back(ZYRMalloc(3000));
-    std::promise<void> go, freed, quit; // the renderer lives on after freeing
-    std::thread renderer([&] {
-        go.get_future().wait();
-        std::for_each(bands.begin(), bands.end(), ZYRFree);
-        freed.set_value();
-        quit.get_future().wait();
-    });
-    FakeQueue queue;
-    queue.onSync = [&] {
-        go.set_value();
-        freed.get_future().wait();
-    };
-    RegisterSurfaceQueueInstance(&queue);
-    EXPECT_TRUE(ArrangeMemoryBySyncRendererThread(20000, true)) << "30000 bytes freed there";
-    quit.set_value();
-    renderer.join();
 }
 
 TEST_F(ZYRDMMTest, ThreadsThatMayNotBlockNeverWaitOrFlush) {
