@@ -234,12 +234,12 @@ TEST_F(ZYRDMMTest, ZeroBytesAndTheOEMCallback) {
 }
 
 TEST_F(ZYRDMMTest, ThreadSafeFlushUsesItsOwnListAndStoredSizes) {
-    FakeClient everywhere("everywhere", 100, yes, true), tie("tie", 100, {}, true),
-        mainOnly("mainOnly", 500, yes);
+    FakeClient smaller("smaller", 60, {}, true), everywhere("everywhere", 100, yes, true),
+        tie("tie", 100, {}, true), mainOnly("mainOnly", 500, yes);
     EXPECT_TRUE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
     EXPECT_TRUE(mainOnly.requests.empty() && everywhere.requests.size() == 1 &&
-                tie.requests.empty())
-        << "equal sizes keep their registration order";
+                tie.requests.empty() && smaller.requests.empty())
+        << "largest first; equal sizes keep their registration order";
     EXPECT_FALSE(ZYRFlushMemoryThreadSafe(&everywhere, 50, eFlushMemorySeverityNormal));
     UnregisterFlushableMemoryClient(&everywhere);
     EXPECT_FALSE(ZYRFlushMemoryThreadSafe(nullptr, 50, eFlushMemorySeverityNormal));
