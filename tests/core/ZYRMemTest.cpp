@@ -4,6 +4,8 @@
 
 #include <filesystem>
 #include <future>
+#include <map>
+#include <random>
 #include <thread>
 
 #include "TestSupport.h"
@@ -90,35 +92,78 @@ std::vector<std::string> leakReport() {
 
 } // namespace
 
-TEST_F(ZYRMemTest, PlainFrontEdgeCasesAndAccounting) {
+// The front against a model at each statistics level: allocations, zeroed ones, resizes and
+// frees of random sizes, the host failing now and then, the check switched off and on (the
+// disables nest) and the limit a few KiB away.
+TEST_F(ZYRMemTest, FrontAgainstModel) {
     EXPECT_EQ(thrown([] { (void)ZYRSureMalloc(0); }), "7: <null> (source/zyr/std/ZYRMem:2042)");
-    EXPECT_TRUE(!ZYRMalloc(0) && !ZYRCalloc(0, 16) && !ZYRMemSize(nullptr));
-    ZYRFree(nullptr);
-    zyrtest::FailingHost host;
-    tZYRMemMgr record = host.record();
-    zyrtest::installFront(0, &record);
-    const unsigned long long before = GetMemUsage();
-    auto used = [before] { return GetMemUsage() - before; };
-    auto* p = static_cast<unsigned char*>(ZYRMalloc(13));
-    EXPECT_TRUE(aligned16(p) && ZYRMemSize(p) == 13 && used() == 16) << "rounded up to 8";
-    EXPECT_EQ(ZYRRealloc(p, 0), p) << "resizing to 0 frees nothing";
-    std::memset(p, 0x5A, 13);
-    p = static_cast<unsigned char*>(ZYRRealloc(p, 100));
-    EXPECT_TRUE(aligned16(p) && used() == 104);
-    host.failAll = true;
-    EXPECT_TRUE(!ZYRMalloc(8) && !ZYRRealloc(p, 4000) && used() == 104);
-    host.failAll = false;
-    EXPECT_EQ(p[12], 0x5A) << "contents survive a resize and a failed one";
-    p = static_cast<unsigned char*>(ZYRRealloc(p, 20));
-    EXPECT_EQ(used(), 24u) << "shrinking gives bytes back";
-    ZYRFree(p);
-    const Block r(ZYRRealloc(nullptr, 24), ZYRFree), c(ZYRCalloc(7, 9), ZYRFree);
-    auto* zeros = static_cast<unsigned char*>(c.get());
-    EXPECT_TRUE(ZYRMemSize(r.get()) == 24 && ZYRMemSize(zeros) == 63 &&
-                std::count(zeros, zeros + 63, 0) == 63 && used() == 88);
+    EXPECT_TRUE(!ZYRMemSize(nullptr) && (ZYRFree(nullptr), true));
+    for (const int level : {0, 1, 2}) {
+        SCOPED_TRACE(level);
+        zyrtest::FailingHost host;
+        tZYRMemMgr record = host.record();
+        zyrtest::installFront(level, &record);
+        const auto accounted = [level](unsigned long long n) { // guarded: header and tail too
+            return level ? (std::max(n, 1ull) + 27) & ~7ull : (n + 7) & ~7ull;
+        };
+        void* filler = fillToLimit(-(16 << 10));
+        const sZYRDbgMemState start = ZYRMemMgr_dbgMemState();
+        unsigned long long used = GetMemUsage(), peak = start.peakBytes;
+        Counts counts{start.allocCount, start.reallocCount, start.freeCount, 0, 0};
+        int check = 1;
+        std::map<unsigned char*, unsigned int> live; // a block's bytes hold its size's low byte
+        std::mt19937 rng(level + 1);
+        for (int step = 0; step < 3000; ++step) {
+            SCOPED_TRACE(step);
+            const unsigned int op = rng() % 8, copies = op == 1 ? rng() % 3 : 1;
+            const unsigned int size = rng() % 4 ? rng() % 100 : rng() % 6000, n = copies * size;
+            auto* p = live.empty() || op < 2 ? nullptr
+                                             : std::next(live.begin(), rng() % live.size())->first;
+            host.failAll = rng() % 6 == 0;
+            if (op == 7) {
+                const bool enable = rng() % 2;
+                enable ? EnableMemUsageCheck() : DisableMemUsageCheck();
+                check += enable ? check < 1 : -1;
+            } else if (op == 6 && p) {
+                used -= accounted(live[p]), counts[2] += level != 0;
+                live.erase(p), ZYRFree(p);
+            } else {
+                const unsigned int old = p ? live[p] : 0;
+                auto* q = static_cast<unsigned char*>(op == 0   ? ZYRMalloc(n)
+                                                      : op == 1 ? ZYRCalloc(copies, size)
+                                                                : ZYRRealloc(p, n));
+                const unsigned long long grown = used + accounted(n) - (p ? accounted(old) : 0);
+                const bool asked = n != 0 || (op < 2 && level != 0); // else null, or p back
+                const bool granted = asked && (check < 1 || grown <= kLimit) && !host.failAll;
+                ASSERT_EQ(q, granted ? q
+                             : asked ? nullptr
+                                     : p)
+                    << "null when refused, p for no bytes";
+                ASSERT_TRUE(!granted || q);
+                if (!granted)
+                    continue;
+                ASSERT_TRUE(aligned16(q) && ZYRMemSize(q) == (level ? std::max(n, 1u) : n));
+                ASSERT_EQ(std::count(q, q + std::min(old, n), old & 0xFF), std::min(old, n));
+                ASSERT_EQ(std::count(q, q + n, 0), op == 1 ? n : std::count(q, q + n, 0));
+                if (level)
+                    ASSERT_EQ(thrown([q] { ZYRDbgCheckZYRMemAllocPtr(q); }), "no error");
+                std::memset(q, n & 0xFF, n);
+                used = grown, peak = std::max(peak, used), counts[p ? 1 : 0] += level != 0;
+                live.erase(p), live[q] = n;
+            }
+            counts[3] = level ? static_cast<unsigned int>(used) : 0;
+            counts[4] = level ? static_cast<unsigned int>(peak) : 0;
+            ASSERT_TRUE(GetMemUsage() == used && tracked() == (level ? counts : Counts(5, 0)));
+        }
+        for (; check < 1; ++check)
+            EnableMemUsageCheck();
+        for (const auto& [p, n] : live)
+            ZYRFree(p);
+        ZYRFree(filler);
+    }
 }
 
-TEST_F(ZYRMemTest, LimitAndNestedDisables) {
+TEST_F(ZYRMemTest, LimitSetterOnlyLowersAndKeepsAFloor) {
     const unsigned long long machine = ZYRGetMemLimit();
     for (const auto& [set, got] : {std::pair{machine + 1, machine},
                                    {1024ull << 20, 1024ull << 20},
@@ -127,21 +172,6 @@ TEST_F(ZYRMemTest, LimitAndNestedDisables) {
         EXPECT_EQ(ZYRGetMemLimit(), got);
     }
     EXPECT_EQ(ZYRGetMemReserve(), 314572800u);
-    const unsigned long long used = GetMemUsage();
-    const auto overBy8 = static_cast<unsigned int>(kLimit - used + 8);
-    void* small = ZYRMalloc(64);
-    EXPECT_TRUE(!ZYRRealloc(small, overBy8) && ZYRMemSize(small) == 64);
-    ZYRFree(small);
-    const std::pair<void (*)(), bool> steps[] = {
-        {EnableMemUsageCheck, false}, {DisableMemUsageCheck, true}, {DisableMemUsageCheck, true},
-        {EnableMemUsageCheck, true},  {EnableMemUsageCheck, false}, {EnableMemUsageCheck, false},
-        {DisableMemUsageCheck, true}, {EnableMemUsageCheck, false}};
-    int index = 0;
-    for (const auto& [step, granted] : steps) {
-        step();
-        EXPECT_EQ(grants(overBy8), granted) << "step " << index++;
-        EXPECT_EQ(GetMemUsage(), used) << "a refused block is not counted";
-    }
 }
 
 TEST_F(ZYRMemTest, FreedBytesAreReusedOnlyUnderTheLimitAndCountedAcrossThreads) {
@@ -226,7 +256,7 @@ TEST_F(ZYRMemTest, GuardCheckFindsDamageWithoutReadingPastTheBlock) {
         zyrtest::installFront(level);
         auto* one = static_cast<unsigned char*>(ZYRMalloc(0));
         ASSERT_TRUE(one && aligned16(one) && ZYRMemSize(one) == 1);
-        EXPECT_EQ(check(one) + check(nullptr), "no errorno error");
+        EXPECT_EQ(check(nullptr), "no error");
         one[1] = 0; // the first byte of the tail guard
         EXPECT_EQ(check(one), invalid);
         ZYRFree(one);
@@ -244,9 +274,6 @@ TEST_F(ZYRMemTest, GuardCheckFindsDamageWithoutReadingPastTheBlock) {
         EXPECT_EQ(check(block), invalid);
         block[-1] ^= level == 1 ? 0xFF : 0;
         std::memcpy(block - 16, &size, sizeof size);
-        block = static_cast<unsigned char*>(ZYRRealloc(block, 100));
-        EXPECT_EQ(ZYRMemSize(block), 100u);
-        EXPECT_EQ(check(block), "no error") << "guards and map follow a resize";
         ZYRFree(block);
     }
 }
@@ -286,15 +313,10 @@ TEST_F(ZYRMemTest, TrackerCountsAndLeakReport) {
               "ZYRMem: Largest leak       30 bytes at Allocation Count =        2\n"
               "ZYRMem: Total Leaked: 144 bytes\n" // 32 + 56 + 56
               "ZYRMem: Peak memory consumption: 144 bytes\n");
-    b = ZYRRealloc(b, 200);
-    EXPECT_EQ(tracked(), (Counts{3, 1, 0, 32 + 224 + 56, 312}));
-    EXPECT_EQ(GetMemUsage(), 312u);
     for (void* p : {a, b, c})
         ZYRFree(p);
-    EXPECT_EQ(tracked(), (Counts{3, 1, 3, 0, 312}));
     EXPECT_EQ(leakReport().at(1), "ZYRMem: Total Leaked: 0 bytes\n");
     zyrtest::installFront(0);
-    EXPECT_EQ(tracked(), (Counts{0, 0, 0, 0, 0})) << "level 0 keeps no tracker";
     EXPECT_TRUE(leakReport().empty());
 
     const unsigned char low[] = {0x01, 0x7F}, high[] = {0x01, 0x80};

@@ -6,7 +6,6 @@
 #include "TestSupport.h"
 
 using namespace ZYRStd;
-using ZYRPublic::C_SmartPtr;
 
 namespace {
 
@@ -49,30 +48,6 @@ TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
     }).join();
     EXPECT_EQ(liveObjects, 0) << "a finished thread's record is deleted";
     EXPECT_FALSE(ZYRSingleThreadProcess());
-}
-
-TEST(ZYRThreadTest, TimedWaitTimesOutAtItsDeadline) {
-    ZYRStd::mutex guard;
-    detail::condition_impl nobody;
-    mutex::scoped_lock lock(guard);
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(5);
-    while (nobody.do_timed_wait(lock, deadline)) { // a spurious wake-up waits again
-    }
-    EXPECT_GE(std::chrono::steady_clock::now(), deadline);
-}
-
-TEST(ZYRThreadTest, IdentifiersAreDistinctAcrossThreads) {
-    for (auto make : {+[] { return createUniqueID(); },
-                      +[] { return 0ull + CZYRClientRegistrar::makeID(nullptr); }}) {
-        std::vector<unsigned long long> ids(2000);
-        std::thread first([&] { std::generate_n(ids.begin(), 1000, make); });
-        std::generate_n(ids.begin() + 1000, 1000, make);
-        first.join();
-        EXPECT_TRUE(std::is_sorted(ids.begin(), ids.begin() + 1000) &&
-                    std::is_sorted(ids.begin() + 1000, ids.end()) &&
-                    std::set(ids.begin(), ids.end()).size() == 2000 &&
-                    *std::ranges::min_element(ids) >= 1 && make() > *std::ranges::max_element(ids));
-    }
 }
 
 TEST(ZYRThreadTest, ClientBaseAllocatesThroughTheFrontAndTheNewHandler) {
@@ -132,28 +107,6 @@ TEST(CZYRSmartPtrTest, CountsOnBothSchemes) {
     ZYRIncrementRefCnt_ThreadSafe(&count);
     EXPECT_TRUE(ZYRPeekValue_ThreadSafe(&count) == 2u && ZYRIsShared_ThreadSafe(&count));
     EXPECT_EQ(ZYRDecrementRefCnt_ThreadSafe(&count) + ZYRDecrementRefCnt_ThreadSafe(&count), 1u);
-}
-
-TEST(CZYRSmartPtrTest, PointersAddBeforeTheyRelease) {
-    C_SmartPtr<PublicObject> shared(new PublicObject, false); // adopts the creator's count
-    shared = shared;
-    CZYRSmartZYRRefPtr<Counted> a(new Counted), b(a);
-    a = b;
-    EXPECT_TRUE(liveObjects == 2 && shared->debugGetRefCount() == 1u && a->peekRefCnt() == 2);
-    auto copies = [&shared] {
-        for (int i = 0; i < 50000; ++i) {
-            C_SmartPtr<PublicObject> copy(shared), another;
-            another = copy;
-        }
-    };
-    std::thread other(copies);
-    copies();
-    other.join();
-    EXPECT_EQ(shared->debugGetRefCount(), 1u) << "copies on two threads";
-    b = CZYRSmartZYRRefPtr<Counted>(new Counted);
-    a = b; // the first object's last reference goes, as does the first public object's
-    shared = C_SmartPtr<PublicObject>(new PublicObject, false);
-    EXPECT_EQ(liveObjects, 2);
 }
 
 TEST(CZYRSmartPtrTest, ContainerLendsACountAndUsesTheDeleter) {

@@ -19,22 +19,19 @@ struct FakeClient : I_FlushableMemoryClient {
         RegisterFlushableMemoryClient(this, threadSafe);
     }
     ~FakeClient() override { UnregisterFlushableMemoryClient(this); }
-    bool flushMemory(unsigned int bytesNeeded, unsigned int reserved,
+    bool flushMemory(unsigned int need, unsigned int reserved,
                      eFlushMemorySeverity severity) override {
         EXPECT_EQ(reserved, 0u);
-        requests.push_back(bytesNeeded);
-        severities.push_back(severity);
-        return answer && answer(bytesNeeded);
+        return requests.push_back(need), severities.push_back(severity), answer && answer(need);
     }
     unsigned int getFlushableMemorySize() override { return ++sizeQueries, size; }
     const char* getClientName() override { return name; }
 
     const char* name;
-    unsigned int size;
+    unsigned int size, sizeQueries = 0;
     std::function<bool(unsigned int)> answer;
     std::vector<unsigned int> requests;
     std::vector<eFlushMemorySeverity> severities;
-    unsigned int sizeQueries = 0;
 };
 
 struct FakeQueue : ZYRPublic::I_SurfaceQueue {
@@ -53,8 +50,8 @@ using Block = std::unique_ptr<void, void (*)(void*)>;
 class ZYRDMMTest : public ::testing::Test {
 protected:
     void SetUp() override {
-        record_ = host_.record();
-        zyrtest::installFront(0, &record_);
+        tZYRMemMgr record = host_.record();
+        zyrtest::installFront(0, &record);
         SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("interpreter", true));
         logPath_ = dir_.file("dmm.log");
         ::setenv("ZYR_DMM_LOG", logPath_.c_str(), 1);
@@ -77,7 +74,6 @@ protected:
     }
 
     zyrtest::FailingHost host_;
-    tZYRMemMgr record_{};
     zyrtest::TempDir dir_;
     std::string logPath_;
 };

@@ -22,10 +22,7 @@ namespace {
 using namespace ZYRStd;
 constexpr unsigned long long kMiB = 1024 * 1024;
 // For the summary only: relaxed, nothing is published through them.
-std::atomic<unsigned long long> allocations{0}, refusals{0}, flushes{0}, syncs{0}, resizes{0};
-void count(std::atomic<unsigned long long>& counter) {
-    counter.fetch_add(1, std::memory_order_relaxed);
-}
+std::atomic<unsigned long long> allocations{0}, refusals{0}, resizes{0};
 
 // Blocks (a memory-manager block or a virtual one) kept until a flush or a renderer sync.
 struct Held {
@@ -48,7 +45,7 @@ struct Held {
 
 struct Cache : I_FlushableMemoryClient, Held {
     bool flushMemory(unsigned int, unsigned int, eFlushMemorySeverity) override {
-        return count(flushes), dropAll() > 0;
+        return dropAll() > 0;
     }
     unsigned int getFlushableMemorySize() override {
         std::lock_guard hold(guard);
@@ -60,7 +57,7 @@ struct Cache : I_FlushableMemoryClient, Held {
 // Heap bands (kept with their size) and virtual bands, some partly decommitted (kept with
 // size 0), all given back when the interpreter asks the renderer to catch up.
 struct Renderer : ZYRPublic::I_SurfaceQueue, Held {
-    bool synchronize(bool) override { return count(syncs), dropAll(), true; }
+    bool synchronize(bool) override { return dropAll(), true; }
     void run(const std::atomic<bool>& stop) {
         SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("renderer", false));
         for (unsigned int n = 0; !stop.load(std::memory_order_relaxed); ++n) {
@@ -84,7 +81,7 @@ void work(unsigned int seed, Cache& cache, const std::atomic<bool>& stop) {
         const unsigned int size = 16u << (random() % 17); // 16 bytes to 1 MiB
         void* p = ZYRDMMMalloc(size, "soak", nullptr, nullptr, nullptr,
                                ZYRPublic::eFlushMemorySeverityNormal);
-        count(p ? allocations : refusals);
+        (p ? allocations : refusals).fetch_add(1, std::memory_order_relaxed);
         if (p)
             (random() % 2 ? cache : mine).keep(p, size);
         if (mine.blocks.size() > 32)
@@ -101,7 +98,7 @@ void resize(const std::atomic<bool>& stop) {
     while (block && !stop.load(std::memory_order_relaxed))
         if (void* resized =
                 ZYRRealloc(block, static_cast<unsigned int>((1 + random() % 16) * kMiB)))
-            block = resized, count(resizes);
+            block = resized, resizes.fetch_add(1, std::memory_order_relaxed);
     ZYRFree(block);
 }
 
@@ -144,11 +141,10 @@ int soakRound(int seconds) {
     const int level = ZYRGetMemStatLevel();
     const unsigned long long peak = level ? ZYRMemMgr_dbgMemState().peakBytes : sampled;
     const unsigned long long over = peak > limit ? peak - limit : 0;
-    std::printf("soak: level %d, %d s, %llu allocations, %llu refused, %llu resizes, %llu flushes, "
-                "%llu renderer syncs; usage before %llu, after %llu; peak %llu, %llu over the "
-                "limit\n",
-                level, seconds, allocations.load(), refusals.load(), resizes.load(), flushes.load(),
-                syncs.load(), before, after, peak, over);
+    std::printf("soak: level %d, %d s, %llu allocations, %llu refused, %llu resizes; usage before "
+                "%llu, after %llu; peak %llu, %llu over the limit\n",
+                level, seconds, allocations.load(), refusals.load(), resizes.load(), before, after,
+                peak, over);
     const bool ok = ballast && after == before && allocations.load() > 0 && over == 0;
     std::puts(ok ? "soak: ok"
                  : "soak: FAILED (no ballast, accounting drift, over the limit or idle)");
