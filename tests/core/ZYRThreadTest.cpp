@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <chrono>
 #include <thread>
 
 #include "TestSupport.h"
@@ -14,41 +13,14 @@ struct Alive {
     Alive() { ++liveObjects; }
     ~Alive() { --liveObjects; }
 };
-struct TrackedRecord : CZYRThreadSpecificPtr {
-    using CZYRThreadSpecificPtr::CZYRThreadSpecificPtr;
-    Alive alive;
-};
 struct Counted : CZYRBaseRefCnt {
     Alive alive;
 };
 struct PublicObject : CZYRClientBase {
-    void addRef() { rc.addRef(); }
-    void release() { rc.release() ? delete this : void(); }
-    unsigned int debugGetRefCount() const { return rc.debugGetRefCount(); }
-    CZYRPublicRefCountBase rc;
     Alive alive;
 };
 
 } // namespace
-
-TEST(ZYRThreadTest, RecordsBelongToTheirThreads) {
-    std::thread([] {
-        EXPECT_EQ(GetCZYRThreadSpecificPtr(), nullptr) << "a new thread has no record";
-        auto* first = new TrackedRecord("renderer", true);
-        SetCZYRThreadSpecificPtr(first);
-        SetCZYRThreadSpecificPtr(first); // the same record again is kept
-        EXPECT_TRUE(liveObjects == 1 && GetCZYRThreadSpecificPtr() == first &&
-                    std::string(first->getThreadName()) == "renderer" && first->getZoom() == 1.0f &&
-                    first->IsThisThreadBlockable());
-        auto* second = new TrackedRecord("renderer", false);
-        EXPECT_NE(second->getThreadId(), first->getThreadId());
-        SetCZYRThreadSpecificPtr(second);
-        EXPECT_EQ(liveObjects, 1) << "the replaced record is deleted";
-        std::thread([] { EXPECT_EQ(GetCZYRThreadSpecificPtr(), nullptr); }).join();
-    }).join();
-    EXPECT_EQ(liveObjects, 0) << "a finished thread's record is deleted";
-    EXPECT_FALSE(ZYRSingleThreadProcess());
-}
 
 TEST(ZYRThreadTest, ClientBaseAllocatesThroughTheFrontAndTheNewHandler) {
     static zyrtest::FailingHost host;

@@ -320,26 +320,19 @@ TEST(FixedSizeAllocatorTest, PoolsSlotsAndSupplier) {
 }
 
 TEST(ZYRFixedSizePoolTest, ChunksAndFreeList) {
-    {
-        ZYRFixedSizePool pool(1, 3);
-        EXPECT_EQ(pool.elementSize(), 8u) << "room for the free-list link";
-        std::vector<void*> handed;
-        for (int i = 0; i < 7; ++i) {
-            handed.push_back(pool.Alloc());
-            ASSERT_TRUE(handed.back() && reinterpret_cast<uintptr_t>(handed.back()) % 8 == 0);
-            std::memset(handed.back(), i, 8);
-        }
-        for (int i = 0; i < 7; ++i)
-            EXPECT_EQ(*static_cast<unsigned char*>(handed[i]), i) << "elements overlap";
-        pool.Free(handed[2]);
-        pool.Free(handed[5]);
-        EXPECT_TRUE(pool.Alloc() == handed[5] && pool.Alloc() == handed[2]) << "last freed first";
-        pool.FlushAll();
-        EXPECT_NE(pool.SureAlloc(), nullptr);
-    }
-    ZYRFixedSizePool zeroPerChunk(64, 0);
+    ZYRFixedSizePool pool(1, 3), zeroPerChunk(64, 0);
+    EXPECT_EQ(pool.elementSize(), 8u) << "room for the free-list link";
+    std::vector<unsigned char*> handed;
+    for (int i = 0; i < 7; ++i)
+        handed.push_back(static_cast<unsigned char*>(std::memset(pool.Alloc(), i, 8)));
+    for (int i = 0; i < 7; ++i)
+        EXPECT_TRUE(handed[i][7] == i && reinterpret_cast<uintptr_t>(handed[i]) % 8 == 0) << i;
+    pool.Free(handed[2]);
+    pool.Free(handed[5]);
+    EXPECT_TRUE(pool.Alloc() == handed[5] && pool.Alloc() == handed[2]) << "last freed first";
+    pool.FlushAll();
     void *a = zeroPerChunk.Alloc(), *b = zeroPerChunk.Alloc();
-    ASSERT_TRUE(a && b && a != b);
+    EXPECT_TRUE(pool.SureAlloc() && a && b && a != b);
     std::memset(a, 1, 64);
     std::memset(b, 2, 64);
 }
