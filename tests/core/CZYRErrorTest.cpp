@@ -117,20 +117,6 @@ TEST(CZYRErrorTest, StatusesRoundTripAndTheBoundaryConvertsEveryFailure) {
     EXPECT_EQ(fields(status), "1: Error in Test::op (src:77)");
 }
 
-TEST(CZYRErrorTest, UnexpectedHandlerGuardsNestAndRestore) {
-    const ZYRUnexpectedHandler original = ZYRGetUnexpectedHandler(), one = [] { std::abort(); },
-                               other = [] {};
-    {
-        CZYRErrorSTC outer(one);
-        {
-            CZYRErrorSTC inner(other);
-            EXPECT_EQ(ZYRGetUnexpectedHandler(), other);
-        }
-        EXPECT_EQ(ZYRGetUnexpectedHandler(), one);
-    }
-    EXPECT_EQ(ZYRGetUnexpectedHandler(), original);
-}
-
 class FaultInjectionTest : public ::testing::TestWithParam<int> {};
 
 TEST_P(FaultInjectionTest, EveryAllocationMayFail) {

@@ -80,19 +80,3 @@ TEST(CZYRSmartPtrTest, CountsOnBothSchemes) {
     EXPECT_TRUE(ZYRPeekValue_ThreadSafe(&count) == 2u && ZYRIsShared_ThreadSafe(&count));
     EXPECT_EQ(ZYRDecrementRefCnt_ThreadSafe(&count) + ZYRDecrementRefCnt_ThreadSafe(&count), 1u);
 }
-
-TEST(CZYRSmartPtrTest, ContainerLendsACountAndUsesTheDeleter) {
-    static int deleted;
-    deleted = 0;
-    const unsigned long long before = GetMemUsage();
-    {
-        CZYRSmartZYRRefPtr<CZYRSmartRefPtrContainer<int>> box(
-            CZYRSmartRefPtrContainer<int>::create(new int(4), [](int* p) { ++deleted, delete p; }));
-        EXPECT_TRUE(GetMemUsage() > before && *box->getObject() == 4);
-    }
-    EXPECT_TRUE(deleted == 1 && GetMemUsage() == before);
-    void* one = czyrsmartptralloc(0);
-    EXPECT_EQ(ZYRMemSize(one), 1u);
-    czyrsmartptrfree(one);
-    czyrsmartptrfree(nullptr);
-}

@@ -1,5 +1,5 @@
-// Threads allocating under a tight limit: workers through the memory manager with two
-// flushable caches, a renderer filling heap and virtual-memory bands, and a thread resizing
+// Threads allocating under a tight limit: workers through the memory manager with a
+// flushable cache, a renderer filling heap and virtual-memory bands, and a thread resizing
 // one big block. Each statistics level runs in a process of its own (it is fixed at start-up).
 #include <sys/wait.h>
 #include <unistd.h>
