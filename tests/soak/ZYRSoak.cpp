@@ -1,6 +1,7 @@
-// Threads allocating under a tight limit: workers through the memory manager with a
-// flushable cache, a renderer filling heap and virtual-memory bands, and a thread resizing
-// one big block. Each statistics level runs in a process of its own (it is fixed at start-up).
+// Threads allocating under a tight limit: workers through the memory manager, a renderer
+// filling heap and virtual-memory bands that it gives back when asked to catch up, and a
+// thread resizing one big block. Each statistics level runs in a process of its own (it is fixed at
+// start-up).
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -24,7 +25,7 @@ constexpr unsigned long long kMiB = 1024 * 1024;
 // For the summary only: relaxed, nothing is published through them.
 std::atomic<unsigned long long> allocations{0}, refusals{0}, resizes{0};
 
-// Blocks (a memory-manager block or a virtual one) kept until a flush or a renderer sync.
+// Blocks (a memory-manager block, or a virtual one with size 0) held until given back.
 struct Held {
     std::mutex guard; // blocks and bytes
     std::vector<std::pair<void*, unsigned int>> blocks;
@@ -41,17 +42,6 @@ struct Held {
         blocks.clear();
         return std::exchange(bytes, 0);
     }
-};
-
-struct Cache : I_FlushableMemoryClient, Held {
-    bool flushMemory(unsigned int, unsigned int, eFlushMemorySeverity) override {
-        return dropAll() > 0;
-    }
-    unsigned int getFlushableMemorySize() override {
-        std::lock_guard hold(guard);
-        return bytes;
-    }
-    const char* getClientName() override { return "soak"; }
 };
 
 // Heap bands (kept with their size) and virtual bands, some partly decommitted (kept with
@@ -73,7 +63,7 @@ struct Renderer : ZYRPublic::I_SurfaceQueue, Held {
     }
 };
 
-void work(unsigned int seed, Cache& cache, const std::atomic<bool>& stop) {
+void work(unsigned int seed, const std::atomic<bool>& stop) {
     SetCZYRThreadSpecificPtr(new CZYRThreadSpecificPtr("worker", true));
     std::mt19937 random(seed);
     Held mine; // blocks this thread frees itself
@@ -83,8 +73,8 @@ void work(unsigned int seed, Cache& cache, const std::atomic<bool>& stop) {
                                ZYRPublic::eFlushMemorySeverityNormal);
         (p ? allocations : refusals).fetch_add(1, std::memory_order_relaxed);
         if (p)
-            (random() % 2 ? cache : mine).keep(p, size);
-        if (mine.blocks.size() > 32)
+            mine.keep(p, size);
+        if (!p || mine.blocks.size() > random() % 1024) // refused: give all back, as a cache would
             mine.dropAll();
     }
     mine.dropAll();
@@ -112,9 +102,6 @@ int soakRound(int seconds) {
     ZYRSetMemLimit(0);
     const unsigned long long limit = ZYRGetMemLimit();
     void* ballast = ZYRMalloc(static_cast<unsigned int>(limit - before - 48 * kMiB));
-    Cache caches[2];
-    for (Cache& cache : caches)
-        RegisterFlushableMemoryClient(&cache, true);
     Renderer renderer;
     RegisterSurfaceQueueInstance(&renderer);
     std::atomic<bool> stop{false};
@@ -122,7 +109,7 @@ int soakRound(int seconds) {
     threads.emplace_back([&] { renderer.run(stop); });
     threads.emplace_back(resize, std::cref(stop));
     for (unsigned int i = 0; i < 4; ++i)
-        threads.emplace_back(work, i + 1, std::ref(caches[i % 2]), std::cref(stop));
+        threads.emplace_back(work, i + 1, std::cref(stop));
     unsigned long long sampled = 0;
     const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(seconds);
     while (std::chrono::steady_clock::now() < end) {
@@ -133,8 +120,6 @@ int soakRound(int seconds) {
     for (std::thread& t : threads)
         t.join();
     RegisterSurfaceQueueInstance(nullptr);
-    for (Cache& cache : caches)
-        UnregisterFlushableMemoryClient(&cache), cache.dropAll();
     ZYRFree(ballast);
     const unsigned long long after = GetMemUsage();
     ZYRStdInit_TerminateFlushableMemoryClientRegistry();
