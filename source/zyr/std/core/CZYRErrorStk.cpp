@@ -9,6 +9,7 @@
 #include "zyr/std/core/CZYRClientBase.h"
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/core/internal/ZYRErrorBoundary.h"
 
 namespace ZYRStd {
@@ -72,7 +73,7 @@ public:
     void reportUniqueError(sZYRErrorInfo info) override { push(info, true); }
 
     bool getErrorMessage(char16_t* buffer, unsigned short* length) override {
-        std::lock_guard lock(mutex_);
+        detail::LockGuard lock(mutex_);
         const std::u16string filter(buffer, boundedLength(buffer));
         buffer[0] = u'\0';
         std::u16string result;
@@ -105,7 +106,7 @@ private:
 
     void push(const sZYRErrorInfo& info, bool unique) {
         RecordPtr record = newRecord(info);
-        std::lock_guard lock(mutex_);
+        detail::LockGuard lock(mutex_);
         sZYRErrorInfo*& head = stacks_[ZYRGetCurrentThreadId()];
         if (unique) {
             for (const sZYRErrorInfo* r = head; r; r = r->next)
@@ -116,15 +117,15 @@ private:
         head = record.release();
     }
 
-    std::mutex mutex_;                          // guards stacks_ and every record
-    std::map<uint32_t, sZYRErrorInfo*> stacks_; // kernel thread id -> newest record
+    detail::Mutex mutex_; // guards stacks_ and every record
+    std::map<uint32_t, sZYRErrorInfo*> stacks_ ZYR_GUARDED_BY(mutex_); // thread id -> newest
 };
 
 // The stack lives in static storage: the out-of-memory notice must reach it exactly when
 // the front refuses to allocate, and two threads may be the first to report at once.
-std::mutex processStackMutex; // guards processStack
+detail::Mutex processStackMutex; // guards processStack
 alignas(IImp_ZYRErrorStk) unsigned char processStackStorage[sizeof(IImp_ZYRErrorStk)];
-IImp_ZYRErrorStk* processStack = nullptr;
+IImp_ZYRErrorStk* processStack ZYR_GUARDED_BY(processStackMutex) = nullptr;
 
 } // namespace
 
@@ -139,7 +140,7 @@ sZYRErrorInfo ZYRMakeErrorInfo(short errorCode, const char16_t* message) {
 I_ErrorStk* createErrorStk(ZYRPublic::I_Error& err) {
     return ZYRErrorBoundary<I_ErrorStk*>(
         err, nullptr, "Error in ZYRStd::createErrorStk", kSource, kCreateLine, []() -> I_ErrorStk* {
-            std::lock_guard lock(processStackMutex);
+            detail::LockGuard lock(processStackMutex);
             if (!processStack)
                 processStack = ::new (processStackStorage) IImp_ZYRErrorStk;
             return processStack;
@@ -147,7 +148,7 @@ I_ErrorStk* createErrorStk(ZYRPublic::I_Error& err) {
 }
 
 void TerminateErrorStk() {
-    std::lock_guard lock(processStackMutex);
+    detail::LockGuard lock(processStackMutex);
     if (processStack)
         std::exchange(processStack, nullptr)->~IImp_ZYRErrorStk();
 }
@@ -157,7 +158,7 @@ namespace detail {
 void reportUniqueToProcessStack(const sZYRErrorInfo& info) {
     // Under the lock that TerminateErrorStk takes: the out-of-memory notice comes from any
     // thread at any time, also while the host is shutting the stack down.
-    std::lock_guard lock(processStackMutex);
+    detail::LockGuard lock(processStackMutex);
     if (!processStack)
         processStack = ::new (processStackStorage) IImp_ZYRErrorStk;
     processStack->reportUniqueError(info);

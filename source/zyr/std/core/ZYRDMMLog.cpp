@@ -9,6 +9,7 @@
 #include <mutex>
 #include <string>
 
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/core/internal/ZYRNoDestructor.h"
 
 namespace ZYRStd::detail {
@@ -24,12 +25,13 @@ struct ClientStat {
 };
 
 struct DMMLog {
-    std::mutex mutex; // guards path, file and every write to the file
-    char path[kPathBufferSize] = {};
-    std::FILE* file = nullptr;
+    detail::Mutex mutex; // guards path, file and every write to the file
+    char path[kPathBufferSize] ZYR_GUARDED_BY(mutex) = {};
+    std::FILE* file ZYR_GUARDED_BY(mutex) = nullptr;
 
-    std::mutex statMutex;                    // guards stats
-    std::map<std::string, ClientStat> stats; // byte order: the close lines go in name order
+    detail::Mutex statMutex; // guards stats
+    std::map<std::string, ClientStat>
+        stats ZYR_GUARDED_BY(statMutex); // byte order: the close lines go in name order
 };
 
 DMMLog& dmmLog() {
@@ -41,7 +43,7 @@ DMMLog& dmmLog() {
 
 void dmmLogOpenFromEnvironment() {
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.mutex);
+    detail::LockGuard lock(log.mutex);
     const char* path = std::getenv("ZYR_DMM_LOG");
     // A path longer than the buffer is refused rather than cut to some other file's name.
     if (!path || std::strlen(path) >= kPathBufferSize)
@@ -54,11 +56,11 @@ void dmmLogOpenFromEnvironment() {
 
 void dmmLogClose() {
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.mutex);
+    detail::LockGuard lock(log.mutex);
     if (!log.file)
         return;
     {
-        std::lock_guard statLock(log.statMutex);
+        detail::LockGuard statLock(log.statMutex);
         for (const auto& [name, stat] : log.stats) {
             if (!stat.hasPeak)
                 continue;
@@ -76,13 +78,13 @@ void dmmLogClose() {
 
 bool dmmLogIsOpen() {
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.mutex);
+    detail::LockGuard lock(log.mutex);
     return log.file != nullptr;
 }
 
 void dmmLogVPrintf(const char* format, va_list args) {
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.mutex);
+    detail::LockGuard lock(log.mutex);
     if (!log.file)
         return;
     std::vfprintf(log.file, format, args);
@@ -100,7 +102,7 @@ void dmmStatUpdate(const char* name, uint32_t bytes, bool add) {
     if (!dmmLogIsOpen())
         return;
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.statMutex);
+    detail::LockGuard lock(log.statMutex);
     const std::string key = name ? name : "";
     const auto found = log.stats.find(key);
     if (found == log.stats.end()) {
@@ -126,7 +128,7 @@ void dmmStatUpdateMax(const char* name, uint32_t bytes) {
     if (!dmmLogIsOpen())
         return;
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.statMutex);
+    detail::LockGuard lock(log.statMutex);
     ClientStat& stat = log.stats[name ? name : ""];
     stat.peak = std::max(stat.peak, bytes);
     stat.hasPeak = true;
@@ -134,7 +136,7 @@ void dmmStatUpdateMax(const char* name, uint32_t bytes) {
 
 uint32_t dmmStatPeak(const char* name) {
     DMMLog& log = dmmLog();
-    std::lock_guard lock(log.statMutex);
+    detail::LockGuard lock(log.statMutex);
     const auto found = log.stats.find(name ? name : "");
     return found == log.stats.end() ? 0 : found->second.peak;
 }

@@ -22,6 +22,7 @@
 #include "zyr/std/core/CZYRSmartPtr.h"
 #include "zyr/std/core/IStackWalker.h"
 #include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/core/internal/ZYRMemInternal.h"
 #include "zyr/std/core/internal/ZYRNoDestructor.h"
 
@@ -93,8 +94,8 @@ struct PendingFrees {
 [[gnu::tls_model("initial-exec")]] thread_local constinit PendingFrees pendingFrees{};
 
 struct PendingRegistry {
-    std::mutex mutex; // guards the list of threads
-    PendingFrees* head = nullptr;
+    detail::Mutex mutex; // guards the list of threads
+    PendingFrees* head ZYR_GUARDED_BY(mutex) = nullptr;
 };
 PendingRegistry& pendingRegistry() {
     static detail::NoDestructor<PendingRegistry> instance;
@@ -112,7 +113,7 @@ void flushPendingFrees(PendingFrees& pending) {
 // Returns true when some thread's pending bytes went back to the total.
 bool drainAllPendingFrees() {
     PendingRegistry& registry = pendingRegistry();
-    std::lock_guard lock(registry.mutex);
+    detail::LockGuard lock(registry.mutex);
     bool drained = false;
     for (PendingFrees* pending = registry.head; pending; pending = pending->next) {
         // Relaxed: the registry lock keeps the record alive; the exchange alone makes the
@@ -132,7 +133,7 @@ bool drainAllPendingFrees() {
 void pendingFreesThreadExit(void* data) {
     auto* pending = static_cast<PendingFrees*>(data);
     PendingRegistry& registry = pendingRegistry();
-    std::lock_guard lock(registry.mutex);
+    detail::LockGuard lock(registry.mutex);
     for (PendingFrees** link = &registry.head; *link; link = &(*link)->next) {
         if (*link == pending) {
             *link = pending->next;
@@ -156,7 +157,7 @@ pthread_key_t pendingFreesKey() {
 void registerPendingFrees(PendingFrees& pending) {
     ::pthread_setspecific(pendingFreesKey(), &pending);
     PendingRegistry& registry = pendingRegistry();
-    std::lock_guard lock(registry.mutex);
+    detail::LockGuard lock(registry.mutex);
     pending.next = registry.head;
     registry.head = &pending;
     pending.registered = true;
@@ -198,21 +199,22 @@ struct AllocationEntry {
 };
 
 struct Tracker {
-    std::recursive_mutex mutex; // guards every field below
-    unsigned int allocCount = 0;
-    unsigned int reallocCount = 0;
-    unsigned int freeCount = 0;
-    unsigned int currentBytes = 0;
+    detail::RecursiveMutex mutex; // guards every field below
+    unsigned int allocCount ZYR_GUARDED_BY(mutex) = 0;
+    unsigned int reallocCount ZYR_GUARDED_BY(mutex) = 0;
+    unsigned int freeCount ZYR_GUARDED_BY(mutex) = 0;
+    unsigned int currentBytes ZYR_GUARDED_BY(mutex) = 0;
     // Bytes that requests have reserved against the limit and not yet counted as held: the
     // limit test counts them, the counters and the leak report do not.
-    uint64_t reservedBytes = 0;
-    unsigned int peakBytes = 0;
-    std::map<void*, AllocationEntry> allocations; // block -> serial and requested size
-    std::map<void*, unsigned int> virtualBlocks;  // base -> stack identifier
-    CZYRSmartPtr<IStackWalker> walker{IImpStackWalkerStub::create()};
-    unsigned int breakAtSerial = ~0u;
+    uint64_t reservedBytes ZYR_GUARDED_BY(mutex) = 0;
+    unsigned int peakBytes ZYR_GUARDED_BY(mutex) = 0;
+    std::map<void*, AllocationEntry>
+        allocations ZYR_GUARDED_BY(mutex); // block -> serial and requested size
+    std::map<void*, unsigned int> virtualBlocks ZYR_GUARDED_BY(mutex); // base -> stack identifier
+    CZYRSmartPtr<IStackWalker> walker ZYR_GUARDED_BY(mutex){IImpStackWalkerStub::create()};
+    unsigned int breakAtSerial ZYR_GUARDED_BY(mutex) = ~0u;
 
-    void reset() {
+    void reset() ZYR_REQUIRES(mutex) {
         allocCount = reallocCount = freeCount = currentBytes = peakBytes = 0;
         reservedBytes = 0;
         allocations.clear();
@@ -236,7 +238,8 @@ bool debuggerAttached() {
 }
 
 // Caller holds the tracker mutex.
-void recordAllocLocked(Tracker& t, void* block, uint64_t bytes, uint32_t requested) {
+void recordAllocLocked(Tracker& t, void* block, uint64_t bytes, uint32_t requested)
+    ZYR_REQUIRES(t.mutex) {
     t.currentBytes += static_cast<unsigned int>(bytes);
     t.allocCount += 1;
     t.peakBytes = std::max(t.peakBytes, t.currentBytes);
@@ -246,7 +249,7 @@ void recordAllocLocked(Tracker& t, void* block, uint64_t bytes, uint32_t request
         t.allocations[block] = {t.allocCount, requested};
 }
 
-bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) {
+bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) ZYR_REQUIRES(t.mutex) {
     // Relaxed: the limit is one word read on its own; a lowering racing with this test may
     // apply from the next request.
     const uint64_t limit = memLimitBytes.load(std::memory_order_relaxed);
@@ -258,7 +261,7 @@ bool trackerLimitTestLocked(const Tracker& t, uint64_t add, uint64_t sub) {
 // Caller holds the tracker mutex. The test and the reservation in one hold: a thread that
 // tests after us sees our bytes, so two requests can never both take the last room. A
 // shrink only tests; it gives its bytes back once the host has resized.
-bool trackerReserveLocked(Tracker& t, uint64_t add, uint64_t sub) {
+bool trackerReserveLocked(Tracker& t, uint64_t add, uint64_t sub) ZYR_REQUIRES(t.mutex) {
     if (!trackerLimitTestLocked(t, add, sub))
         return false;
     if (add > sub)
@@ -356,7 +359,7 @@ void* guardedAlloc(unsigned int size) {
     Tracker& t = tracker();
     bool reserved;
     {
-        std::lock_guard lock(t.mutex);
+        detail::LockGuard lock(t.mutex);
         reserved = trackerReserveLocked(t, accounted, 0);
     }
     if (!reserved) {
@@ -364,7 +367,7 @@ void* guardedAlloc(unsigned int size) {
         return nullptr;
     }
     auto* block = static_cast<unsigned char*>(host.allocProc(n + kGuardOverhead, host.clientData));
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.reservedBytes -= accounted;
     if (!block)
         return nullptr;
@@ -378,7 +381,7 @@ void guardedFree(void* p) {
     GuardHeader* header = guardHeader(p);
     Tracker& t = tracker();
     {
-        std::lock_guard lock(t.mutex);
+        detail::LockGuard lock(t.mutex);
         t.freeCount += 1;
         t.currentBytes -= static_cast<unsigned int>(guardedAccounted(header->size));
         if (statLevel >= 2)
@@ -399,7 +402,7 @@ void* guardedRealloc(void* p, unsigned int size) {
     Tracker& t = tracker();
     bool reserved;
     {
-        std::lock_guard lock(t.mutex);
+        detail::LockGuard lock(t.mutex);
         reserved = trackerReserveLocked(t, newAccounted, oldAccounted);
     }
     if (!reserved) {
@@ -408,7 +411,7 @@ void* guardedRealloc(void* p, unsigned int size) {
     }
     auto* resized = static_cast<unsigned char*>(
         host.reallocProc(header, size + kGuardOverhead, host.clientData));
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     if (newAccounted > oldAccounted)
         t.reservedBytes -= newAccounted - oldAccounted;
     if (!resized)
@@ -510,7 +513,7 @@ void ZYRDbgCheckZYRMemAllocPtr(void* p) {
         throw invalid();
     if (statLevel >= 2) {
         Tracker& t = tracker();
-        std::lock_guard lock(t.mutex);
+        detail::LockGuard lock(t.mutex);
         const auto found = t.allocations.find(const_cast<GuardHeader*>(header));
         if (found == t.allocations.end() || found->second.size != header->size)
             throw invalid();
@@ -527,7 +530,7 @@ sZYRDbgMemState ZYRMemMgr_dbgMemState() {
     // Under the tracker lock: other threads update the counters meanwhile, and the five
     // must come from one moment.
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     return {t.allocCount, t.reallocCount, t.freeCount, t.currentBytes, t.peakBytes};
 }
 
@@ -591,7 +594,7 @@ bool ZYRGetTestAvailablePhysicalMemory() {
 
 void ZYRSetBreakOnAllocationCount(unsigned int serial) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.breakAtSerial = serial;
 }
 
@@ -621,7 +624,7 @@ uint32_t processClockMs() {
 void configureFront(int level) {
     Tracker& t = tracker();
     {
-        std::lock_guard lock(t.mutex);
+        detail::LockGuard lock(t.mutex);
         t.reset();
         if (level > 2)
             t.walker.reset(IImpStackWalkerStub::create());
@@ -685,26 +688,26 @@ uint64_t plainUsage() {
 
 bool trackerReserve(uint64_t bytes) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     return trackerReserveLocked(t, bytes, 0);
 }
 
 void trackerUnreserve(uint64_t bytes) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.reservedBytes -= bytes;
 }
 
 void trackerRecordAlloc(void* block, uint64_t bytes) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.reservedBytes -= bytes;
     recordAllocLocked(t, block, bytes, 0);
 }
 
 void trackerRecordFree(void* block, uint64_t bytes) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.freeCount += 1;
     t.currentBytes -= static_cast<unsigned int>(bytes);
     if (statLevel >= 2)
@@ -715,7 +718,7 @@ void trackerRecordDecommit(uint64_t before, uint64_t after) {
     // One hold: freeing `before` and counting `after` anew in two steps would let another
     // thread take the `after` bytes in between and push the count past the limit.
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.freeCount += 1;
     t.currentBytes -= static_cast<unsigned int>(before);
     if (after != 0)
@@ -724,13 +727,13 @@ void trackerRecordDecommit(uint64_t before, uint64_t after) {
 
 void trackerAddVirtualBlock(void* base, unsigned int stackId) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     t.virtualBlocks[base] = stackId;
 }
 
 unsigned int trackerEraseVirtualBlock(void* base) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     const auto found = t.virtualBlocks.find(base);
     if (found == t.virtualBlocks.end())
         return 0;
@@ -741,19 +744,21 @@ unsigned int trackerEraseVirtualBlock(void* base) {
 
 unsigned int trackerVirtualBlockId(void* base) {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     const auto found = t.virtualBlocks.find(base);
     return found == t.virtualBlocks.end() ? 0 : found->second;
 }
 
 uint64_t trackerCurrentBytes() {
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     return t.currentBytes;
 }
 
 IStackWalker& stackWalker() {
-    return *tracker().walker;
+    Tracker& t = tracker();
+    detail::LockGuard lock(t.mutex); // the walker is only replaced at start-up, under the lock
+    return *t.walker;
 }
 
 void sendOutOfMemoryNotice() {
@@ -790,7 +795,7 @@ void dumpMemList(ZYRPublic::tZYRTraceMsgCallback proc, void* data) {
     };
 
     Tracker& t = tracker();
-    std::lock_guard lock(t.mutex);
+    detail::LockGuard lock(t.mutex);
     if (statLevel >= 2) {
         std::map<unsigned int, void*> bySerial;
         for (const auto& [block, entry] : t.allocations)

@@ -103,16 +103,16 @@ unsigned int ZYRGetWorkerID() {
 
 void ZYRStdInit_InitializeFlushableMemoryClientRegistry() {
     auto& registry = detail::flushRegistry();
-    std::lock_guard lock(registry.mutex);
-    std::lock_guard listLock(registry.listMutex);
+    detail::LockGuard lock(registry.mutex);
+    detail::LockGuard listLock(registry.listMutex);
     if (registry.main.capacity() < 8)
         registry.main.reserve(8);
 }
 
 void ZYRStdInit_TerminateFlushableMemoryClientRegistry() {
     auto& registry = detail::flushRegistry();
-    std::lock_guard lock(registry.mutex);
-    std::lock_guard listLock(registry.listMutex);
+    detail::LockGuard lock(registry.mutex);
+    detail::LockGuard listLock(registry.listMutex);
     registry.main.clear();
 }
 

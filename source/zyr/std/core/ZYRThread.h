@@ -8,11 +8,12 @@
 
 #include "ZYRStdExport.h"
 #include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 
 namespace ZYRStd {
 
 // Non-recursive; taken through a scoped lock.
-class ZYRSTD_API mutex {
+class ZYRSTD_API ZYR_CAPABILITY("mutex") mutex {
 public:
     class scoped_lock;
 
@@ -20,18 +21,19 @@ public:
     mutex(const mutex&) = delete;
     mutex& operator=(const mutex&) = delete;
 
-    void lock() { m_.lock(); }
-    bool try_lock() { return m_.try_lock(); }
-    void unlock() { m_.unlock(); }
+    void lock() ZYR_ACQUIRE() { m_.lock(); }
+    bool try_lock() ZYR_TRY_ACQUIRE(true) { return m_.try_lock(); }
+    void unlock() ZYR_RELEASE() { m_.unlock(); }
     std::mutex& native() noexcept { return m_; }
 
 private:
     std::mutex m_;
 };
 
-class mutex::scoped_lock {
+class ZYR_SCOPED_CAPABILITY mutex::scoped_lock {
 public:
-    explicit scoped_lock(mutex& m) : lock_(m.native()) {}
+    explicit scoped_lock(mutex& m) ZYR_ACQUIRE(m) : lock_(m.native()) {}
+    ~scoped_lock() ZYR_RELEASE() = default;
     scoped_lock(const scoped_lock&) = delete;
     scoped_lock& operator=(const scoped_lock&) = delete;
     std::unique_lock<std::mutex>& native() noexcept { return lock_; }

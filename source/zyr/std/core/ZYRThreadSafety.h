@@ -19,6 +19,7 @@
 #define ZYR_RELEASE(...) ZYR_THREAD_ANNOTATION(release_capability(__VA_ARGS__))
 #define ZYR_TRY_ACQUIRE(...) ZYR_THREAD_ANNOTATION(try_acquire_capability(__VA_ARGS__))
 #define ZYR_EXCLUDES(...) ZYR_THREAD_ANNOTATION(locks_excluded(__VA_ARGS__))
+#define ZYR_ASSERT_CAPABILITY(m) ZYR_THREAD_ANNOTATION(assert_capability(m))
 #define ZYR_RETURN_CAPABILITY(m) ZYR_THREAD_ANNOTATION(lock_returned(m))
 #define ZYR_NO_THREAD_SAFETY_ANALYSIS ZYR_THREAD_ANNOTATION(no_thread_safety_analysis)
 
@@ -30,6 +31,9 @@ public:
     void lock() ZYR_ACQUIRE() { native_.lock(); }
     void unlock() ZYR_RELEASE() { native_.unlock(); }
     bool try_lock() ZYR_TRY_ACQUIRE(true) { return native_.try_lock(); }
+    // States a precondition the analysis cannot follow: the caller holds this mutex (for a
+    // function whose declaration lives where the mutex cannot be named).
+    void assertHeld() const ZYR_ASSERT_CAPABILITY(this) {}
     // For condition variables, which need the standard type.
     Native& native() noexcept { return native_; }
 

@@ -16,6 +16,7 @@
 
 #include "zyr/std/core/IStackWalker.h"
 #include "zyr/std/core/ZYRMem.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/core/internal/ZYRMemInternal.h"
 #include "zyr/std/core/internal/ZYRNoDestructor.h"
 
@@ -32,8 +33,8 @@ struct Region {
 };
 
 struct RegionTable {
-    std::mutex mutex; // guards regions
-    std::map<const void*, Region> regions;
+    detail::Mutex mutex; // guards regions
+    std::map<const void*, Region> regions ZYR_GUARDED_BY(mutex);
 };
 
 RegionTable& regionTable() {
@@ -171,7 +172,7 @@ void* VirtualMemAlloc(unsigned int size) {
     }
     try {
         RegionTable& table = regionTable();
-        std::lock_guard lock(table.mutex);
+        detail::LockGuard lock(table.mutex);
         table.regions[base] = Region{bytes, std::vector<bool>(bytes / pageSize(), true), bytes};
     } catch (...) {
         // Without its record the block could never be freed or counted: give it back.
@@ -193,7 +194,7 @@ void VirtualMemFree(void* p) {
     uint64_t committed = 0;
     {
         RegionTable& table = regionTable();
-        std::lock_guard lock(table.mutex);
+        detail::LockGuard lock(table.mutex);
         const auto found = table.regions.find(p);
         if (found == table.regions.end())
             return; // not ours: releasing it would corrupt the accounting
@@ -219,7 +220,7 @@ void VirtualMemDecommit(void* base, void* addr, unsigned int size) {
     uint64_t before = 0;
     uint64_t after = 0;
     {
-        std::lock_guard lock(table.mutex);
+        detail::LockGuard lock(table.mutex);
         const auto found = table.regions.find(base);
         if (found == table.regions.end())
             return;
@@ -322,7 +323,7 @@ namespace detail {
 
 uint64_t virtualRegionSize(const void* base) {
     RegionTable& table = regionTable();
-    std::lock_guard lock(table.mutex);
+    detail::LockGuard lock(table.mutex);
     const auto found = table.regions.find(base);
     return found == table.regions.end() ? 0 : found->second.committedBytes;
 }

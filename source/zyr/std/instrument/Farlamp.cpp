@@ -27,6 +27,7 @@
 #include "Kelvrin.h"
 #include "zyr/std/core/CZYRError.h"
 #include "zyr/std/core/CZYRErrorStk.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/instrument/internal/FarlampInternal.h"
 #include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
@@ -272,7 +273,7 @@ public:
     ~Writer() { stop(); }
 
     void start() {
-        const std::lock_guard guard(lock_);
+        const detail::LockGuard guard(lock_);
         if (running_)
             return;
         running_ = true;
@@ -281,7 +282,7 @@ public:
     // Runs everything still queued, then ends the thread.
     void stop() {
         {
-            const std::lock_guard guard(lock_);
+            const detail::LockGuard guard(lock_);
             running_ = false;
         }
         wake_.notify_one();
@@ -294,10 +295,10 @@ public:
 private:
     void run();
 
-    std::mutex lock_; // guards queue_ and running_; never held while the library is called
+    detail::Mutex lock_; // guards queue_ and running_; never held while the library is called
     std::condition_variable wake_;
-    std::deque<std::function<void()>> queue_;
-    bool running_ = false;
+    std::deque<std::function<void()>> queue_ ZYR_GUARDED_BY(lock_);
+    bool running_ ZYR_GUARDED_BY(lock_) = false;
     std::thread thread_;
 };
 
@@ -306,19 +307,20 @@ private:
 // writer runs; `lock` is held across the calls into the library, which engine threads
 // never make.
 struct LoggerState {
-    std::mutex lock; // guards the fields from libInst to prevSurfaceCount
-    void* libInst = nullptr;
-    bool libraryFunctionLoaded = false;
-    bool initialized = false;
-    Kelvrin* logHandle = nullptr;
-    int ProductInfoGroupID = -1;
-    int JobInfoGroupID = -1;
-    double jobStartTime = 0;
-    int xobjmode = 0;
-    sSurfaceInfo currSurfaceInfo;
-    sSurfaceInfo prevSurfaceInfo;
-    unsigned int prevSurfaceCount = 0; // surfaces in the run prevSurfaceInfo describes
-    EntryPoints entry;                 // valid while libraryFunctionLoaded
+    detail::Mutex lock; // guards the fields from libInst to prevSurfaceCount
+    void* libInst ZYR_GUARDED_BY(lock) = nullptr;
+    bool libraryFunctionLoaded ZYR_GUARDED_BY(lock) = false;
+    bool initialized ZYR_GUARDED_BY(lock) = false;
+    Kelvrin* logHandle ZYR_GUARDED_BY(lock) = nullptr;
+    int ProductInfoGroupID ZYR_GUARDED_BY(lock) = -1;
+    int JobInfoGroupID ZYR_GUARDED_BY(lock) = -1;
+    double jobStartTime ZYR_GUARDED_BY(lock) = 0;
+    int xobjmode ZYR_GUARDED_BY(lock) = 0;
+    sSurfaceInfo currSurfaceInfo ZYR_GUARDED_BY(lock);
+    sSurfaceInfo prevSurfaceInfo ZYR_GUARDED_BY(lock);
+    unsigned int
+        prevSurfaceCount ZYR_GUARDED_BY(lock) = 0; // surfaces in the run prevSurfaceInfo describes
+    EntryPoints entry ZYR_GUARDED_BY(lock);        // valid while libraryFunctionLoaded
 
     // Read by every operation without a lock. Relaxed: it only gates work, and what a
     // logged call needs is handed over through the writer's queue under its lock.
@@ -336,7 +338,7 @@ LoggerState state;
 
 bool Writer::post(std::function<void()> call) {
     {
-        const std::lock_guard guard(lock_);
+        const detail::LockGuard guard(lock_);
         if (!running_)
             return false;
         if (queue_.size() >= kMaxQueuedCalls) {
@@ -353,14 +355,15 @@ void Writer::run() {
     for (;;) {
         std::function<void()> call;
         {
-            std::unique_lock guard(lock_);
-            wake_.wait(guard, [&] { return !queue_.empty() || !running_; });
+            detail::UniqueLock guard(lock_);
+            wake_.wait(guard.native(),
+                       [&]() ZYR_REQUIRES(lock_) { return !queue_.empty() || !running_; });
             if (queue_.empty())
                 return;
             call = std::move(queue_.front());
             queue_.pop_front();
         }
-        const std::lock_guard session(state.lock);
+        const detail::LockGuard session(state.lock);
         try {
             call();
         } catch (...) {
@@ -386,7 +389,7 @@ Counts takeCounters() {
 }
 
 // Logs the taken counts as events; expects state.lock held.
-void logCountedEvents(const Counts& counts) {
+void logCountedEvents(const Counts& counts) ZYR_REQUIRES(state.lock) {
     for (int i = 0; i < kZYRAnalyticsEventAll; ++i) {
         if (counts[i] == 0)
             continue;
@@ -402,7 +405,8 @@ void logCountedEvents(const Counts& counts) {
 }
 
 // A new group holding `values` in order; expects state.lock held.
-void logGroup(const char* name, const std::vector<std::pair<std::string, std::string>>& values) {
+void logGroup(const char* name, const std::vector<std::pair<std::string, std::string>>& values)
+    ZYR_REQUIRES(state.lock) {
     if (!state.logHandle)
         return;
     int group = -1;
@@ -430,6 +434,7 @@ void noteDroppedAnalyticsRecords(unsigned long long count) {
 // ---- loading ------------------------------------------------------------------------------
 
 void Farlamp::LoadLibraryFunction() {
+    state.lock.assertHeld(); // called by the session calls and the writer, which hold it
     // The platform-version test of the original always passes here.
     state.libInst = dlopen(kLibraryName, RTLD_NOW | RTLD_LOCAL);
     if (!state.libInst)
@@ -455,6 +460,7 @@ void Farlamp::LoadLibraryFunction() {
 
 // Forgets everything of the session too: nothing may call into an unloaded library.
 void Farlamp::UnloadLibraryFunction() {
+    state.lock.assertHeld(); // called by the session calls and the writer, which hold it
     if (state.libInst)
         dlclose(state.libInst);
     state.libInst = nullptr;
@@ -474,6 +480,7 @@ void Farlamp::UnloadLibraryFunction() {
 }
 
 void Farlamp::Initialize(bool active) {
+    state.lock.assertHeld(); // called by the session calls and the writer, which hold it
     LoadLibraryFunction();
     if (!state.libraryFunctionLoaded)
         return;
@@ -486,7 +493,7 @@ void Farlamp::Initialize(bool active) {
 // ---- the session --------------------------------------------------------------------------
 
 bool Farlamp::StartSession(bool active, const char16_t* folder) {
-    const std::lock_guard lock(state.lock);
+    const detail::LockGuard lock(state.lock);
     if (!state.initialized)
         Initialize(active);
     if (!state.initialized)
@@ -519,7 +526,7 @@ bool Farlamp::StartSession(bool active, const char16_t* folder) {
 
 void Farlamp::CloseSession() {
     state.writer.stop(); // what engine threads queued is written first
-    const std::lock_guard lock(state.lock);
+    const detail::LockGuard lock(state.lock);
     if (state.loggingEnabled.load(std::memory_order_relaxed) && state.logHandle) {
         if (state.ProductInfoGroupID == -1) {
             state.entry.newDataGroup(state.logHandle, "ProductInfo", "", "ProductInfo",
@@ -545,12 +552,11 @@ bool Farlamp::LoggingEnabled() {
 namespace {
 
 // Writes one analytics record; runs on the writer.
-void logRecord(I_AnalyticsData* source) {
+void logRecord(I_AnalyticsData* source) ZYR_REQUIRES(state.lock) {
     const auto groupName = readValue<I_UniString*>(source, "DataGroupName");
     if (!groupName || !*groupName || !state.logHandle)
         return;
     const CZYRUniString name(*groupName, false);
-    const EntryPoints& entry = state.entry;
     for (const GroupRule& rule : kGroupRules) {
         if (!(name == CZYRUniString(rule.name)))
             continue;
@@ -559,20 +565,20 @@ void logRecord(I_AnalyticsData* source) {
         int group = -1;
         switch (rule.into) {
         case Into::NewGroup:
-            entry.newDataGroup(state.logHandle, rule.name, "", rule.name, group, nullptr, 0);
+            state.entry.newDataGroup(state.logHandle, rule.name, "", rule.name, group, nullptr, 0);
             break;
         case Into::ProductInfoGroup:
             if (state.ProductInfoGroupID == -1)
-                entry.newDataGroup(state.logHandle, "ProductInfo", "", "ProductInfo",
-                                   state.ProductInfoGroupID, nullptr, 0);
+                state.entry.newDataGroup(state.logHandle, "ProductInfo", "", "ProductInfo",
+                                         state.ProductInfoGroupID, nullptr, 0);
             group = state.ProductInfoGroupID;
             if (const auto mode = readValue<unsigned int>(source, "xobjMode"))
                 state.xobjmode = static_cast<int>(*mode);
             break;
         case Into::JobInfoGroup:
             if (state.JobInfoGroupID == -1)
-                entry.newDataGroup(state.logHandle, "JobInfo", "", "JobInfo", state.JobInfoGroupID,
-                                   nullptr, 0);
+                state.entry.newDataGroup(state.logHandle, "JobInfo", "", "JobInfo",
+                                         state.JobInfoGroupID, nullptr, 0);
             group = state.JobInfoGroupID;
             if (const auto start = readValue<double>(source, "StartTime"))
                 state.jobStartTime = *start;
@@ -582,9 +588,10 @@ void logRecord(I_AnalyticsData* source) {
             if (!key)
                 break;
             if (const auto value = readText(source, key))
-                entry.addToGroup(state.logHandle, group, key, value->c_str());
+                state.entry.addToGroup(state.logHandle, group, key, value->c_str());
             else if (std::strcmp(key, "PreferredFont") == 0)
-                entry.addToGroup(state.logHandle, group, key, "ERROR : PreferredFont Not Found");
+                state.entry.addToGroup(state.logHandle, group, key,
+                                       "ERROR : PreferredFont Not Found");
         }
         return;
     }
@@ -599,7 +606,7 @@ void Farlamp::LogDataObject(const C_SmartPtr<I_AnalyticsData>& record) {
         return;
     std::promise<void> written;
     C_SmartPtr<I_AnalyticsData> held = record;
-    if (state.writer.post([&written, held] {
+    if (state.writer.post([&written, held]() ZYR_REQUIRES(state.lock) {
             const struct Done {
                 std::promise<void>& done;
                 ~Done() { done.set_value(); }
@@ -640,7 +647,8 @@ void Farlamp::LogDict(const CZYRDict& info) {
     } catch (...) {
         return; // facts that cannot be read are not logged
     }
-    postCall([values = std::move(values)] { logGroup("PDFInfo", values); });
+    postCall([values = std::move(values)]()
+                 ZYR_REQUIRES(state.lock) { logGroup("PDFInfo", values); });
 }
 
 void Farlamp::LogZYRError(eZYRErrorType type, const char* area, const char* file) {
@@ -656,7 +664,8 @@ void Farlamp::LogZYRError(eZYRErrorType type, const char* area, const char* file
         {"Area", area ? area : ""}, {"Type", name ? name : decimal(static_cast<int>(type))},
         {"Parameter1", fileName},   {"Parameter2", ""},
         {"Parameter3", ""},         {"Fatal", type == kZYRErrorFatal ? "1" : "0"}};
-    postCall([values = std::move(values)] { logGroup("ErrorInfo", values); });
+    postCall([values = std::move(values)]()
+                 ZYR_REQUIRES(state.lock) { logGroup("ErrorInfo", values); });
 }
 
 // ---- events -------------------------------------------------------------------------------
@@ -670,14 +679,15 @@ unsigned int Farlamp::LogEvent(eZYRAnalyticsEventType type, bool peek) {
                     : counter.fetch_add(1, std::memory_order_relaxed) + 1;
     }
     if (type == kZYRAnalyticsEventAll)
-        postCall([counts = takeCounters()] { logCountedEvents(counts); });
+        postCall([counts = takeCounters()]()
+                     ZYR_REQUIRES(state.lock) { logCountedEvents(counts); });
     return 0;
 }
 
 void Farlamp::LogEventNow(eZYRAnalyticsEventType type) {
     if (type < 0 || static_cast<size_t>(type) >= kEventNames.size())
         return;
-    postCall([type] {
+    postCall([type]() ZYR_REQUIRES(state.lock) {
         if (state.logHandle)
             state.entry.logEvent(state.logHandle, "Job", "", kEventNames[type], nullptr, 0);
     });
@@ -687,13 +697,13 @@ void Farlamp::FlushJob(double time) {
     if (!LoggingEnabled())
         return;
     // One set of counts serves the job's values and its events.
-    postCall([time, counts = takeCounters()] {
+    postCall([time, counts = takeCounters()]() ZYR_REQUIRES(state.lock) {
         if (!state.logHandle)
             return;
         if (state.JobInfoGroupID != -1) {
             char elapsed[64];
             std::snprintf(elapsed, sizeof elapsed, "%.2f", time - state.jobStartTime);
-            const auto add = [](const char* key, const char* value) {
+            const auto add = [](const char* key, const char* value) ZYR_REQUIRES(state.lock) {
                 state.entry.addToGroup(state.logHandle, state.JobInfoGroupID, key, value);
             };
             add("CompletionTime", elapsed);
@@ -712,13 +722,12 @@ void Farlamp::FlushJob(double time) {
 // ---- surfaces -----------------------------------------------------------------------------
 
 void Farlamp::UpdateCurrentSurfaceInfo(double width, double height, unsigned int placedObjects) {
-    postCall([surface = sSurfaceInfo{width, height, placedObjects}] {
-        state.currSurfaceInfo = surface;
-    });
+    postCall([surface = sSurfaceInfo{width, height, placedObjects}]()
+                 ZYR_REQUIRES(state.lock) { state.currSurfaceInfo = surface; });
 }
 
 void Farlamp::LogSurfaceDataGroup() {
-    postCall([] {
+    postCall([]() ZYR_REQUIRES(state.lock) {
         if (!state.logHandle)
             return;
         if (state.prevSurfaceCount > 0 && state.currSurfaceInfo == state.prevSurfaceInfo) {
@@ -733,6 +742,7 @@ void Farlamp::LogSurfaceDataGroup() {
 }
 
 void Farlamp::LogSurfaceDataGroupHelper(sSurfaceInfo& info) {
+    state.lock.assertHeld(); // called by the session calls and the writer, which hold it
     if (!state.logHandle)
         return;
     char resolution[64];

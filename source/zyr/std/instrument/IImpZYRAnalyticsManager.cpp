@@ -105,8 +105,9 @@ private:
     std::atomic<bool> terminating_{false};
     detail::condition_impl wakeup_; // the queue got a record, or termination began
     mutex lock_;                    // guards queue_ and dropped_
-    std::deque<C_SmartPtr<I_AnalyticsData>> queue_;
-    unsigned long long dropped_ = 0; // records refused because the queue was full
+    std::deque<C_SmartPtr<I_AnalyticsData>> queue_ ZYR_GUARDED_BY(lock_);
+    // Records refused because the queue was full.
+    unsigned long long dropped_ ZYR_GUARDED_BY(lock_) = 0;
 };
 
 // The manager lives as long as the process, so that a producer holding its pointer while

@@ -21,6 +21,7 @@
 #define ZYR_TIMING_X86 1
 #endif
 
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/core/internal/ZYRMemInternal.h"
 
 namespace ZYRStd {
@@ -71,12 +72,12 @@ inline long long readTicks() {
     return monotonicNanos();
 }
 
-std::mutex& listMutex() {
-    static std::mutex m;
+detail::Mutex& listMutex() {
+    static detail::Mutex m;
     return m;
 }
 
-std::vector<ZYRTimeAccumulator*>& namedList() {
+std::vector<ZYRTimeAccumulator*>& namedList() ZYR_REQUIRES(listMutex()) {
     static std::vector<ZYRTimeAccumulator*> list;
     return list;
 }
@@ -231,7 +232,7 @@ bool ZYRTimingManager::Initialize() {
 }
 
 void ZYRTimingManager::Terminate() {
-    std::lock_guard lock(listMutex());
+    detail::LockGuard lock(listMutex());
     namedList().clear();
 }
 
@@ -268,26 +269,26 @@ const char* ZYRTimingManager::GetCacheSpeedLine() {
 }
 
 unsigned int ZYRTimingManager::GetNamedAccumulatorCount() {
-    std::lock_guard lock(listMutex());
+    detail::LockGuard lock(listMutex());
     return static_cast<unsigned int>(namedList().size());
 }
 
 ZYRTimeAccumulator* ZYRTimingManager::GetNamedAccumulator(unsigned int index) {
-    std::lock_guard lock(listMutex());
+    detail::LockGuard lock(listMutex());
     return index < namedList().size() ? namedList()[index] : nullptr;
 }
 
 ZYRTimeAccumulator::ZYRTimeAccumulator(const char* name, const char* file, int line)
     : fName(name), fFile(file), fLine(line) {
     if (fName && *fName) {
-        std::lock_guard lock(listMutex());
+        detail::LockGuard lock(listMutex());
         namedList().push_back(this);
     }
 }
 
 ZYRTimeAccumulator::~ZYRTimeAccumulator() {
     if (fName && *fName) {
-        std::lock_guard lock(listMutex());
+        detail::LockGuard lock(listMutex());
         auto& list = namedList();
         list.erase(std::remove(list.begin(), list.end(), this), list.end());
     }

@@ -12,6 +12,7 @@
 #include "zyr/std/core/ZYRMem.h"
 #include "zyr/std/core/ZYRStdInit.h"
 #include "zyr/std/core/ZYRThread.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/core/ZYRVirtualMem.h"
 #include "zyr/std/core/internal/ZYRDMMLog.h"
 #include "zyr/std/core/internal/ZYRFlushRegistry.h"
@@ -140,9 +141,9 @@ struct EngineClient {
 };
 
 struct ClientStatistics {
-    std::mutex mutex; // guards both clients' records
-    EngineClient tuma;
-    EngineClient jov;
+    detail::Mutex mutex; // guards both clients' records
+    EngineClient tuma ZYR_GUARDED_BY(mutex);
+    EngineClient jov ZYR_GUARDED_BY(mutex);
 };
 
 ClientStatistics& statistics() {
@@ -154,7 +155,7 @@ void accountAlloc(EngineClient ClientStatistics::*client, void* p) {
     const uint64_t size = ZYRMemSize(p);
     const bool interp = isInterpreterThread();
     ClientStatistics& stats = statistics();
-    std::lock_guard lock(stats.mutex);
+    detail::LockGuard lock(stats.mutex);
     EngineClient& records = stats.*client;
     if (interp)
         records.interp.add(size);
@@ -166,7 +167,7 @@ void accountFree(EngineClient ClientStatistics::*client, void* p) {
         const uint64_t size = ZYRMemSize(p);
         const bool interp = isInterpreterThread();
         ClientStatistics& stats = statistics();
-        std::lock_guard lock(stats.mutex);
+        detail::LockGuard lock(stats.mutex);
         EngineClient& records = stats.*client;
         if (interp)
             records.interp.subtract(size);
@@ -185,7 +186,7 @@ void* resizeAccounted(EngineClient ClientStatistics::*client, void* p, unsigned 
         return q;
     const bool interp = isInterpreterThread();
     ClientStatistics& stats = statistics();
-    std::lock_guard lock(stats.mutex);
+    detail::LockGuard lock(stats.mutex);
     EngineClient& records = stats.*client;
     if (interp) {
         records.interp.subtract(oldSize);
@@ -199,7 +200,7 @@ void* resizeAccounted(EngineClient ClientStatistics::*client, void* p, unsigned 
 uint64_t currentOf(EngineClient ClientStatistics::*client, eZYRMemoryClientType type,
                    unsigned long long* peak) {
     ClientStatistics& stats = statistics();
-    std::lock_guard lock(stats.mutex);
+    detail::LockGuard lock(stats.mutex);
     const ClientRecord& record =
         type == eZYRMemoryClientInterp ? (stats.*client).interp : (stats.*client).all;
     if (peak)
@@ -302,16 +303,17 @@ bool ZYRFlushMemory(I_FlushableMemoryClient* requester, unsigned int bytesNeeded
                  bytesNeeded, static_cast<int>(severity));
 
     detail::FlushRegistry& registry = detail::flushRegistry();
-    std::lock_guard lock(registry.mutex);
+    detail::LockGuard lock(registry.mutex);
 
     std::array<I_FlushableMemoryClient*, kMaxCollected> collected{};
     unsigned int count = 0;
-    for (size_t i = 0; i < registry.main.size(); ++i) {
+    const auto& clients = registry.mainForFlush();
+    for (size_t i = 0; i < clients.size(); ++i) {
         if (count == kMaxCollected) {
             dmmLogPrintf("-- Too many flushable clients \n");
             break;
         }
-        I_FlushableMemoryClient* client = registry.main[i];
+        I_FlushableMemoryClient* client = clients[i];
         if (client != requester)
             collected[count++] = client;
     }
@@ -378,7 +380,7 @@ bool ZYRFlushMemoryThreadSafe(I_FlushableMemoryClient* requester, unsigned int b
                  clientName(requester), bytesNeeded, static_cast<int>(severity));
 
     detail::FlushRegistry& registry = detail::flushRegistry();
-    std::lock_guard lock(registry.mutex);
+    detail::LockGuard lock(registry.mutex);
 
     struct Candidate {
         I_FlushableMemoryClient* client;
@@ -386,7 +388,7 @@ bool ZYRFlushMemoryThreadSafe(I_FlushableMemoryClient* requester, unsigned int b
     };
     std::array<Candidate, kMaxCollected> collected{};
     unsigned int count = 0;
-    for (I_FlushableMemoryClient* client : registry.threadSafe) {
+    for (I_FlushableMemoryClient* client : registry.threadSafeForFlush()) {
         if (count == kMaxCollected) {
             dmmLogPrintf("-- Too many flushable clients \n");
             break;
@@ -443,8 +445,8 @@ void RegisterFlushableMemoryClient(I_FlushableMemoryClient* client, bool threadS
     if (!client)
         return;
     detail::FlushRegistry& registry = detail::flushRegistry();
-    std::lock_guard lock(registry.mutex);
-    std::lock_guard listLock(registry.listMutex);
+    detail::LockGuard lock(registry.mutex);
+    detail::LockGuard listLock(registry.listMutex);
     registry.main.push_back(client);
     if (threadSafe)
         registry.threadSafe.push_back(client);
@@ -454,8 +456,8 @@ void UnregisterFlushableMemoryClient(I_FlushableMemoryClient* client) {
     if (!client)
         return;
     detail::FlushRegistry& registry = detail::flushRegistry();
-    std::lock_guard lock(registry.mutex);
-    std::lock_guard listLock(registry.listMutex);
+    detail::LockGuard lock(registry.mutex);
+    detail::LockGuard listLock(registry.listMutex);
     for (auto* list : {&registry.main, &registry.threadSafe}) {
         const auto found = std::find(list->begin(), list->end(), client);
         if (found != list->end())
@@ -470,7 +472,7 @@ void GetClientsMemoryUsedAndMemoryLimit(unsigned long long& flushable, unsigned 
         // Under the list lock only: another thread may be registering meanwhile, and a flush
         // in progress holds the registry lock for as long as its clients take.
         detail::FlushRegistry& registry = detail::flushRegistry();
-        std::lock_guard lock(registry.listMutex);
+        detail::LockGuard lock(registry.listMutex);
         for (I_FlushableMemoryClient* client : registry.main)
             flushable += client->getFlushableMemorySize();
     }
@@ -544,7 +546,7 @@ unsigned long long DMM_GetCurrJOVMem(eZYRMemoryClientType type, unsigned long lo
 
 unsigned long long DMM_GetCurrTUMAJOVMem(eZYRMemoryClientType type) {
     ClientStatistics& stats = statistics();
-    std::lock_guard lock(stats.mutex);
+    detail::LockGuard lock(stats.mutex);
     if (type == eZYRMemoryClientInterp)
         return stats.tuma.interp.current + stats.jov.interp.current;
     if (type == eZYRMemoryClientOthers) {
