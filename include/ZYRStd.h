@@ -1,4 +1,5 @@
-// The whole exported interface of ZYRStd in one include.
+/// \file
+/// The whole exported interface of ZYRStd in one include.
 #pragma once
 
 #include "C_SmartPtr.h"

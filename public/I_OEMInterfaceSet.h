@@ -1,4 +1,5 @@
-// The set of host interfaces a job carries; each getter hands out one reference.
+/// \file
+/// The set of host interfaces a job carries; each getter hands out one reference.
 #pragma once
 
 #include "I_Error.h"
@@ -6,9 +7,11 @@
 
 namespace ZYRPublic {
 
-// True with `*out` set (one reference for the caller) when the job has the interface.
+/// True with `*out` set (one reference for the caller) when the job has the interface.
 class I_OEMInterfaceSet : public I_OEMRefCounted {
 public:
+    /// One getter per host interface.
+    ///@{
     virtual bool getOEMCuttingInfoMgr(I_OEMCuttingInfoMgr** out, I_Error& err) = 0;
     virtual bool getOEMPDFPreProcessor(I_OEMPDFPreProcessor** out, I_Error& err) = 0;
     virtual bool getOEMTagEvaluatorInterface(I_OEMTagEvaluatorInterface** out, I_Error& err) = 0;
@@ -21,6 +24,7 @@ public:
     virtual bool getOEMRasterBufferMgr(I_OEMRasterBufferMgr** out, I_Error& err) = 0;
     virtual bool getOEMProgressInterface(I_OEMProgressInterface** out, I_Error& err) = 0;
     virtual bool getOEMCalibrationMgr(I_OEMCalibrationMgr** out, I_Error& err) = 0;
+    ///@}
 
 protected:
     ~I_OEMInterfaceSet() = default;

@@ -1,10 +1,12 @@
-// The error types carried by I_Error statuses and CZYRError exceptions.
+/// \file
+/// The error types carried by I_Error statuses and CZYRError exceptions.
 #pragma once
 
 #include <cstdint>
 
 namespace ZYRPublic {
 
+/// What went wrong: the type recorded in an I_Error and carried by a ZYRStd::CZYRError.
 enum eZYRErrorType : int32_t {
     kZYRErrorNoError = 0,
     kZYRErrorUnknown = 1,

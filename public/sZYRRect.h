@@ -1,14 +1,15 @@
-// The axis-aligned rectangle record that crosses module boundaries.
+/// \file
+/// The axis-aligned rectangle record that crosses module boundaries.
 #pragma once
 
 namespace ZYRPublic {
 
-// The field order is part of the interface: the second pair is top, then right.
+/// The field order is part of the interface: the second pair is top, then right.
 struct sZYRRect {
-    double left;
-    double bottom;
-    double top;
-    double right;
+    double left;   ///< smallest x
+    double bottom; ///< smallest y
+    double top;    ///< largest y
+    double right;  ///< largest x
 };
 
 } // namespace ZYRPublic
