@@ -1,4 +1,5 @@
-// Fixed (16.16) and Frac (2.30) arithmetic on signed 32-bit numbers.
+/// \file
+/// Fixed (16.16) and Frac (2.30) arithmetic on signed 32-bit numbers.
 #pragma once
 
 #include <cstdint>
@@ -13,33 +14,33 @@ namespace ZYRStd {
 // them inline-only: a call that is not inlined goes to the library's one exported copy,
 // and no program or library emits a weak copy of its own.
 
-// a times b / 2^16, rounded.
+/// a times b / 2^16, rounded.
 [[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t FixedMul(int32_t a, int32_t b) {
     return fixed_detail::fixedMul(a, b);
 }
 
-// a times b / 2^30, rounded.
+/// a times b / 2^30, rounded.
 [[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t fracmul(int32_t a, int32_t b) {
     return fixed_detail::fracMul(a, b);
 }
 
-// a / b times 2^16, truncated; b = 0 gives the extreme of a's sign (0 / 0 is positive).
+/// a / b times 2^16, truncated; b = 0 gives the extreme of a's sign (0 / 0 is positive).
 [[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t TFixedDiv(int32_t a, int32_t b) {
     return fixed_detail::fixedDiv(a, b);
 }
 
-// a / b times 2^30, rounded; b = 0 as for TFixedDiv.
+/// a / b times 2^30, rounded; b = 0 as for TFixedDiv.
 [[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t fixratio(int32_t a, int32_t b) {
     return fixed_detail::fixRatio(a, b);
 }
 
-// a times b / c through a 64-bit product, truncated or rounded; c = 0 saturates.
+/// a times b / c through a 64-bit product, truncated or rounded; c = 0 saturates.
 [[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t FixedMulDiv(int32_t a, int32_t b, int32_t c,
                                                                  bool rounded) {
     return fixed_detail::fixedMulDiv(a, b, c, rounded);
 }
 
-// *p times 2^16, rounded; NaN gives 0.
+/// *p times 2^16, rounded; NaN gives 0.
 [[gnu::gnu_inline]] extern inline ZYRSTD_API int32_t PFloatToFixed(float* p) {
     return fixed_detail::floatToFixed(p);
 }

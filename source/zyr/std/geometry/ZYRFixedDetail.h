@@ -1,5 +1,6 @@
-// The exact fixed-point arithmetic behind ZYRFixed.h, in one place for the inline copies
-// and the library's exported ones.
+/// \file
+/// The exact fixed-point arithmetic behind ZYRFixed.h, in one place for the inline copies
+/// and the library's exported ones.
 #pragma once
 
 #include <algorithm>
@@ -15,20 +16,20 @@ namespace fixed_detail {
 inline constexpr int32_t kMin = std::numeric_limits<int32_t>::min();
 inline constexpr int32_t kMax = std::numeric_limits<int32_t>::max();
 
-// |v| for every 32-bit v, including the one without a positive counterpart.
+/// |v| for every 32-bit v, including the one without a positive counterpart.
 inline uint64_t magnitude(int64_t v) {
     return static_cast<uint64_t>(std::llabs(v));
 }
 
-// Applies the sign to a magnitude, saturating at the 32-bit extremes. Every caller's
-// magnitude is below 2^63; selects rather than branches, as signs are unpredictable.
+/// Applies the sign to a magnitude, saturating at the 32-bit extremes. Every caller's
+/// magnitude is below 2^63; selects rather than branches, as signs are unpredictable.
 inline int32_t saturate(bool negative, uint64_t q) {
     const auto v = static_cast<int64_t>(q);
     return static_cast<int32_t>(std::clamp<int64_t>(negative ? -v : v, kMin, kMax));
 }
 
-// a times b / 2^shift, half away from zero. The product needs at most 62 bits, so
-// the result is exact where a double product would round above 2^53.
+/// a times b / 2^shift, half away from zero. The product needs at most 62 bits, so
+/// the result is exact where a double product would round above 2^53.
 inline int32_t mulShiftRounded(int32_t a, int32_t b, unsigned shift) {
     const int64_t p = static_cast<int64_t>(a) * b;
     const uint64_t half = uint64_t{1} << (shift - 1);

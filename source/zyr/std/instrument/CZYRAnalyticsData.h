@@ -1,4 +1,5 @@
-// Analytics records: the factory behind I_AnalyticsData and the value wrapper CZYRAnalyticsData.
+/// \file
+/// Analytics records: the factory behind I_AnalyticsData and the value wrapper CZYRAnalyticsData.
 #pragma once
 
 #include <cstdint>
@@ -13,14 +14,14 @@ namespace ZYRStd {
 
 using ZYRPublic::I_AnalyticsData;
 
-// A new, empty record with one reference for the caller; enabled when analytics are active
-// now. Null when `err` already holds an error or the record cannot be made.
+/// A new, empty record with one reference for the caller; enabled when analytics are active
+/// now. Null when `err` already holds an error or the record cannot be made.
 [[nodiscard]] ZYRSTD_API I_AnalyticsData* createAnalyticsData(ZYRPublic::I_Error& err);
 
-// A shared analytics record; copies share it. Failures are thrown as CZYRError.
+/// A shared analytics record; copies share it. Failures are thrown as CZYRError.
 class ZYRSTD_API CZYRAnalyticsData : public CZYRInterfaceValue<I_AnalyticsData> {
 public:
-    CZYRAnalyticsData(); // a new record
+    CZYRAnalyticsData(); ///< a new record
     CZYRAnalyticsData(const CZYRAnalyticsData& other) = default;
     CZYRAnalyticsData(CZYRAnalyticsData&& other) noexcept = default;
     CZYRAnalyticsData(const C_SmartPtr<I_AnalyticsData>& record)

@@ -1,5 +1,6 @@
-// Farlamp, the telemetry session logger: one session per process in the telemetry library
-// libKelvrin.so, loaded at run time. Without a complete library every operation does nothing.
+/// \file
+/// Farlamp, the telemetry session logger: one session per process in the telemetry library
+/// libKelvrin.so, loaded at run time. Without a complete library every operation does nothing.
 #pragma once
 
 #include "C_SmartPtr.h"
@@ -7,7 +8,7 @@
 #include "ZYRStdExport.h"
 #include "eZYRErrorType.h"
 
-struct Kelvrin; // a session of the telemetry library
+struct Kelvrin; ///< a session of the telemetry library
 
 namespace ZYRStd {
 
@@ -16,7 +17,7 @@ using ZYRPublic::C_SmartPtr;
 using ZYRPublic::eZYRErrorType;
 using ZYRPublic::I_AnalyticsData;
 
-// Counted feature uses; 0 to 7 are logged as events by these names, 8 to 11 only counted.
+/// Counted feature uses; 0 to 7 are logged as events by these names, 8 to 11 only counted.
 enum eZYRAnalyticsEventType : int {
     kZYRAnalyticsEventCachePlacedObject = 0,
     kZYRAnalyticsEventEnableCutContourProcessing = 1,
@@ -26,11 +27,11 @@ enum eZYRAnalyticsEventType : int {
     kZYRAnalyticsEventGlobalRasterization = 5,
     kZYRAnalyticsEventTextAntiAliasing = 6,
     kZYRAnalyticsEventZYREnableMTR = 7,
-    kZYRAnalyticsEventHasTrapping = 8,          // feeds the job's "HasTrapping"
-    kZYRAnalyticsEventHasTransparency = 9,      // feeds the job's "HasTransparency"
-    kZYRAnalyticsEventPlacedObjectCached = 10,  // event 0 is logged only when this counted
-    kZYRAnalyticsEventCutContourProcessed = 11, // event 1 is logged only when this counted
-    kZYRAnalyticsEventAll = 12,                 // LogEvent: log and reset every counter
+    kZYRAnalyticsEventHasTrapping = 8,          ///< feeds the job's "HasTrapping"
+    kZYRAnalyticsEventHasTransparency = 9,      ///< feeds the job's "HasTransparency"
+    kZYRAnalyticsEventPlacedObjectCached = 10,  ///< event 0 is logged only when this counted
+    kZYRAnalyticsEventCutContourProcessed = 11, ///< event 1 is logged only when this counted
+    kZYRAnalyticsEventAll = 12,                 ///< LogEvent: log and reset every counter
 };
 
 struct sSurfaceInfo {
@@ -44,30 +45,30 @@ class ZYRSTD_API Farlamp {
 public:
     Farlamp() = delete;
 
-    // Opens the process's session: in `folder` when `active` (falling back to the default
-    // folder "./AnalyticsLogs" with a report on the error stack), else a session that
-    // records nothing. True when a session is open.
+    /// Opens the process's session: in `folder` when `active` (falling back to the default
+    /// folder "./AnalyticsLogs" with a report on the error stack), else a session that
+    /// records nothing. True when a session is open.
     static bool StartSession(bool active, const char16_t* folder);
-    // Closes the session and unloads the library; a later StartSession loads it afresh.
+    /// Closes the session and unloads the library; a later StartSession loads it afresh.
     static void CloseSession();
-    // Writes the record as the data group its "DataGroupName" names.
+    /// Writes the record as the data group its "DataGroupName" names.
     static void LogDataObject(const C_SmartPtr<I_AnalyticsData>& record);
     static void LogDict(const CZYRDict& info);
     static void LogZYRError(eZYRErrorType type, const char* area, const char* file);
-    // Counts one use of `type` (unless `peek`) and returns the count; kZYRAnalyticsEventAll
-    // logs the counted events and resets every counter.
+    /// Counts one use of `type` (unless `peek`) and returns the count; kZYRAnalyticsEventAll
+    /// logs the counted events and resets every counter.
     static unsigned int LogEvent(eZYRAnalyticsEventType type, bool peek);
     static void LogEventNow(eZYRAnalyticsEventType type);
-    // Ends the job: completion time, trapping and transparency, events, the last surfaces.
+    /// Ends the job: completion time, trapping and transparency, events, the last surfaces.
     static void FlushJob(double time);
-    // Called after each surface: a run of equal surfaces is logged once, with its count.
+    /// Called after each surface: a run of equal surfaces is logged once, with its count.
     static void LogSurfaceDataGroup();
     static void UpdateCurrentSurfaceInfo(double width, double height, unsigned int placedObjects);
     static bool LoggingEnabled();
 
 private:
-    // The session's state lives in Farlamp.cpp, in one record guarded by one lock; these
-    // helpers expect that lock held.
+    /// The session's state lives in Farlamp.cpp, in one record guarded by one lock; these
+    /// helpers expect that lock held.
     static void Initialize(bool active);
     static void LoadLibraryFunction();
     static void UnloadLibraryFunction();

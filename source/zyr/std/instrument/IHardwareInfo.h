@@ -1,5 +1,6 @@
-// A description of the machine and its current load, in fixed-size records of 16-bit text
-// and numbers, and its printing as indented text lines.
+/// \file
+/// A description of the machine and its current load, in fixed-size records of 16-bit text
+/// and numbers, and its printing as indented text lines.
 #pragma once
 
 #include <cstddef>
@@ -13,19 +14,19 @@ namespace ZYRStd {
 struct HardwareDiskEntry {
     char16_t interfaceType[8];
     char16_t model[36];
-    std::uint64_t size; // bytes
+    std::uint64_t size; ///< bytes
 };
 
 struct HardwareProcessorEntry {
     char16_t caption[60];
-    std::uint32_t currentClockSpeed; // MHz
+    std::uint32_t currentClockSpeed; ///< MHz
     std::uint32_t extClock;
-    std::uint32_t l2CacheSize; // KB
+    std::uint32_t l2CacheSize; ///< KB
     std::uint32_t l2CacheSpeed;
-    std::uint32_t l3CacheSize; // KB
+    std::uint32_t l3CacheSize; ///< KB
     std::uint32_t l3CacheSpeed;
     char16_t manufacturer[20];
-    std::uint32_t maxClockSpeed; // MHz
+    std::uint32_t maxClockSpeed; ///< MHz
     char16_t name[60];
     std::uint32_t numberOfCores;
     std::uint32_t numberOfLogicalProcessors;
@@ -33,8 +34,8 @@ struct HardwareProcessorEntry {
 };
 
 struct HardwareMemoryEntry {
-    std::uint64_t capacity; // bytes
-    std::uint32_t speed;    // MHz
+    std::uint64_t capacity; ///< bytes
+    std::uint32_t speed;    ///< MHz
     std::uint32_t reserved;
 };
 
@@ -43,7 +44,7 @@ constexpr unsigned int kMaxHardwareProcessors = 8;
 constexpr unsigned int kMaxHardwareMemoryModules = 16;
 constexpr unsigned int kMaxPerformanceCores = 128;
 
-// 5920 bytes; every query that fills it zero-fills it first.
+/// 5920 bytes; every query that fills it zero-fills it first.
 struct HardwareInfoRec {
     HardwareDiskEntry disks[kMaxHardwareDisks];
     HardwareProcessorEntry processors[kMaxHardwareProcessors];
@@ -61,13 +62,13 @@ struct HardwareInfoRec {
     std::uint32_t reserved5[2];
 };
 
-// 2504 bytes; every query that fills it zero-fills it first.
+/// 2504 bytes; every query that fills it zero-fills it first.
 struct PerformanceRec {
-    std::uint64_t totalProcessorUse; // percent
+    std::uint64_t totalProcessorUse; ///< percent
     std::uint64_t coreProcessorUse[kMaxPerformanceCores];
     unsigned char reserved1[1408];
-    std::uint64_t commitLimit;    // bytes
-    std::uint64_t committedBytes; // bytes
+    std::uint64_t commitLimit;    ///< bytes
+    std::uint64_t committedBytes; ///< bytes
     std::uint32_t percentCommittedBytesInUse;
     unsigned char reserved2[36];
     std::uint32_t numberOfCores;
@@ -104,8 +105,8 @@ static_assert(sizeof(PerformanceRec) == 2504 && offsetof(PerformanceRec, corePro
               offsetof(PerformanceRec, percentCommittedBytesInUse) == 2456 &&
               offsetof(PerformanceRec, numberOfCores) == 2496);
 
-// Queries return false for a null record or a failed query; prints write nothing for a
-// null record. Reports take a stream of text, so they keep the platform's wide type.
+/// Queries return false for a null record or a failed query; prints write nothing for a
+/// null record. Reports take a stream of text, so they keep the platform's wide type.
 class ZYRSTD_API IHardwareInfo {
 public:
     virtual ~IHardwareInfo();
@@ -115,17 +116,17 @@ public:
     [[nodiscard]] virtual bool getMemoryPerformance(PerformanceRec* rec) = 0;
     [[nodiscard]] virtual bool getCPUPerformance(PerformanceRec* rec) = 0;
     virtual void printMemoryInfo(const HardwareInfoRec* rec, std::wostream& out) = 0;
-    // Returns the number of processors printed.
+    /// Returns the number of processors printed.
     virtual int printProcessorAndOSInfo(const HardwareInfoRec* rec, std::wostream& out) = 0;
     virtual void printDiskInfo(const HardwareInfoRec* rec, std::wostream& out) = 0;
     virtual void printMemoryPerformance(const PerformanceRec* rec, std::wostream& out) = 0;
     virtual void printCPUPerformance(const PerformanceRec* rec, std::wostream& out) = 0;
 };
 
-// A new description of this machine (null when memory runs out); the caller deletes it.
+/// A new description of this machine (null when memory runs out); the caller deletes it.
 [[nodiscard]] ZYRSTD_API IHardwareInfo* createHardwareInfo();
-// The same, reading /proc, /sys and /etc under `systemRoot` instead of "/" (a container's
-// view of its host, or a prepared tree).
+/// The same, reading /proc, /sys and /etc under `systemRoot` instead of "/" (a container's
+/// view of its host, or a prepared tree).
 [[nodiscard]] ZYRSTD_API IHardwareInfo* createHardwareInfo(const char* systemRoot);
 
 } // namespace ZYRStd

@@ -1,5 +1,6 @@
-// The analytics manager: the settings a host gives before start-up, and the singleton that
-// logs finalized analytics records on a worker thread of its own.
+/// \file
+/// The analytics manager: the settings a host gives before start-up, and the singleton that
+/// logs finalized analytics records on a worker thread of its own.
 #pragma once
 
 #include "C_SmartPtr.h"
@@ -13,21 +14,21 @@ using ZYRPublic::I_AnalyticsData;
 
 class ZYRSTD_API IZYRAnalyticsManager {
 public:
-    // Queues `record` for logging; throws kZYRErrorInvalidFuncCall once termination began.
+    /// Queues `record` for logging; throws kZYRErrorInvalidFuncCall once termination began.
     virtual void enqueue(C_SmartPtr<I_AnalyticsData> record) = 0;
     virtual ~IZYRAnalyticsManager();
 };
 
 // The settings (ZYRSetAnalyticsActive, ZYRSetAnalyticsLogFolder) are start-up options.
 
-// Both always return true; a session that cannot start leaves analytics inactive.
+/// Both always return true; a session that cannot start leaves analytics inactive.
 ZYRSTD_API bool ZYRAnalyticsManagerInit();
 ZYRSTD_API bool ZYRAnalyticsManagerTerm();
-// The running manager or null. The manager outlives ZYRAnalyticsManagerTerm, so a pointer
-// taken before it only meets the terminating error.
+/// The running manager or null. The manager outlives ZYRAnalyticsManagerTerm, so a pointer
+/// taken before it only meets the terminating error.
 ZYRSTD_API IZYRAnalyticsManager* GetZYRAnalyticsManager();
 
-// Enqueues on the running manager; false when there is none. Throws what enqueue throws.
+/// Enqueues on the running manager; false when there is none. Throws what enqueue throws.
 ZYRSTD_API bool ZYREnqueueAnalyticsRecord(C_SmartPtr<I_AnalyticsData> record);
 
 } // namespace ZYRStd

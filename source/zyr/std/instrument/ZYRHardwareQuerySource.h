@@ -1,5 +1,6 @@
-// Answers "SELECT * FROM <class>" for the hardware classes from the files Linux keeps
-// under /proc, /sys and /etc: one row per object, each property as text.
+/// \file
+/// Answers "SELECT * FROM <class>" for the hardware classes from the files Linux keeps
+/// under /proc, /sys and /etc: one row per object, each property as text.
 #pragma once
 
 #include <functional>
@@ -16,16 +17,16 @@ class ZYRSTD_API ZYRHardwareQuerySource {
 public:
     using Row = std::map<std::string, std::string>;
 
-    // Reads below `root` ("/" for this machine).
+    /// Reads below `root` ("/" for this machine).
     explicit ZYRHardwareQuerySource(std::string root = "/");
 
-    // Rows of "SELECT * FROM Win32_Processor", "Win32_OperatingSystem",
-    // "Win32_PhysicalMemory", "Win32_DiskDrive", "Win32_PerfFormattedData_PerfOS_Memory" or
-    // "Win32_PerfFormattedData_PerfOS_Processor"; false for any other query or when the
-    // files that answer it cannot be read.
+    /// Rows of "SELECT * FROM Win32_Processor", "Win32_OperatingSystem",
+    /// "Win32_PhysicalMemory", "Win32_DiskDrive", "Win32_PerfFormattedData_PerfOS_Memory" or
+    /// "Win32_PerfFormattedData_PerfOS_Processor"; false for any other query or when the
+    /// files that answer it cannot be read.
     [[nodiscard]] bool run(std::string_view query, std::vector<Row>& rows) const;
 
-    // What runs between the two /proc/stat samples of the processor load (a 100 ms sleep).
+    /// What runs between the two /proc/stat samples of the processor load (a 100 ms sleep).
     void setBetweenSamples(std::function<void()> wait);
 
 private:

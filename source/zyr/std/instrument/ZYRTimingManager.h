@@ -1,5 +1,6 @@
-// Fine-grained timing of code sections: named accumulators, scoped stop watches and the
-// calibration of the tick counter they read.
+/// \file
+/// Fine-grained timing of code sections: named accumulators, scoped stop watches and the
+/// calibration of the tick counter they read.
 #pragma once
 
 #include "ZYRStdExport.h"
@@ -8,35 +9,35 @@ namespace ZYRStd {
 
 class ZYRTimeAccumulator;
 
-// Static members only. Initialize() runs before the first stop watch is used.
+/// Static members only. Initialize() runs before the first stop watch is used.
 class ZYRSTD_API ZYRTimingManager {
 public:
     ZYRTimingManager() = delete;
 
-    // Calibrates the construct times and the ticks per second; returns true.
+    /// Calibrates the construct times and the ticks per second; returns true.
     static bool Initialize();
-    // Empties the list of named accumulators.
+    /// Empties the list of named accumulators.
     static void Terminate();
-    // 0 until Initialize() has run.
+    /// 0 until Initialize() has run.
     static long long GetClocksPerSec();
     static long long GetAvgInnerConstructTime();
     static long long GetAvgOuterConstructTime();
-    // Whether ticks come from the processor's invariant time-stamp counter (true) or from
-    // the monotonic clock in nanoseconds.
+    /// Whether ticks come from the processor's invariant time-stamp counter (true) or from
+    /// the monotonic clock in nanoseconds.
     static bool UsesTimeStampCounter();
 
     static void InitializeSurfaceTime();
     static void RecordSurfaceTime(unsigned int, unsigned int, long long);
 
-    // The three measurement lines, measured when one of them is first asked for (the bus
-    // measurement writes 128 MiB, a cost no host should pay at every start-up).
+    /// The three measurement lines, measured when one of them is first asked for (the bus
+    /// measurement writes 128 MiB, a cost no host should pay at every start-up).
     static const char* GetTimerAccuracyLine();
     static const char* GetBusSpeedLine();
     static const char* GetCacheSpeedLine();
 
-    // The named accumulators alive now, in order of construction.
+    /// The named accumulators alive now, in order of construction.
     static unsigned int GetNamedAccumulatorCount();
-    // Null past the end.
+    /// Null past the end.
     static ZYRTimeAccumulator* GetNamedAccumulator(unsigned int index);
 
 private:
@@ -50,13 +51,13 @@ private:
     static long long fAvgOuterConstructTime;
 };
 
-// Sums the ticks spent under its stop watches. Used from one thread at a time.
+/// Sums the ticks spent under its stop watches. Used from one thread at a time.
 class ZYRSTD_API ZYRTimeAccumulator {
 public:
-    // `name` and `file` are not copied: they must outlive the accumulator. A non-empty
-    // name enters the accumulator in the timing manager's list.
+    /// `name` and `file` are not copied: they must outlive the accumulator. A non-empty
+    /// name enters the accumulator in the timing manager's list.
     ZYRTimeAccumulator(const char* name, const char* file, int line);
-    // Leaves the list, so that it never holds a dead accumulator.
+    /// Leaves the list, so that it never holds a dead accumulator.
     ~ZYRTimeAccumulator();
     ZYRTimeAccumulator(const ZYRTimeAccumulator&) = delete;
     ZYRTimeAccumulator& operator=(const ZYRTimeAccumulator&) = delete;
@@ -66,7 +67,7 @@ public:
     int GetSourceLine() const;
     int GetTotalCalls() const;
     long long GetTotalTicks() const;
-    // Total ticks in seconds; 0 before the manager is calibrated.
+    /// Total ticks in seconds; 0 before the manager is calibrated.
     double GetCurrentTotalTime() const;
 
 private:
@@ -81,8 +82,8 @@ private:
     long long fReserved[2] = {};
 };
 
-// Measures one pass of the enclosing scope into an accumulator. Recursive passes on the
-// same accumulator count as calls, but only the outermost one adds its time.
+/// Measures one pass of the enclosing scope into an accumulator. Recursive passes on the
+/// same accumulator count as calls, but only the outermost one adds its time.
 class ZYRSTD_API ZYRStopWatch {
 public:
     explicit ZYRStopWatch(ZYRTimeAccumulator& acc);
@@ -90,7 +91,7 @@ public:
     ZYRStopWatch(const ZYRStopWatch&) = delete;
     ZYRStopWatch& operator=(const ZYRStopWatch&) = delete;
 
-    // The current tick count, ordered after the instructions before it.
+    /// The current tick count, ordered after the instructions before it.
     static void ReadTimeStampCounter32(long long* out);
 
 private:
@@ -99,9 +100,9 @@ private:
     long long fInnerConstructTime;
 };
 
-// The library's millisecond clock, the one trace records carry.
+/// The library's millisecond clock, the one trace records carry.
 ZYRSTD_API int Clock();
-// Sleeps the calling thread for `milliseconds` (nothing for 0 or less).
+/// Sleeps the calling thread for `milliseconds` (nothing for 0 or less).
 ZYRSTD_API void ThreadSleep(int milliseconds);
 
 } // namespace ZYRStd

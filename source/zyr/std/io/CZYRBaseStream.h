@@ -1,4 +1,5 @@
-// Value wrappers over the stream interfaces: CZYRBaseStream, CZYRFStream, CZYRMemMapFStream.
+/// \file
+/// Value wrappers over the stream interfaces: CZYRBaseStream, CZYRFStream, CZYRMemMapFStream.
 #pragma once
 
 #include "IZYRStream.h"
@@ -11,15 +12,15 @@ namespace ZYRStd {
 class CZYRFileName;
 class CZYRUniString;
 
-// Holds one reference to a stream and forwards every call to it. Forwarding on an empty
-// wrapper raises kZYRErrorInvalidObject; isValid and isShared test for emptiness.
+/// Holds one reference to a stream and forwards every call to it. Forwarding on an empty
+/// wrapper raises kZYRErrorInvalidObject; isValid and isShared test for emptiness.
 class ZYRSTD_API CZYRBaseStream : public CZYRClientBase {
 public:
     CZYRBaseStream() = default;
     CZYRBaseStream(const CZYRBaseStream& other) = default;
     CZYRBaseStream& operator=(const CZYRBaseStream& other) = default;
     CZYRBaseStream(const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& stream);
-    // A memory stream from the installed file system.
+    /// A memory stream from the installed file system.
     CZYRBaseStream(unsigned int mode, unsigned int capacity, void* buffer);
     ~CZYRBaseStream() override;
 
@@ -48,14 +49,14 @@ private:
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> stream_;
 };
 
-// A second reference, typed as a file stream, to the same object.
+/// A second reference, typed as a file stream, to the same object.
 class ZYRSTD_API CZYRFStream : public CZYRBaseStream {
 public:
     CZYRFStream() = default;
     CZYRFStream(const CZYRFStream& other) = default;
     CZYRFStream& operator=(const CZYRFStream& other) = default;
     CZYRFStream(const CZYRSmartZYRRefPtr<ZYRStreams::IZYRFStream>& stream);
-    // A file that cannot be opened still gives a stream, whose isOpen is false.
+    /// A file that cannot be opened still gives a stream, whose isOpen is false.
     CZYRFStream(const CZYRFileName& name, unsigned int mode);
     ~CZYRFStream() override;
 
@@ -70,7 +71,7 @@ private:
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRFStream> fstream_;
 };
 
-// A third reference, typed as a mapped file stream.
+/// A third reference, typed as a mapped file stream.
 class ZYRSTD_API CZYRMemMapFStream : public CZYRFStream {
 public:
     CZYRMemMapFStream() = default;

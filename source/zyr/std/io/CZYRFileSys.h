@@ -1,4 +1,5 @@
-// The installed file system as static calls, and the file-name value class.
+/// \file
+/// The installed file system as static calls, and the file-name value class.
 #pragma once
 
 #include "IZYRFileName.h"
@@ -12,16 +13,16 @@
 
 namespace ZYRStd {
 
-// One counted reference to a host file-name object. Built from text, the object comes
-// from the host's factory (kZYRErrorFatal when none is installed).
+/// One counted reference to a host file-name object. Built from text, the object comes
+/// from the host's factory (kZYRErrorFatal when none is installed).
 class ZYRSTD_API CZYRFileName : public CZYRClientBase {
 public:
     CZYRFileName() = default;
     CZYRFileName(const CZYRFileName& other) = default;
     CZYRFileName& operator=(const CZYRFileName& other) = default;
-    // `addRef` false adopts the caller's reference.
+    /// `addRef` false adopts the caller's reference.
     CZYRFileName(ZYRFileName::IZYRFileName* name, bool addRef);
-    // Narrow text is path bytes: UTF-8, and any other byte kept as it is.
+    /// Narrow text is path bytes: UTF-8, and any other byte kept as it is.
     CZYRFileName(const char* path);
     CZYRFileName(const CZYRWString& path);
     CZYRFileName(const CZYRUniString& path);
@@ -34,23 +35,23 @@ public:
     eZYRPathSpecType GetPathSpecDefaultType() const;
     bool pathSpecTypeSupported(eZYRPathSpecType type) const;
     const void* getPathSpec(eZYRPathSpecType type, unsigned int* length) const;
-    // True also for a wrapper without an object.
+    /// True also for a wrapper without an object.
     bool isEmpty() const;
-    // A copy of the full path; empty when the object has none.
+    /// A copy of the full path; empty when the object has none.
     CZYRWString getWStringPath() const;
 
-    // The wrapped object, without a reference.
+    /// The wrapped object, without a reference.
     operator ZYRFileName::IZYRFileName*() const { return name_.get(); }
 
 private:
-    // The object, or kZYRErrorInvalidObject for a wrapper without one.
+    /// The object, or kZYRErrorInvalidObject for a wrapper without one.
     ZYRFileName::IZYRFileName& object() const;
 
     CZYRSmartZYRRefPtr<ZYRFileName::IZYRFileName> name_;
 };
 
-// Every call goes to the installed file system; without one each raises
-// kZYRErrorFileSystemNotInitialized.
+/// Every call goes to the installed file system; without one each raises
+/// kZYRErrorFileSystemNotInitialized.
 class ZYRSTD_API CZYRFileSys {
 public:
     static CZYRSmartZYRRefPtr<ZYRStreams::IZYRFStream>

@@ -1,4 +1,5 @@
-// The memory stream: a fixed-capacity stream over its own bytes or a caller's buffer.
+/// \file
+/// The memory stream: a fixed-capacity stream over its own bytes or a caller's buffer.
 #pragma once
 
 #include "IZYRStream.h"
@@ -9,14 +10,14 @@
 
 namespace ZYRFileSys {
 
-// Never grows: a write past the capacity fails and changes nothing. The access bits that
-// only concern files are stored and ignored.
+/// Never grows: a write past the capacity fails and changes nothing. The access bits that
+/// only concern files are stored and ignored.
 class ZYRSTD_API IImpZYRMemStream : public ZYRStreams::IZYRStream,
                                     public ZYRStd::CZYRClientBase,
                                     private ZYRStd::CZYRPolicyNoCopy {
 public:
-    // A null `buffer` with a capacity allocates the bytes; a caller's buffer is used in
-    // place, never freed, and is the content when the mode is readable without truncate.
+    /// A null `buffer` with a capacity allocates the bytes; a caller's buffer is used in
+    /// place, never freed, and is the content when the mode is readable without truncate.
     IImpZYRMemStream(unsigned int mode, unsigned int capacity, void* buffer);
     ~IImpZYRMemStream() override;
 
@@ -35,13 +36,13 @@ public:
     unsigned long long getCapacity() override { return capacity_; }
     unsigned int getAccessMode() override { return access_.mode(); }
 
-    // The bytes in use (the caller's or our own).
+    /// The bytes in use (the caller's or our own).
     unsigned char* data() const { return data_; }
 
 private:
     unsigned int capacity_;
     unsigned int position_ = 0;
-    unsigned int eof_ = 0; // invariant: position_ <= capacity_ and eof_ <= capacity_
+    unsigned int eof_ = 0; ///< invariant: position_ <= capacity_ and eof_ <= capacity_
     CStreamAccess access_;
     ZYRStd::CZYRMemBuffer<unsigned char> ownBuffer_;
     unsigned char* data_ = nullptr;

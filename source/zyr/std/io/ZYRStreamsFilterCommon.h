@@ -1,8 +1,9 @@
-// Pieces shared by the text filters over streams (ASCII85, ASCIIHex): the line an encoder
-// builds and sends to its target, the buffered input a decoder reads from its source, the
-// decoding failure that every later read raises again, and the recording of errors in an
-// error status. Each filter passes its own texts, source name and line, so its errors keep
-// naming its own class.
+/// \file
+/// Pieces shared by the text filters over streams (ASCII85, ASCIIHex): the line an encoder
+/// builds and sends to its target, the buffered input a decoder reads from its source, the
+/// decoding failure that every later read raises again, and the recording of errors in an
+/// error status. Each filter passes its own texts, source name and line, so its errors keep
+/// naming its own class.
 #pragma once
 
 #include <cstddef>
@@ -17,10 +18,10 @@
 
 namespace ZYRStd::StreamsFilterCommon {
 
-// Runs `call` (a read or a write), recording a failure in `err` and returning 0 instead of
-// throwing. The call runs whatever `err` already holds: an encoder's data must not be
-// dropped because of some earlier, unrelated failure. `failed`, `source` and `line`
-// describe a failure that is not an error of the library.
+/// Runs `call` (a read or a write), recording a failure in `err` and returning 0 instead of
+/// throwing. The call runs whatever `err` already holds: an encoder's data must not be
+/// dropped because of some earlier, unrelated failure. `failed`, `source` and `line`
+/// describe a failure that is not an error of the library.
 template <class Call>
 unsigned int recordingErrors(ZYRPublic::I_Error& err, const char* failed, const char* source,
                              int line, Call&& call) {
@@ -36,7 +37,7 @@ unsigned int recordingErrors(ZYRPublic::I_Error& err, const char* failed, const 
     return 0;
 }
 
-// For destructors: closes `filter`, dropping any error, which has no one to report to.
+/// For destructors: closes `filter`, dropping any error, which has no one to report to.
 template <class Filter> void closeQuietly(Filter& filter) noexcept {
     try {
         filter.close();
@@ -44,15 +45,15 @@ template <class Filter> void closeQuietly(Filter& filter) noexcept {
     }
 }
 
-// The line an encoder fills: the prefix, at most kLineChars encoded characters and "\r\n",
-// sent to the target as a whole. The end marker and the prefix are kept for the filter.
+/// The line an encoder fills: the prefix, at most kLineChars encoded characters and "\r\n",
+/// sent to the target as a whole. The end marker and the prefix are kept for the filter.
 struct EncodedLines {
     static constexpr unsigned int kLineChars = 80;
     static constexpr unsigned int kMaxEod = 14;
     static constexpr unsigned int kMaxPrefix = 2;
 
-    // `eod` null means `defaultEod`, `prefix` null means none; a longer one than allowed
-    // raises kZYRErrorBadParam with `eodTooLong` or `prefixTooLong`, checked in that order.
+    /// `eod` null means `defaultEod`, `prefix` null means none; a longer one than allowed
+    /// raises kZYRErrorBadParam with `eodTooLong` or `prefixTooLong`, checked in that order.
     EncodedLines(const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& target, const char* prefix,
                  const char* eod, const char* defaultEod, const char* eodTooLong,
                  const char* prefixTooLong, const char* source, int line)
@@ -72,7 +73,7 @@ struct EncodedLines {
         pos = prefixLength;
     }
 
-    // Raises kZYRErrorFileOpFailed with `message` once the target is gone.
+    /// Raises kZYRErrorFileOpFailed with `message` once the target is gone.
     void requireTarget(const char* message, const char* source, int line) const {
         if (!target)
             throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, message, source, line);
@@ -80,7 +81,7 @@ struct EncodedLines {
 
     unsigned int room() const { return kLineChars - length; }
     char* next() { return line + pos; }
-    // Counts n characters just placed at next().
+    /// Counts n characters just placed at next().
     void advance(unsigned int n) {
         length += n;
         pos += n;
@@ -90,8 +91,8 @@ struct EncodedLines {
         advance(n);
     }
 
-    // Completes the line and writes it to the target, starting a new one; a failing write
-    // drops the target.
+    /// Completes the line and writes it to the target, starting a new one; a failing write
+    /// drops the target.
     void emit() {
         std::memcpy(line, prefix, prefixLength);
         line[pos] = '\r';
@@ -108,8 +109,8 @@ struct EncodedLines {
     }
 
     char line[kMaxPrefix + kLineChars + 2] = {};
-    unsigned int pos = 0;    // next free byte of line
-    unsigned int length = 0; // encoded characters in line
+    unsigned int pos = 0;    ///< next free byte of line
+    unsigned int length = 0; ///< encoded characters in line
     char eod[kMaxEod + 1] = {};
     unsigned int eodLength = 0;
     char prefix[kMaxPrefix + 1] = {};
@@ -117,7 +118,7 @@ struct EncodedLines {
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> target;
 };
 
-// The encoded text a decoder reads from its source, a chunk at a time.
+/// The encoded text a decoder reads from its source, a chunk at a time.
 struct DecodeInput {
     static constexpr unsigned int kChunk = 64 * 1024;
 
@@ -126,13 +127,13 @@ struct DecodeInput {
         buffer.grow(kChunk);
     }
 
-    // Raises kZYRErrorFileOpFailed with `message` once the source is gone.
+    /// Raises kZYRErrorFileOpFailed with `message` once the source is gone.
     void requireSource(const char* message, const char* sourceName, int line) const {
         if (!source)
             throw CZYRError(ZYRPublic::kZYRErrorFileOpFailed, message, sourceName, line);
     }
 
-    // Reads the next chunk; false at the end of the source.
+    /// Reads the next chunk; false at the end of the source.
     bool fill() {
         offset += length;
         pos = 0;
@@ -144,19 +145,19 @@ struct DecodeInput {
     CZYRMemBuffer<unsigned char> buffer;
     unsigned int pos = 0;
     unsigned int length = 0;
-    unsigned long long offset = 0; // of buffer[0] in the encoded data
+    unsigned long long offset = 0; ///< of buffer[0] in the encoded data
 };
 
-// A decoding failure, kept so that every later read raises it again.
+/// A decoding failure, kept so that every later read raises it again.
 struct DecodeFailure {
-    const char* what = nullptr; // "<filter>: <what>", a literal; null: none
-    int character = -1;         // the offending byte, or -1
+    const char* what = nullptr; ///< "<filter>: <what>", a literal; null: none
+    int character = -1;         ///< the offending byte, or -1
     unsigned long long offset = 0;
     int line = 0;
 
-    // Raises kZYRErrorInvalidData with `what`. Errors do not own their texts and outlive
-    // the filter and its thread, so the text is a literal; the offending byte and the
-    // offset stay with the filter for its caller to ask.
+    /// Raises kZYRErrorInvalidData with `what`. Errors do not own their texts and outlive
+    /// the filter and its thread, so the text is a literal; the offending byte and the
+    /// offset stay with the filter for its caller to ask.
     [[noreturn]] void raise(const char* source) const {
         throw CZYRError(ZYRPublic::kZYRErrorInvalidData, what, source, line);
     }

@@ -1,4 +1,5 @@
-// Client identifiers and the record of which clients acknowledged a notification.
+/// \file
+/// Client identifiers and the record of which clients acknowledged a notification.
 #pragma once
 
 #include <functional>
@@ -10,7 +11,7 @@
 
 namespace ZYRStd {
 
-// No lock of its own: its owner serialises access.
+/// No lock of its own: its owner serialises access.
 class ZYRSTD_API CZYRClientRegistry : public CZYRClientBase {
 public:
     CZYRClientRegistry() = default;
@@ -20,7 +21,7 @@ public:
 
     void registerClient(unsigned int id) { clients_[id] = false; }
     void markNotification(unsigned int id) { clients_[id] = true; }
-    // Throws kZYRErrorBadParam for an identifier never registered or marked.
+    /// Throws kZYRErrorBadParam for an identifier never registered or marked.
     bool notificationReceived(unsigned int id) const;
     bool allNotificationsReceived() const;
 
@@ -31,7 +32,7 @@ private:
 
 class ZYRSTD_API CZYRClientRegistrar : public CZYRClientBase {
 public:
-    // 1 first; safe from any thread. The argument is not used.
+    /// 1 first; safe from any thread. The argument is not used.
     static unsigned int makeID(const void* client);
 
 private:

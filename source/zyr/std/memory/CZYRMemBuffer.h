@@ -1,4 +1,5 @@
-// A growable scratch buffer of elements whose storage comes from the dynamic memory manager.
+/// \file
+/// A growable scratch buffer of elements whose storage comes from the dynamic memory manager.
 #pragma once
 
 #include <type_traits>
@@ -9,7 +10,7 @@
 
 namespace ZYRStd {
 
-// Allocation policy: blocks from the dynamic memory manager under one client tag.
+/// Allocation policy: blocks from the dynamic memory manager under one client tag.
 template <class T> struct CZYRMemBufferAlloc {
     static constexpr const char* kClientName = "CZYRMemBufferAlloc";
     static T* allocate(unsigned int count) {
@@ -26,7 +27,7 @@ template <class T> struct CZYRMemBufferAlloc {
     static void free(T* p) { ZYRDMMFree(p, kClientName, nullptr); }
 };
 
-// The bound error of checked element access.
+/// The bound error of checked element access.
 [[noreturn]] inline void throwInvalidMemBufferIndex(int line) {
     throw CZYRError(ZYRPublic::kZYRErrorBadParam, "invalid index", "source/zyr/std/CZYRMemBuffer",
                     line);
@@ -44,7 +45,7 @@ public:
             Alloc::free(data_);
     }
 
-    // Replaces the block by one of `count` elements; the old contents are discarded.
+    /// Replaces the block by one of `count` elements; the old contents are discarded.
     void grow(unsigned int count) {
         T* fresh = count ? Alloc::allocate(count) : nullptr;
         if (data_)
@@ -52,7 +53,7 @@ public:
         data_ = fresh;
         count_ = count;
     }
-    // Checked access: throws kZYRErrorBadParam "invalid index" past the end.
+    /// Checked access: throws kZYRErrorBadParam "invalid index" past the end.
     T& operator[](unsigned int index) {
         if (index >= count_)
             throwInvalidMemBufferIndex(__LINE__);

@@ -1,4 +1,5 @@
-// The standard-container allocator of the library, over the dynamic memory manager.
+/// \file
+/// The standard-container allocator of the library, over the dynamic memory manager.
 #pragma once
 
 #include <algorithm>
@@ -31,9 +32,9 @@ public:
     template <class U> bool operator==(const CZYRStdAllocator<U>&) const noexcept { return true; }
 
 private:
-    // The name the memory manager's log shows for these blocks.
+    /// The name the memory manager's log shows for these blocks.
     static constexpr const char* kClientName = "CZYRSTDALLOCATOR";
-    // The record of a failed allocation, as hosts have always seen it.
+    /// The record of a failed allocation, as hosts have always seen it.
     static constexpr const char* kSource = "source/zyr/std/CZYRStdAllocator";
     static constexpr int kAllocationLine = 94;
 };

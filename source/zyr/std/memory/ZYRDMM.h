@@ -1,5 +1,6 @@
-// The dynamic memory manager: allocation that makes the renderer catch up and asks
-// flushable clients for memory before it fails, and the TUMA and JOV client accounting.
+/// \file
+/// The dynamic memory manager: allocation that makes the renderer catch up and asks
+/// flushable clients for memory before it fails, and the TUMA and JOV client accounting.
 #pragma once
 
 #include "ZYRStdExport.h"
@@ -10,21 +11,21 @@ namespace ZYRStd {
 
 class I_VariableSizeAllocator;
 
-// Selects which counters the DMM_GetCurr... queries read.
+/// Selects which counters the DMM_GetCurr... queries read.
 enum eZYRMemoryClientType : int {
-    eZYRMemoryClientInterp = 1,   // the interpreter thread only
-    eZYRMemoryClientOthers = 256, // every thread but the interpreter
-    eZYRMemoryClientAll = 0,      // any other value: every thread
+    eZYRMemoryClientInterp = 1,   ///< the interpreter thread only
+    eZYRMemoryClientOthers = 256, ///< every thread but the interpreter
+    eZYRMemoryClientAll = 0,      ///< any other value: every thread
 };
 
-// `requester` is the caller's I_FlushableMemoryClient*, never asked to flush for itself.
-// With a sub-allocator, `actualSize` receives the bytes it took from its supplier.
+/// `requester` is the caller's I_FlushableMemoryClient*, never asked to flush for itself.
+/// With a sub-allocator, `actualSize` receives the bytes it took from its supplier.
 [[nodiscard]] ZYRSTD_API void* ZYRDMMMalloc(unsigned int size, const char* clientName,
                                             I_VariableSizeAllocator* subAllocator,
                                             unsigned int* actualSize, void* requester,
                                             eFlushMemorySeverity severity);
 ZYRSTD_API void ZYRDMMFree(void* p, const char* clientName, I_VariableSizeAllocator* subAllocator);
-// No recovery for a resize; the sub-allocator argument is not used.
+/// No recovery for a resize; the sub-allocator argument is not used.
 [[nodiscard]] ZYRSTD_API void* ZYRDMMReAlloc(void* p, unsigned int size, const char* clientName,
                                              I_VariableSizeAllocator* subAllocator);
 [[nodiscard]] ZYRSTD_API void* ZYRDMMVirtualMemAlloc(unsigned int size, const char* clientName,
@@ -37,7 +38,7 @@ ZYRSTD_API bool ZYRFlushMemoryThreadSafe(I_FlushableMemoryClient* requester,
                                          unsigned int bytesNeeded, eFlushMemorySeverity severity);
 ZYRSTD_API bool ZYRSynchronizeRendererThread(bool wait);
 ZYRSTD_API bool ArrangeMemoryBySyncRendererThread(unsigned int bytesNeeded, bool wait);
-// `queue` is the engine's ZYRPublic::I_SurfaceQueue*.
+/// `queue` is the engine's ZYRPublic::I_SurfaceQueue*.
 ZYRSTD_API void RegisterSurfaceQueueInstance(void* queue);
 ZYRSTD_API void RegisterFlushableMemoryClient(I_FlushableMemoryClient* client, bool threadSafe);
 ZYRSTD_API void UnregisterFlushableMemoryClient(I_FlushableMemoryClient* client);
@@ -45,7 +46,7 @@ ZYRSTD_API void GetClientsMemoryUsedAndMemoryLimit(unsigned long long& flushable
                                                    unsigned long long& limit,
                                                    unsigned long long& used);
 
-// The PDF library client; `ctx` is accepted and not used.
+/// The PDF library client; `ctx` is accepted and not used.
 [[nodiscard]] ZYRSTD_API void* DMM_TUMAAlloc(void* ctx, unsigned int size);
 ZYRSTD_API void DMM_TUMAFree(void* ctx, void* p);
 [[nodiscard]] ZYRSTD_API void* DMM_TUMAReAlloc(void* ctx, void* p, unsigned int size);
