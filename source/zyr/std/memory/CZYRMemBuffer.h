@@ -12,7 +12,9 @@ namespace ZYRStd {
 
 /// Allocation policy: blocks from the dynamic memory manager under one client tag.
 template <class T> struct CZYRMemBufferAlloc {
-    static constexpr const char* kClientName = "CZYRMemBufferAlloc";
+    static constexpr const char* kClientName =
+        "CZYRMemBufferAlloc"; ///< the name the DMM log shows for these blocks
+    /// Storage for `count` elements; throws kZYRErrorOutOfMemory on failure.
     static T* allocate(unsigned int count) {
         const unsigned long long bytes = static_cast<unsigned long long>(count) * sizeof(T);
         void* p = bytes > 0xFFFFFFFFull
@@ -24,6 +26,7 @@ template <class T> struct CZYRMemBufferAlloc {
                             "source/zyr/std/CZYRMemBuffer", __LINE__);
         return static_cast<T*>(p);
     }
+    /// Gives storage from allocate back.
     static void free(T* p) { ZYRDMMFree(p, kClientName, nullptr); }
 };
 
@@ -33,6 +36,8 @@ template <class T> struct CZYRMemBufferAlloc {
                     line);
 }
 
+/// A scratch array of trivially copyable elements, storage from `Alloc`; sole owner
+/// of its block, not copyable, one thread at a time.
 template <class T, class Alloc> class CZYRBaseMemBuffer : public CZYRClientBase {
     static_assert(std::is_trivially_copyable_v<T>, "elements are raw storage");
 
@@ -59,13 +64,17 @@ public:
             throwInvalidMemBufferIndex(__LINE__);
         return data_[index];
     }
+    /// Checked access: throws kZYRErrorBadParam "invalid index" past the end.
     const T& operator[](unsigned int index) const {
         if (index >= count_)
             throwInvalidMemBufferIndex(__LINE__);
         return data_[index];
     }
+    /// The number of elements.
     unsigned int count() const { return count_; }
+    /// The elements, borrowed; null when empty.
     T* data() { return data_; }
+    /// The elements, borrowed; null when empty.
     const T* data() const { return data_; }
 
 private:
@@ -73,6 +82,7 @@ private:
     T* data_ = nullptr;
 };
 
+/// The scratch buffer over the dynamic memory manager ("CZYRMemBufferAlloc" in its log).
 template <class T> class CZYRMemBuffer : public CZYRBaseMemBuffer<T, CZYRMemBufferAlloc<T>> {};
 
 } // namespace ZYRStd

@@ -10,13 +10,19 @@
 
 namespace ZYRStd {
 
+/// Allocator for standard containers: blocks from the dynamic memory manager under the
+/// client name "CZYRSTDALLOCATOR", so they count against the limit and may trigger
+/// flushes. Stateless; any thread.
 template <class T> class CZYRStdAllocator {
 public:
+    /// The element type.
     using value_type = T;
 
     CZYRStdAllocator() noexcept = default;
+    /// Rebinding copy: stateless, so nothing to copy.
     template <class U> CZYRStdAllocator(const CZYRStdAllocator<U>&) noexcept {}
 
+    /// Storage for `n` elements; throws CZYRBadAlloc on failure.
     T* allocate(std::size_t n) {
         const std::size_t bytes = std::max<std::size_t>(n, 1) * sizeof(T);
         void* p = bytes > 0xFFFFFFFFu
@@ -27,8 +33,10 @@ public:
             throw CZYRBadAlloc("Mem error in ZYRStdAllocator", kSource, kAllocationLine);
         return static_cast<T*>(p);
     }
+    /// Gives storage from allocate back.
     void deallocate(T* p, std::size_t) noexcept { ZYRDMMFree(p, kClientName, nullptr); }
 
+    /// Always true: any instance frees what another allocated.
     template <class U> bool operator==(const CZYRStdAllocator<U>&) const noexcept { return true; }
 
 private:

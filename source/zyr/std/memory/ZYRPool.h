@@ -15,6 +15,7 @@ namespace ZYRStd {
 /// least 8-byte aligned. When either procedure is null, both default to VirtualMemAlloc /
 /// VirtualMemFree, so that a piece is never given back to a procedure that did not make it.
 using tZYRPoolAllocProc = void* (*)(unsigned int bytes, void* userData);
+/// Gives back a piece from the matching tZYRPoolAllocProc.
 using tZYRPoolFreeProc = void (*)(void* block, void* userData);
 
 } // namespace ZYRStd
@@ -58,9 +59,13 @@ public:
     unsigned int GetPtrSize(void* p) const;
     /// A page of `bytes` usable bytes laid out as one free block, counted in the held bytes.
     void* allocVarPage(unsigned int bytes);
+    /// Gives a page of allocVarPage back to the supplier.
     void freeVarPage(void* page);
+    /// The bytes now taken from the supplier.
     unsigned long long getVarPageCurrAllocAmount() const { return held_; }
+    /// The most bytes ever taken from the supplier at once.
     unsigned long long getVarPagePeakAllocAmount() const { return peakHeld_; }
+    /// The usable bytes of a page.
     unsigned int pageSize() const { return pageSize_; }
     /// Everything now taken from the supplier (the held bytes).
     unsigned long long totalAllocatedMemory() const { return held_; }
@@ -68,9 +73,12 @@ public:
     void RemoveBlock(BlkHeader* header);
     /// Obtains the first page as the reserved page (construction does this).
     void InitializePages();
+    /// Kept for callers; logs nothing.
     void LogAllocFailure(unsigned int) {}
+    /// Kept for callers; throws nothing.
     void ThrowBadAlloc() {}
 
+    /// The name given at construction, borrowed.
     const char* name() const { return name_; }
     /// Debug check of the tree, the bins, the same-size lists, every page's boundary tags and
     /// the held bytes. Null when all is sound, else what is broken.
@@ -142,9 +150,12 @@ public:
     DMMPoolBlock* GetPool(int* slotSize);
     /// A slot outside every pool is ignored.
     void FreePool(DMMPoolBlock* slot);
+    /// Lays out a fresh pool of `bytes` bytes as free slots.
     void SetupPool(DMMPoolControl* pool, unsigned int bytes);
 
+    /// The bytes now taken from the supplier.
     unsigned long long heldBytes() const { return held_; }
+    /// The most bytes ever taken from the supplier at once.
     unsigned long long peakHeldBytes() const { return peakHeld_; }
 
 private:
@@ -166,6 +177,8 @@ namespace ZYRStd {
 /// and at least 8 bytes, since a free element holds the free-list link.
 class ZYRSTD_API ZYRFixedSizePool : public CZYRClientBase {
 public:
+    /// A pool of `elementSize`-byte elements (rounded up to 8), `elementsPerChunk` to a
+    /// chunk. Not locked: one thread at a time.
     ZYRFixedSizePool(unsigned int elementSize, unsigned int elementsPerChunk);
     ~ZYRFixedSizePool() override;
     ZYRFixedSizePool(const ZYRFixedSizePool&) = delete;
@@ -180,6 +193,7 @@ public:
     /// Gives every chunk back; elements handed out become invalid.
     void FlushAll();
 
+    /// The element size after rounding.
     unsigned int elementSize() const { return elementSize_; }
 
 private:
@@ -197,6 +211,8 @@ private:
 /// once.
 class ZYRSTD_API ZYRStdAllocatorFixedSizePool : public CZYRClientBase {
 public:
+    /// A pool of `elementSize`-byte elements, about `elementsPerPage` to a page. Not locked:
+    /// one thread at a time.
     ZYRStdAllocatorFixedSizePool(unsigned int elementSize, unsigned int elementsPerPage);
     ~ZYRStdAllocatorFixedSizePool() override;
     ZYRStdAllocatorFixedSizePool(const ZYRStdAllocatorFixedSizePool&) = delete;
@@ -206,6 +222,7 @@ public:
     void* Alloc(unsigned int count);
     /// Throws kZYRErrorOutOfMemory instead of returning null.
     void* SureAlloc(unsigned int count);
+    /// Gives every page back; runs handed out become invalid.
     void FlushAll();
 
 private:
