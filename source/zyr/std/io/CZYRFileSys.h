@@ -18,23 +18,32 @@ namespace ZYRStd {
 class ZYRSTD_API CZYRFileName : public CZYRClientBase {
 public:
     CZYRFileName() = default;
+    /// Shares the name object: one more reference.
     CZYRFileName(const CZYRFileName& other) = default;
+    /// Shares the other's name object and releases the one held before.
     CZYRFileName& operator=(const CZYRFileName& other) = default;
     /// `addRef` false adopts the caller's reference.
     CZYRFileName(ZYRFileName::IZYRFileName* name, bool addRef);
     /// Narrow text is path bytes: UTF-8, and any other byte kept as it is.
     CZYRFileName(const char* path);
+    /// A name for the UTF-16 `path`, made by the host's factory.
     CZYRFileName(const CZYRWString& path);
+    /// A name for `path`, made by the host's factory.
     CZYRFileName(const CZYRUniString& path);
     ~CZYRFileName() override;
 
+    /// A new name object with the same path (ZYRFileName::IZYRFileName::clone).
     CZYRFileName clone() const;
+    /// Forwards to the same operation of ZYRFileName::IZYRFileName; throws
+    /// kZYRErrorInvalidObject on an empty wrapper.
+    ///@{
     CZYRWString getFileDirPath() const;
     CZYRString getFileDirPathInZYRString() const;
     CZYRWString getFileName() const;
     eZYRPathSpecType GetPathSpecDefaultType() const;
     bool pathSpecTypeSupported(eZYRPathSpecType type) const;
     const void* getPathSpec(eZYRPathSpecType type, unsigned int* length) const;
+    ///@}
     /// True also for a wrapper without an object.
     bool isEmpty() const;
     /// A copy of the full path; empty when the object has none.
@@ -54,6 +63,9 @@ private:
 /// kZYRErrorFileSystemNotInitialized.
 class ZYRSTD_API CZYRFileSys {
 public:
+    /// Forwards to the same operation of the installed ZYRFileSys::IZYRFileSys (see there
+    /// for what each does and raises); the streams come with one reference for the caller.
+    ///@{
     static CZYRSmartZYRRefPtr<ZYRStreams::IZYRFStream>
     createFileStream(const CZYRFileName& name, unsigned int mode, bool viaHost);
     static CZYRSmartZYRRefPtr<ZYRStreams::IZYRFStream>
@@ -72,6 +84,7 @@ public:
     static bool enumDirectory(const CZYRFileName& dir, ZYRFileSys::IDirEnumCBProc& cb);
     static const CZYRUniString& getTempDirName();
     static const CZYRUniString& getDLCacheDirName();
+    ///@}
 };
 
 } // namespace ZYRStd

@@ -22,7 +22,9 @@ public:
     CZYRStreamFilterASCII85(const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& target,
                             const char* prefix = nullptr, const char* eod = nullptr,
                             bool allowZ = true);
+    /// Copies the encoder's state; both copies then write to the same target.
     CZYRStreamFilterASCII85(const CZYRStreamFilterASCII85& other) = default;
+    /// Copies the encoder's state; both copies then write to the same target.
     CZYRStreamFilterASCII85& operator=(const CZYRStreamFilterASCII85& other) = default;
     /// Closes; an error of that last write is dropped (call close() to see it).
     ~CZYRStreamFilterASCII85() override;
@@ -38,7 +40,9 @@ public:
     /// the target. Writes nothing when no byte was ever written; a second close does nothing.
     void close();
 
+    /// The filter's name.
     const char* getFilterName() const { return "ASCII85"; }
+    /// The target stream, with one more reference; empty after close.
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getTargetStream() const { return lines_.target; }
 
 private:
@@ -61,7 +65,9 @@ private:
 /// encoded data and the offending byte are kept by the filter.
 class ZYRSTD_API CZYRStreamFilterASCII85Decode : public CZYRClientBase {
 public:
+    /// Decodes what it reads from `source` (one more reference held until close).
     explicit CZYRStreamFilterASCII85Decode(
+        /// Decodes what it reads from `source` (one more reference held until close).
         const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& source);
     CZYRStreamFilterASCII85Decode(const CZYRStreamFilterASCII85Decode&) = delete;
     CZYRStreamFilterASCII85Decode& operator=(const CZYRStreamFilterASCII85Decode&) = delete;
@@ -69,17 +75,21 @@ public:
 
     /// Up to size * count decoded bytes; fewer only at the end of the data, then 0.
     unsigned int read(void* buf, unsigned int size, unsigned int count);
+    /// The same, recording a failure in `err` and returning 0.
     unsigned int read(void* buf, unsigned int size, unsigned int count, ZYRPublic::I_Error& err);
     /// True once the end of the data has been reached and every byte handed out.
     bool isAtEOD() const { return done_ && outPos_ == outLength_; }
     /// Drops the source; later reads raise kZYRErrorFileOpFailed.
     void close() { input_.source.reset(); }
 
+    /// The filter's name.
     const char* getFilterName() const { return "ASCII85Decode"; }
+    /// The source stream, with one more reference; empty after close.
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return input_.source; }
     /// After a decoding error: its offset in the encoded data, and the offending byte (-1
     /// when the fault is not one byte's).
     unsigned long long getFailureOffset() const { return failure_.offset; }
+    /// After a decoding error: the offending byte, -1 when the fault is not one byte's.
     int getFailureCharacter() const { return failure_.character; }
 
 private:

@@ -20,7 +20,9 @@ public:
     /// longer ones raise kZYRErrorBadParam.
     CZYRStreamFilterASCIIHEX(const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& target,
                              const char* prefix = nullptr, const char* eod = nullptr);
+    /// Copies the encoder's state; both copies then write to the same target.
     CZYRStreamFilterASCIIHEX(const CZYRStreamFilterASCIIHEX& other) = default;
+    /// Copies the encoder's state; both copies then write to the same target.
     CZYRStreamFilterASCIIHEX& operator=(const CZYRStreamFilterASCIIHEX& other) = default;
     /// Closes; an error of that last write is dropped (call close() to see it).
     ~CZYRStreamFilterASCIIHEX() override;
@@ -36,7 +38,9 @@ public:
     /// the target; a second close does nothing.
     void close();
 
+    /// The filter's name.
     const char* getFilterName() const { return "ASCIIHEX"; }
+    /// The target stream, with one more reference; empty after close.
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getTargetStream() const { return lines_.target; }
 
     /// An upper estimate of the encoded size of n bytes, for sizing a buffer; saturates at
@@ -55,7 +59,9 @@ private:
 /// offset in the encoded data and the offending byte are kept by the filter.
 class ZYRSTD_API CZYRStreamFilterASCIIHEXDecode : public CZYRClientBase {
 public:
+    /// Decodes what it reads from `source` (one more reference held until close).
     explicit CZYRStreamFilterASCIIHEXDecode(
+        /// Decodes what it reads from `source` (one more reference held until close).
         const CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>& source);
     CZYRStreamFilterASCIIHEXDecode(const CZYRStreamFilterASCIIHEXDecode&) = delete;
     CZYRStreamFilterASCIIHEXDecode& operator=(const CZYRStreamFilterASCIIHEXDecode&) = delete;
@@ -63,16 +69,21 @@ public:
 
     /// Up to size * count decoded bytes; fewer only at the end of the data, then 0.
     unsigned int read(void* buf, unsigned int size, unsigned int count);
+    /// The same, recording a failure in `err` and returning 0.
     unsigned int read(void* buf, unsigned int size, unsigned int count, ZYRPublic::I_Error& err);
+    /// True once the end of the data has been reached.
     bool isAtEOD() const { return done_; }
     /// Drops the source; later reads raise kZYRErrorFileOpFailed.
     void close() { input_.source.reset(); }
 
+    /// The filter's name.
     const char* getFilterName() const { return "ASCIIHexDecode"; }
+    /// The source stream, with one more reference; empty after close.
     CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream> getSourceStream() const { return input_.source; }
     /// After a decoding error: its offset in the encoded data, and the offending byte (-1
     /// when the fault is not one byte's).
     unsigned long long getFailureOffset() const { return failure_.offset; }
+    /// After a decoding error: the offending byte, -1 when the fault is not one byte's.
     int getFailureCharacter() const { return failure_.character; }
 
 private:

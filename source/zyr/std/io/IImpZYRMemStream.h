@@ -22,9 +22,13 @@ public:
     ~IImpZYRMemStream() override;
 
     void reOpen(unsigned int mode) override;
+    /// Reads up to `size` * `count` bytes; records kZYRErrorFileOpFailed-style failures in
+    /// `err` and returns 0 instead of throwing.
     unsigned int read(void* buf, unsigned int size, unsigned int count,
                       ZYRPublic::eZYRErrorType& err) override;
     unsigned int read(void* buf, unsigned int size, unsigned int count) override;
+    /// Writes `size` * `count` bytes, growing owned memory; records a failure in `err` and
+    /// returns 0 instead of throwing.
     unsigned int write(const void* buf, unsigned int size, unsigned int count,
                        ZYRPublic::eZYRErrorType& err) override;
     unsigned int write(const void* buf, unsigned int size, unsigned int count) override;
