@@ -22,24 +22,38 @@ using ZYRPublic::I_AnalyticsData;
 class ZYRSTD_API CZYRAnalyticsData : public CZYRInterfaceValue<I_AnalyticsData> {
 public:
     CZYRAnalyticsData(); ///< a new record
+    /// Shares the record: one more reference.
     CZYRAnalyticsData(const CZYRAnalyticsData& other) = default;
+    /// Takes over the other's reference.
     CZYRAnalyticsData(CZYRAnalyticsData&& other) noexcept = default;
+    /// Shares `record`: one more reference.
     CZYRAnalyticsData(const C_SmartPtr<I_AnalyticsData>& record)
         : CZYRInterfaceValue(record.get(), true) {}
+    /// Wraps `record`; `addRef` false adopts the caller's reference.
     CZYRAnalyticsData(I_AnalyticsData* record, bool addRef) : CZYRInterfaceValue(record, addRef) {}
+    /// Shares the other's record and releases the one held before.
     CZYRAnalyticsData& operator=(const CZYRAnalyticsData& other) = default;
+    /// Takes over the other's reference and releases the one held before.
     CZYRAnalyticsData& operator=(CZYRAnalyticsData&& other) noexcept = default;
     ~CZYRAnalyticsData() override;
 
+    /// Stores `value` under `key` (I_AnalyticsData::set); throws what it records.
+    ///@{
     void set(const CZYRUniString& key, const CZYRUniString& value);
     void set(const CZYRUniString& key, unsigned int value);
     void set(const CZYRUniString& key, int32_t value);
     void set(const CZYRUniString& key, double value);
     void set(const CZYRUniString& key, bool value);
+    ///@}
 
+    /// Hands the record to the analytics manager (I_AnalyticsData::finalize); throws what it
+    /// records.
     void finalize();
+    /// True once finalized.
     bool isFinalized() const;
+    /// False when the record was made while analytics were inactive.
     bool isAnalyticsEnabled() const;
+    /// The record's process-unique identifier.
     unsigned long long getUniqueID() const;
 
 private:

@@ -34,13 +34,18 @@ enum eZYRAnalyticsEventType : int {
     kZYRAnalyticsEventAll = 12,                 ///< LogEvent: log and reset every counter
 };
 
+/// What the telemetry logger compares to log a run of equal surfaces once.
 struct sSurfaceInfo {
-    double width = 0;
-    double height = 0;
-    unsigned int placedObjects = 0;
+    double width = 0;               ///< in points
+    double height = 0;              ///< in points
+    unsigned int placedObjects = 0; ///< placed objects on the surface
+    /// True when every field is equal.
     bool operator==(const sSurfaceInfo&) const = default;
 };
 
+/// The telemetry session logger: one session per process, writing analytics records
+/// through the telemetry library when it can be loaded, else nothing. Its state is locked,
+/// so any thread may call it.
 class ZYRSTD_API Farlamp {
 public:
     Farlamp() = delete;
@@ -53,17 +58,22 @@ public:
     static void CloseSession();
     /// Writes the record as the data group its "DataGroupName" names.
     static void LogDataObject(const C_SmartPtr<I_AnalyticsData>& record);
+    /// Writes the dictionary's entries as one data group.
     static void LogDict(const CZYRDict& info);
+    /// Writes an error event: its type, the area and the source file.
     static void LogZYRError(eZYRErrorType type, const char* area, const char* file);
     /// Counts one use of `type` (unless `peek`) and returns the count; kZYRAnalyticsEventAll
     /// logs the counted events and resets every counter.
     static unsigned int LogEvent(eZYRAnalyticsEventType type, bool peek);
+    /// Writes one event of `type` now, without counting it.
     static void LogEventNow(eZYRAnalyticsEventType type);
     /// Ends the job: completion time, trapping and transparency, events, the last surfaces.
     static void FlushJob(double time);
     /// Called after each surface: a run of equal surfaces is logged once, with its count.
     static void LogSurfaceDataGroup();
+    /// Records the surface being rendered, for LogSurfaceDataGroup.
     static void UpdateCurrentSurfaceInfo(double width, double height, unsigned int placedObjects);
+    /// True while a session that records is open.
     static bool LoggingEnabled();
 
 private:

@@ -11,68 +11,74 @@
 
 namespace ZYRStd {
 
+/// One disk drive, texts NUL-terminated UTF-16.
 struct HardwareDiskEntry {
-    char16_t interfaceType[8];
-    char16_t model[36];
-    std::uint64_t size; ///< bytes
+    char16_t interfaceType[8]; ///< the bus, e.g. "SCSI", "IDE", "USB"
+    char16_t model[36];        ///< the drive's model
+    std::uint64_t size;        ///< bytes
 };
 
+/// One processor package, texts NUL-terminated UTF-16.
 struct HardwareProcessorEntry {
-    char16_t caption[60];
-    std::uint32_t currentClockSpeed; ///< MHz
-    std::uint32_t extClock;
-    std::uint32_t l2CacheSize; ///< KB
-    std::uint32_t l2CacheSpeed;
-    std::uint32_t l3CacheSize; ///< KB
-    std::uint32_t l3CacheSpeed;
-    char16_t manufacturer[20];
-    std::uint32_t maxClockSpeed; ///< MHz
-    char16_t name[60];
-    std::uint32_t numberOfCores;
-    std::uint32_t numberOfLogicalProcessors;
-    std::uint32_t reserved[2];
+    char16_t caption[60];                    ///< short description
+    std::uint32_t currentClockSpeed;         ///< MHz
+    std::uint32_t extClock;                  ///< external clock, MHz
+    std::uint32_t l2CacheSize;               ///< KB
+    std::uint32_t l2CacheSpeed;              ///< MHz
+    std::uint32_t l3CacheSize;               ///< KB
+    std::uint32_t l3CacheSpeed;              ///< MHz
+    char16_t manufacturer[20];               ///< vendor name
+    std::uint32_t maxClockSpeed;             ///< MHz
+    char16_t name[60];                       ///< model name
+    std::uint32_t numberOfCores;             ///< physical cores
+    std::uint32_t numberOfLogicalProcessors; ///< hardware threads
+    std::uint32_t reserved[2];               ///< zero
 };
 
+/// One memory module.
 struct HardwareMemoryEntry {
     std::uint64_t capacity; ///< bytes
     std::uint32_t speed;    ///< MHz
-    std::uint32_t reserved;
+    std::uint32_t reserved; ///< zero
 };
 
-constexpr unsigned int kMaxHardwareDisks = 6;
-constexpr unsigned int kMaxHardwareProcessors = 8;
-constexpr unsigned int kMaxHardwareMemoryModules = 16;
-constexpr unsigned int kMaxPerformanceCores = 128;
+constexpr unsigned int kMaxHardwareDisks = 6;          ///< disks a HardwareInfoRec holds
+constexpr unsigned int kMaxHardwareProcessors = 8;     ///< processors a HardwareInfoRec holds
+constexpr unsigned int kMaxHardwareMemoryModules = 16; ///< memory modules a HardwareInfoRec holds
+constexpr unsigned int kMaxPerformanceCores = 128;     ///< cores a PerformanceRec holds
 
 /// 5920 bytes; every query that fills it zero-fills it first.
 struct HardwareInfoRec {
-    HardwareDiskEntry disks[kMaxHardwareDisks];
-    HardwareProcessorEntry processors[kMaxHardwareProcessors];
-    unsigned char reserved1[132];
-    char16_t osCaption[60];
-    char16_t osServicePack[30];
-    char16_t computerName[40];
-    unsigned char reserved2[224];
-    HardwareMemoryEntry memory[kMaxHardwareMemoryModules];
-    unsigned char reserved3[1856];
-    std::uint32_t numberOfDisks;
-    std::uint32_t numberOfProcessors;
-    std::uint32_t reserved4;
-    std::uint32_t numberOfMemoryModules;
-    std::uint32_t reserved5[2];
+    HardwareDiskEntry disks[kMaxHardwareDisks]; ///< the first numberOfDisks are filled
+    HardwareProcessorEntry
+        processors[kMaxHardwareProcessors]; ///< the first numberOfProcessors are filled
+    unsigned char reserved1[132];           ///< zero
+    char16_t osCaption[60];                 ///< operating system name
+    char16_t osServicePack[30];             ///< operating system update level
+    char16_t computerName[40];              ///< host name
+    unsigned char reserved2[224];           ///< zero
+    HardwareMemoryEntry
+        memory[kMaxHardwareMemoryModules]; ///< the first numberOfMemoryModules are filled
+    unsigned char reserved3[1856];         ///< zero
+    std::uint32_t numberOfDisks;           ///< entries filled in disks
+    std::uint32_t numberOfProcessors;      ///< entries filled in processors
+    std::uint32_t reserved4;               ///< zero
+    std::uint32_t numberOfMemoryModules;   ///< entries filled in memory
+    std::uint32_t reserved5[2];            ///< zero
 };
 
 /// 2504 bytes; every query that fills it zero-fills it first.
 struct PerformanceRec {
-    std::uint64_t totalProcessorUse; ///< percent
-    std::uint64_t coreProcessorUse[kMaxPerformanceCores];
-    unsigned char reserved1[1408];
-    std::uint64_t commitLimit;    ///< bytes
-    std::uint64_t committedBytes; ///< bytes
-    std::uint32_t percentCommittedBytesInUse;
-    unsigned char reserved2[36];
-    std::uint32_t numberOfCores;
-    std::uint32_t reserved3;
+    std::uint64_t totalProcessorUse;                      ///< percent
+    std::uint64_t coreProcessorUse[kMaxPerformanceCores]; ///< percent per core; the first
+                                                          ///< numberOfCores are filled
+    unsigned char reserved1[1408];                        ///< zero
+    std::uint64_t commitLimit;                            ///< bytes
+    std::uint64_t committedBytes;                         ///< bytes
+    std::uint32_t percentCommittedBytesInUse; ///< committedBytes as a percentage of commitLimit
+    unsigned char reserved2[36];              ///< zero
+    std::uint32_t numberOfCores;              ///< entries filled in coreProcessorUse
+    std::uint32_t reserved3;                  ///< zero
 };
 
 static_assert(sizeof(HardwareDiskEntry) == 96 && offsetof(HardwareDiskEntry, model) == 16 &&
@@ -110,16 +116,25 @@ static_assert(sizeof(PerformanceRec) == 2504 && offsetof(PerformanceRec, corePro
 class ZYRSTD_API IHardwareInfo {
 public:
     virtual ~IHardwareInfo();
+    /// Fills the memory modules of `rec`.
     [[nodiscard]] virtual bool getMemoryInfo(HardwareInfoRec* rec) = 0;
+    /// Fills the processors and the operating-system texts of `rec`.
     [[nodiscard]] virtual bool getProcessorAndOSInfo(HardwareInfoRec* rec) = 0;
+    /// Fills the disks of `rec`.
     [[nodiscard]] virtual bool getDiskInfo(HardwareInfoRec* rec) = 0;
+    /// Fills the commit figures of `rec`.
     [[nodiscard]] virtual bool getMemoryPerformance(PerformanceRec* rec) = 0;
+    /// Fills the processor use of `rec`.
     [[nodiscard]] virtual bool getCPUPerformance(PerformanceRec* rec) = 0;
+    /// Writes the memory modules of `rec` as text to `out`.
     virtual void printMemoryInfo(const HardwareInfoRec* rec, std::wostream& out) = 0;
     /// Returns the number of processors printed.
     virtual int printProcessorAndOSInfo(const HardwareInfoRec* rec, std::wostream& out) = 0;
+    /// Writes the disks of `rec` as text to `out`.
     virtual void printDiskInfo(const HardwareInfoRec* rec, std::wostream& out) = 0;
+    /// Writes the commit figures of `rec` as text to `out`.
     virtual void printMemoryPerformance(const PerformanceRec* rec, std::wostream& out) = 0;
+    /// Writes the processor use of `rec` as text to `out`.
     virtual void printCPUPerformance(const PerformanceRec* rec, std::wostream& out) = 0;
 };
 

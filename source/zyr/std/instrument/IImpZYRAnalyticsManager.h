@@ -12,6 +12,8 @@ namespace ZYRStd {
 using ZYRPublic::C_SmartPtr;
 using ZYRPublic::I_AnalyticsData;
 
+/// The analytics manager: a queue of finalized records that its own worker thread hands
+/// to the telemetry session logger. Any thread may enqueue.
 class ZYRSTD_API IZYRAnalyticsManager {
 public:
     /// Queues `record` for logging; throws kZYRErrorInvalidFuncCall once termination began.
@@ -23,6 +25,7 @@ public:
 
 /// Both always return true; a session that cannot start leaves analytics inactive.
 ZYRSTD_API bool ZYRAnalyticsManagerInit();
+/// Stops and joins the worker thread; records still queued are dropped.
 ZYRSTD_API bool ZYRAnalyticsManagerTerm();
 /// The running manager or null. The manager outlives ZYRAnalyticsManagerTerm, so a pointer
 /// taken before it only meets the terminating error.

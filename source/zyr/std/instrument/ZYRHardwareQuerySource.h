@@ -13,8 +13,11 @@
 
 namespace ZYRStd {
 
+/// Where the hardware information is read from: the system's files below a root, so that
+/// tests can supply their own tree.
 class ZYRSTD_API ZYRHardwareQuerySource {
 public:
+    /// One record of a query: field name to text.
     using Row = std::map<std::string, std::string>;
 
     /// Reads below `root` ("/" for this machine).

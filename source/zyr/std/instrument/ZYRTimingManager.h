@@ -20,19 +20,25 @@ public:
     static void Terminate();
     /// 0 until Initialize() has run.
     static long long GetClocksPerSec();
+    /// The calibrated ticks a stop watch adds to its own measurement.
     static long long GetAvgInnerConstructTime();
+    /// The calibrated ticks a stop watch costs its caller.
     static long long GetAvgOuterConstructTime();
     /// Whether ticks come from the processor's invariant time-stamp counter (true) or from
     /// the monotonic clock in nanoseconds.
     static bool UsesTimeStampCounter();
 
+    /// Kept for callers; does nothing.
     static void InitializeSurfaceTime();
+    /// Kept for callers; does nothing.
     static void RecordSurfaceTime(unsigned int, unsigned int, long long);
 
     /// The three measurement lines, measured when one of them is first asked for (the bus
     /// measurement writes 128 MiB, a cost no host should pay at every start-up).
     static const char* GetTimerAccuracyLine();
+    /// The memory-bus measurement line, static text.
     static const char* GetBusSpeedLine();
+    /// The cache measurement line, static text.
     static const char* GetCacheSpeedLine();
 
     /// The named accumulators alive now, in order of construction.
@@ -62,10 +68,15 @@ public:
     ZYRTimeAccumulator(const ZYRTimeAccumulator&) = delete;
     ZYRTimeAccumulator& operator=(const ZYRTimeAccumulator&) = delete;
 
+    /// The name given at construction, borrowed.
     const char* GetTimerName() const;
+    /// The source file given at construction, borrowed.
     const char* GetSourceFile() const;
+    /// The source line given at construction.
     int GetSourceLine() const;
+    /// The passes measured so far, recursive ones included.
     int GetTotalCalls() const;
+    /// The ticks summed so far.
     long long GetTotalTicks() const;
     /// Total ticks in seconds; 0 before the manager is calibrated.
     double GetCurrentTotalTime() const;
@@ -86,6 +97,7 @@ private:
 /// same accumulator count as calls, but only the outermost one adds its time.
 class ZYRSTD_API ZYRStopWatch {
 public:
+    /// Starts measuring into `acc`; the destructor stops and adds the time.
     explicit ZYRStopWatch(ZYRTimeAccumulator& acc);
     ~ZYRStopWatch();
     ZYRStopWatch(const ZYRStopWatch&) = delete;
