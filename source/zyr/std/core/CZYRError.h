@@ -152,7 +152,7 @@ ZYRSTD_API void throwCZYRErrorIfErrorOccurred(const I_Error& err);
 [[noreturn]] ZYRSTD_API void throwCZYRUnexpt();
 /// The error type a boundary records for a standard exception: kZYRErrorUnknown.
 ZYRSTD_API eZYRErrorType ZYRErrorFromStdException(const std::exception& e) noexcept;
-/// The error type for a code of the engine's job-ticket layer.
+/// The error type for a numeric code of another component: kZYRErrorUnknown for every code.
 ZYRSTD_API eZYRErrorType ZYRErrorFromJTError(unsigned int code) noexcept;
 /// Throws kZYRErrorAssertionFailed raised at `srcFileName`:`srcLineNumber`.
 [[noreturn]] ZYRSTD_API void throwAssertionFailed(const char* srcFileName, int srcLineNumber);

@@ -107,7 +107,7 @@ private:
 ZYRSTD_API CZYRThreadSpecificPtr* GetCZYRThreadSpecificPtr();
 /// The slot owns the record: a replaced record and a finished thread's record are deleted.
 ZYRSTD_API void SetCZYRThreadSpecificPtr(CZYRThreadSpecificPtr* record);
-/// True when the library runs with a single thread (no recovery waits).
+/// The "SingleThreadProcess" start-up option (false by default).
 ZYRSTD_API bool ZYRSingleThreadProcess();
 /// The kernel's identifier of the calling thread.
 ZYRSTD_API uint32_t ZYRGetCurrentThreadId();

@@ -66,7 +66,7 @@ ZYRSTD_API void GetClientsMemoryUsedAndMemoryLimit(unsigned long long& flushable
 ZYRSTD_API void DMM_TUMAFree(void* ctx, void* p);
 /// Resizes a block of DMM_TUMAAlloc; null on failure, the old block kept.
 [[nodiscard]] ZYRSTD_API void* DMM_TUMAReAlloc(void* ctx, void* p, unsigned int size);
-/// Allocates for the job-output client, counted in its statistics; null on failure.
+/// Allocates for the JOV client, counted in its statistics; null on failure.
 [[nodiscard]] ZYRSTD_API void* DMM_JOVAlloc(unsigned int size);
 /// Frees a block of DMM_JOVAlloc.
 ZYRSTD_API void DMM_JOVFree(void* p);
@@ -78,16 +78,16 @@ ZYRSTD_API unsigned int DMM_JOVMemSize(void* p);
 /// goes to `*peak` when not null.
 ZYRSTD_API unsigned long long DMM_GetCurrTUMAMem(eZYRMemoryClientType type,
                                                  unsigned long long* peak);
-/// The same for the job-output client.
+/// The same for the JOV client.
 ZYRSTD_API unsigned long long DMM_GetCurrJOVMem(eZYRMemoryClientType type,
                                                 unsigned long long* peak);
 /// The bytes both clients hold for the threads `type` selects.
 ZYRSTD_API unsigned long long DMM_GetCurrTUMAJOVMem(eZYRMemoryClientType type);
 /// Names the interpreter thread (type eZYRMemoryClientInterp) whose use is counted apart.
 ZYRSTD_API void DMM_SetMemoryClientThreadID(eZYRMemoryClientType type, unsigned long long threadId);
-/// Fixes the largest single block of the job-output client from the memory limit.
+/// Limits a single JOV block to 96 MiB when the address space is at most 4 GiB.
 ZYRSTD_API void DMM_SetJOVAllocMaxSingleBlockSize();
-/// The largest single block of the job-output client.
+/// The largest single block of the JOV client.
 ZYRSTD_API unsigned int DMM_GetJOVAllocMaxSingleBlockSize();
 
 /// Adds (or, without `add`, removes) `bytes` to the statistics of the client `name`.
