@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "zyr/std/core/CZYRError.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/values/CZYRUniString.h"
 
 namespace ZYRStd {
@@ -87,7 +88,7 @@ IImpZYRCommonUniStrings::~IImpZYRCommonUniStrings() = default;
 class DynamicUniStringCache {
 public:
     C_SmartPtr<I_UniString> intern(const C_SmartPtr<I_UniString>& s) {
-        std::lock_guard lock(mutex_);
+        detail::LockGuard lock(mutex_);
         const auto found = index_.find(s.get());
         if (found != index_.end()) {
             entries_.splice(entries_.begin(), entries_, found->second);
@@ -122,11 +123,11 @@ private:
         return true;
     }
 
-    std::mutex mutex_; // guards entries_ and index_
-    std::list<C_SmartPtr<I_UniString>> entries_;
+    detail::Mutex mutex_;
+    std::list<C_SmartPtr<I_UniString>> entries_ ZYR_GUARDED_BY(mutex_);
     std::unordered_map<const I_UniString*, std::list<C_SmartPtr<I_UniString>>::iterator, TextHash,
                        TextEqual>
-        index_;
+        index_ ZYR_GUARDED_BY(mutex_);
 };
 
 IImpZYRCommonUniStrings* commonStrings = nullptr;
