@@ -13,12 +13,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-template <class T> std::unique_ptr<T> zeroed() {
-    auto rec = std::make_unique<T>();
-    std::memset(rec.get(), 0, sizeof(T));
-    return rec;
-}
-
 template <std::size_t N> void setText(char16_t (&field)[N], const std::u16string& text) {
     std::memcpy(field, text.data(), std::min(text.size(), N) * sizeof(char16_t));
 }
@@ -123,8 +117,8 @@ std::unique_ptr<IHardwareInfo> infoFor(const std::string& root = "/") {
 TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
     const auto info = infoFor();
     EXPECT_EQ(printAll(*info, nullptr, nullptr), L"|0");
-    const auto rec = zeroed<HardwareInfoRec>();
-    auto perf = zeroed<PerformanceRec>();
+    const auto rec = std::make_unique<HardwareInfoRec>();
+    auto perf = std::make_unique<PerformanceRec>();
     EXPECT_EQ(printAll(*info, rec.get(), perf.get()),
               L"\tOperating System \n\t\tCaption: \n\t\tCSDVersion: \n\tMemory Performance\n"
               L"\t\tMEM: 0 bytes of0 bytes = 0 % in use\n\tCPU Performance\n\t\tCPU: 0% busy\n|0");
@@ -175,7 +169,7 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
     const zyrtest::TempDir root;
     buildMachine(root.path());
     const auto info = infoFor(root.path());
-    const auto rec = zeroed<HardwareInfoRec>();
+    const auto rec = std::make_unique<HardwareInfoRec>();
     std::memset(rec.get(), 0xAB, sizeof *rec); // every query zero-fills the record first
     ASSERT_TRUE(info->getProcessorAndOSInfo(rec.get()));
     EXPECT_TRUE(rec->reserved1[0] == 0 && rec->numberOfDisks == 0 &&
@@ -223,7 +217,7 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
     const zyrtest::TempDir root;
     buildMachine(root.path());
     const auto info = infoFor(root.path());
-    const auto rec = zeroed<HardwareInfoRec>();
+    const auto rec = std::make_unique<HardwareInfoRec>();
     const struct {
         std::string vendor;
         std::u16string manufacturer;
@@ -259,7 +253,7 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
 
     const zyrtest::TempDir nothing;
     const auto none = infoFor(nothing.path());
-    auto perf = zeroed<PerformanceRec>();
+    auto perf = std::make_unique<PerformanceRec>();
     EXPECT_FALSE(none->getProcessorAndOSInfo(rec.get()) || none->getDiskInfo(rec.get()) ||
                  none->getMemoryInfo(rec.get()) || none->getMemoryPerformance(perf.get()) ||
                  none->getCPUPerformance(perf.get()));
@@ -302,7 +296,7 @@ TEST(IHardwareInfoTest, PerformanceFromMeminfoAndTwoStatSamples) {
                  source.run("SELECT Name FROM Win32_Processor", rows) || !rows.empty());
 
     const auto info = infoFor(root.path());
-    auto perf = zeroed<PerformanceRec>();
+    auto perf = std::make_unique<PerformanceRec>();
     std::memset(perf.get(), 0xAB, sizeof *perf);
     ASSERT_TRUE(info->getCPUPerformance(perf.get()));
     EXPECT_TRUE(perf->numberOfCores == 2 && perf->totalProcessorUse == 0 && perf->commitLimit == 0);
