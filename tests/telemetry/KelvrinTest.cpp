@@ -117,7 +117,7 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     EXPECT_EQ(files, 1);
 
     // Lines carry their times in order, though a long line is still being formatted.
-    start(session, "Print", "P", "1", "1", "", dir.file("order").c_str());
+    start(session, "Print", "", "1", "1", "", dir.file("order").c_str());
     std::atomic<bool> done{false};
     std::thread longLine([&] {
         addToGroup(session, 0, "long", std::string(4 << 20, 'x').c_str());
@@ -127,7 +127,10 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
         addToSession(session, "short", "x");
     longLine.join();
     close(session);
-    std::ifstream in(std::filesystem::directory_iterator(dir.file("order"))->path());
+    const std::filesystem::path order =
+        std::filesystem::directory_iterator(dir.file("order"))->path();
+    EXPECT_TRUE(order.filename().string().starts_with("unknown-")) << "no product name given";
+    std::ifstream in(order);
     long long last = 0;
     for (std::string line; std::getline(in, line);) {
         const long long time = nlohmann::json::parse(line)["time"];
