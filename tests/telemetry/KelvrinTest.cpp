@@ -108,8 +108,11 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
                                                                    std::to_string(getpid()) + "-" +
                                                                    std::to_string(n) + ".jsonl");
     }
+    testing::internal::CaptureStderr();
     start(session, "Print", "P", "1", "1", "", taken.c_str());
     close(session);
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "")
+        << "a session that went well closes quietly";
     EXPECT_EQ(zyrtest::readFile(dir.file("plain")), "x");
     int files = 0;
     for (const auto& entry : std::filesystem::directory_iterator(taken))
