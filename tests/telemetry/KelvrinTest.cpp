@@ -152,6 +152,7 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
             rlimit limit;
             limit.rlim_cur = limit.rlim_max = 1;
             setrlimit(RLIMIT_FSIZE, &limit);
+            ::close(0); // the session file may get descriptor 0 too
             start(session, "Print", "P", "1", "1", "", dir.file("full").c_str());
             close(session);
             ::close(report[1]);
