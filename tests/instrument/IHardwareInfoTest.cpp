@@ -31,12 +31,16 @@ void disk(const std::string& root, const std::string& dir, const std::string& mo
     put(root, dir + "/removable", std::string(removable) + "\n");
 }
 
-std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB = 0) {
-    std::string entry(0x28, '\0');
+// A memory device of SMBIOS 2.7 (0x28 bytes), or of 2.1 (0x17 bytes, without the extended size).
+std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB = 0,
+                         char length = 0x28) {
+    std::string entry(length, '\0');
     entry[0] = 17;
-    entry[1] = 0x28;
+    entry[1] = length;
     entry[0x10] = 1;
     for (const auto& [at, value] : {std::pair{0x0C, sizeWord}, {0x15, speed}, {0x1C, extendedMB}}) {
+        if (at + 1 >= length)
+            break;
         entry[at] = static_cast<char>(value & 0xFF);
         entry[at + 1] = static_cast<char>(value >> 8);
     }
@@ -46,7 +50,7 @@ std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB 
 std::string dmiTable() {
     return std::string("\4\10\0\0\0\0\0\0\0\0\1\4\0\0\0\0", 16) + memoryDevice(8192, 3200) +
            memoryDevice(0, 0) + memoryDevice(0x7FFF, 2666, 32768) + memoryDevice(0x8000 | 512, 0) +
-           std::string("\177\4\0\0\0\0", 6);
+           memoryDevice(1024, 1600, 0, 0x17) + std::string("\177\4\0\0\0\0", 6);
 }
 
 void buildMachine(const std::string& root) {
@@ -55,7 +59,7 @@ void buildMachine(const std::string& root) {
     for (int cpu = 0; cpu < 4; ++cpu) {
         cpuinfo += "processor\t: " + std::to_string(cpu) +
                    "\nvendor_id\t: GenuineIntel\ncpu family\t: 6\nmodel\t\t: 158\nmodel name\t: "
-                   "Intel(R) Xeon(R) CPU E3-1505M v6 @ 3.00GHz\nstepping\t: 9\ncpu MHz\t\t: "
+                   "Intel(R) Xeon(R) CPU E3-1505M v6 @ 3.00GHz  \nstepping\t: 9\ncpu MHz\t\t: "
                    "2999.998\nphysical id\t: " +
                    std::to_string(cpu / 2) + "\nsiblings\t: 2\ncpu cores\t: 2\n\n";
         const std::string dir = "sys/devices/system/cpu/cpu" + std::to_string(cpu) + "/cache/index";
@@ -190,10 +194,10 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
                              processor + second);
 
     ASSERT_TRUE(info->getMemoryInfo(rec.get()));
-    ASSERT_EQ(rec->numberOfMemoryModules, 3u);
+    ASSERT_EQ(rec->numberOfMemoryModules, 4u);
     EXPECT_TRUE(rec->memory[0].capacity == 8192ull << 20 && rec->memory[0].speed == 3200 &&
                 rec->memory[1].capacity == 32768ull << 20 && rec->memory[1].speed == 2666 &&
-                rec->memory[2].capacity == 512ull << 10);
+                rec->memory[2].capacity == 512ull << 10 && rec->memory[3].speed == 1600);
 
     ASSERT_TRUE(info->getDiskInfo(rec.get()));
     std::wostringstream disks;
