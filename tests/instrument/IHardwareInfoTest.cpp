@@ -13,12 +13,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-template <class T> std::unique_ptr<T> zeroed() {
-    auto rec = std::make_unique<T>();
-    std::memset(rec.get(), 0, sizeof(T));
-    return rec;
-}
-
 template <std::size_t N> void setText(char16_t (&field)[N], const std::u16string& text) {
     std::memcpy(field, text.data(), std::min(text.size(), N) * sizeof(char16_t));
 }
@@ -37,12 +31,16 @@ void disk(const std::string& root, const std::string& dir, const std::string& mo
     put(root, dir + "/removable", std::string(removable) + "\n");
 }
 
-std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB = 0) {
-    std::string entry(0x28, '\0');
+// A memory device of SMBIOS 2.7 (0x28 bytes), or of 2.1 (0x17 bytes, without the extended size).
+std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB = 0,
+                         char length = 0x28) {
+    std::string entry(length, '\0');
     entry[0] = 17;
-    entry[1] = 0x28;
+    entry[1] = length;
     entry[0x10] = 1;
     for (const auto& [at, value] : {std::pair{0x0C, sizeWord}, {0x15, speed}, {0x1C, extendedMB}}) {
+        if (at + 1 >= length)
+            break;
         entry[at] = static_cast<char>(value & 0xFF);
         entry[at + 1] = static_cast<char>(value >> 8);
     }
@@ -52,7 +50,7 @@ std::string memoryDevice(unsigned sizeWord, unsigned speed, unsigned extendedMB 
 std::string dmiTable() {
     return std::string("\4\10\0\0\0\0\0\0\0\0\1\4\0\0\0\0", 16) + memoryDevice(8192, 3200) +
            memoryDevice(0, 0) + memoryDevice(0x7FFF, 2666, 32768) + memoryDevice(0x8000 | 512, 0) +
-           std::string("\177\4\0\0\0\0", 6);
+           memoryDevice(1024, 1600, 0, 0x17) + std::string("\177\4\0\0\0\0", 6);
 }
 
 void buildMachine(const std::string& root) {
@@ -61,7 +59,7 @@ void buildMachine(const std::string& root) {
     for (int cpu = 0; cpu < 4; ++cpu) {
         cpuinfo += "processor\t: " + std::to_string(cpu) +
                    "\nvendor_id\t: GenuineIntel\ncpu family\t: 6\nmodel\t\t: 158\nmodel name\t: "
-                   "Intel(R) Xeon(R) CPU E3-1505M v6 @ 3.00GHz\nstepping\t: 9\ncpu MHz\t\t: "
+                   "Intel(R) Xeon(R) CPU E3-1505M v6 @ 3.00GHz  \nstepping\t: 9\ncpu MHz\t\t: "
                    "2999.998\nphysical id\t: " +
                    std::to_string(cpu / 2) + "\nsiblings\t: 2\ncpu cores\t: 2\n\n";
         const std::string dir = "sys/devices/system/cpu/cpu" + std::to_string(cpu) + "/cache/index";
@@ -123,8 +121,8 @@ std::unique_ptr<IHardwareInfo> infoFor(const std::string& root = "/") {
 TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
     const auto info = infoFor();
     EXPECT_EQ(printAll(*info, nullptr, nullptr), L"|0");
-    const auto rec = zeroed<HardwareInfoRec>();
-    auto perf = zeroed<PerformanceRec>();
+    const auto rec = std::make_unique<HardwareInfoRec>();
+    auto perf = std::make_unique<PerformanceRec>();
     EXPECT_EQ(printAll(*info, rec.get(), perf.get()),
               L"\tOperating System \n\t\tCaption: \n\t\tCSDVersion: \n\tMemory Performance\n"
               L"\t\tMEM: 0 bytes of0 bytes = 0 % in use\n\tCPU Performance\n\t\tCPU: 0% busy\n|0");
@@ -143,7 +141,7 @@ TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
     cpu = {{}, 1200, 100, 512, 0, 8192, 0, {}, 4000, {}, 4, 8, {}};
     setText(cpu.caption, u"\U0001F600 Family 6");
     setText(cpu.manufacturer, u"GenuineIntel");
-    setText(cpu.name, u"Xeon \u00e9 \U0001F600");
+    setText(cpu.name, u"Xeon \u00e9 \U0001F600\U0010FFFF");
     *perf = {37, {12, 100}, {}, 12641974272ull, 4214091776ull, 33, {}, 2, 0};
     EXPECT_EQ(printAll(*info, rec.get(), perf.get()),
               L"\tMemory 1\n\t\tCapacity: 8192 MB\n\t\tSpeed: 3200 MHz\n"
@@ -153,7 +151,7 @@ TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
               L"\t\tCurrentClockSpeed: 1200 Mhz\n\t\tExtClock: 100 MHz\n"
               L"\t\tL2CacheSize: 512 KB\n\t\tL3CacheSize: 8192 KB\n"
               L"\t\tManufacturer: GenuineIntel\n\t\tMaxClockSpeed: 4000 MHz\n"
-              L"\t\tName: Xeon \u00e9 \U0001F600\n\t\tNumberOfCores: 4\n"
+              L"\t\tName: Xeon \u00e9 \U0001F600\U0010FFFF\n\t\tNumberOfCores: 4\n"
               L"\t\tNumberOfLogicalProcessors: 8\n"
               L"\tDisk 1\n\t\tInterfaceType: SCSI\n\t\tModel: Samsung SSD 860\n\t\tSize: 931 GB\n"
               L"\tMemory Performance\n"
@@ -175,7 +173,7 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
     const zyrtest::TempDir root;
     buildMachine(root.path());
     const auto info = infoFor(root.path());
-    const auto rec = zeroed<HardwareInfoRec>();
+    const auto rec = std::make_unique<HardwareInfoRec>();
     std::memset(rec.get(), 0xAB, sizeof *rec); // every query zero-fills the record first
     ASSERT_TRUE(info->getProcessorAndOSInfo(rec.get()));
     EXPECT_TRUE(rec->reserved1[0] == 0 && rec->numberOfDisks == 0 &&
@@ -196,10 +194,10 @@ TEST(IHardwareInfoTest, QueriesReadTheTree) {
                              processor + second);
 
     ASSERT_TRUE(info->getMemoryInfo(rec.get()));
-    ASSERT_EQ(rec->numberOfMemoryModules, 3u);
+    ASSERT_EQ(rec->numberOfMemoryModules, 4u);
     EXPECT_TRUE(rec->memory[0].capacity == 8192ull << 20 && rec->memory[0].speed == 3200 &&
                 rec->memory[1].capacity == 32768ull << 20 && rec->memory[1].speed == 2666 &&
-                rec->memory[2].capacity == 512ull << 10);
+                rec->memory[2].capacity == 512ull << 10 && rec->memory[3].speed == 1600);
 
     ASSERT_TRUE(info->getDiskInfo(rec.get()));
     std::wostringstream disks;
@@ -223,7 +221,7 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
     const zyrtest::TempDir root;
     buildMachine(root.path());
     const auto info = infoFor(root.path());
-    const auto rec = zeroed<HardwareInfoRec>();
+    const auto rec = std::make_unique<HardwareInfoRec>();
     const struct {
         std::string vendor;
         std::u16string manufacturer;
@@ -259,7 +257,7 @@ TEST(IHardwareInfoTest, FallbacksCutsAndFailures) {
 
     const zyrtest::TempDir nothing;
     const auto none = infoFor(nothing.path());
-    auto perf = zeroed<PerformanceRec>();
+    auto perf = std::make_unique<PerformanceRec>();
     EXPECT_FALSE(none->getProcessorAndOSInfo(rec.get()) || none->getDiskInfo(rec.get()) ||
                  none->getMemoryInfo(rec.get()) || none->getMemoryPerformance(perf.get()) ||
                  none->getCPUPerformance(perf.get()));
@@ -302,7 +300,7 @@ TEST(IHardwareInfoTest, PerformanceFromMeminfoAndTwoStatSamples) {
                  source.run("SELECT Name FROM Win32_Processor", rows) || !rows.empty());
 
     const auto info = infoFor(root.path());
-    auto perf = zeroed<PerformanceRec>();
+    auto perf = std::make_unique<PerformanceRec>();
     std::memset(perf.get(), 0xAB, sizeof *perf);
     ASSERT_TRUE(info->getCPUPerformance(perf.get()));
     EXPECT_TRUE(perf->numberOfCores == 2 && perf->totalProcessorUse == 0 && perf->commitLimit == 0);

@@ -108,8 +108,11 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
                                                                    std::to_string(getpid()) + "-" +
                                                                    std::to_string(n) + ".jsonl");
     }
+    testing::internal::CaptureStderr();
     start(session, "Print", "P", "1", "1", "", taken.c_str());
     close(session);
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "")
+        << "a session that went well closes quietly";
     EXPECT_EQ(zyrtest::readFile(dir.file("plain")), "x");
     int files = 0;
     for (const auto& entry : std::filesystem::directory_iterator(taken))
@@ -117,7 +120,7 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
     EXPECT_EQ(files, 1);
 
     // Lines carry their times in order, though a long line is still being formatted.
-    start(session, "Print", "P", "1", "1", "", dir.file("order").c_str());
+    start(session, "Print", "", "1", "1", "", dir.file("order").c_str());
     std::atomic<bool> done{false};
     std::thread longLine([&] {
         addToGroup(session, 0, "long", std::string(4 << 20, 'x').c_str());
@@ -127,7 +130,10 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
         addToSession(session, "short", "x");
     longLine.join();
     close(session);
-    std::ifstream in(std::filesystem::directory_iterator(dir.file("order"))->path());
+    const std::filesystem::path order =
+        std::filesystem::directory_iterator(dir.file("order"))->path();
+    EXPECT_TRUE(order.filename().string().starts_with("unknown-")) << "no product name given";
+    std::ifstream in(order);
     long long last = 0;
     for (std::string line; std::getline(in, line);) {
         const long long time = nlohmann::json::parse(line)["time"];
@@ -146,6 +152,7 @@ TEST(KelvrinTest, SessionFileHoldsEveryCallAsOneLine) {
             rlimit limit;
             limit.rlim_cur = limit.rlim_max = 1;
             setrlimit(RLIMIT_FSIZE, &limit);
+            ::close(0); // the session file may get descriptor 0 too
             start(session, "Print", "P", "1", "1", "", dir.file("full").c_str());
             close(session);
             ::close(report[1]);

@@ -97,14 +97,42 @@ std::string defaultsWith(const std::string& ram, const Args& changed) {
 } // namespace
 
 TEST_F(ZyrstdToolTest, CommandLineAndMd5) {
-    for (const char* help : {"--help", "-h", "help"}) {
-        const Outcome o = zyrstd({help});
-        EXPECT_TRUE(o.exitCode == 0 && o.err.empty()) << help;
-        for (const char* line : {"\n  md5 [FILE...]", "\n  config FILE...", "config --defaults",
-                                 "\n  encode ascii85|asciihex", "\n  decode ascii85|asciihex",
-                                 "\n  hwinfo [--root DIR]\n", "\n  demo ", "\n  help "})
-            EXPECT_NE(o.out.find(line), std::string::npos) << help << " lacks " << line;
+    const Outcome help = zyrstd({"--help"});
+    EXPECT_TRUE(help.exitCode == 0 && help.err.empty());
+    EXPECT_EQ(zyrstd({"-h"}).out + zyrstd({"help"}).out, help.out + help.out);
+    EXPECT_EQ(zyrstd({"--version"}).out, "zyrstd " ZYRSTD_VERSION_STRING "\n");
+    // Each command's usage: on standard output when asked for, after the reason on standard
+    // error for a wrong command line; the list of commands shows each synopsis.
+    const std::pair<Args, std::string> usageErrors[] = {
+        {{"md5", "--bogus"}, "unknown option '--bogus'"},
+        {{"encode"}, "no encoding given"},
+        {{"encode", "base64"}, "unknown encoding 'base64'"},
+        {{"encode", "asciihex", "--no-z"}, "--no-z applies to ascii85 only"},
+        {{"encode", "ascii85", "--prefix", "abc"}, "--prefix takes at most 2 characters"},
+        {{"encode", "ascii85", "--eod", "123456789012345"}, "--eod takes at most 14 characters"},
+        {{"decode", "ascii85", "--prefix", "a"}, "unknown option '--prefix'"},
+        {{"decode", "ascii85", "a", "b", "c"}, "too many arguments"},
+        {{"config"}, "no setup file given"},
+        {{"config", "--defaults", "a.cfg"}, "--defaults takes no setup file"},
+        {{"config", "-x"}, "unknown option '-x'"},
+        {{"hwinfo", "--root"}, "--root needs a folder"},
+        {{"hwinfo", "--bogus"}, "unexpected argument '--bogus'"},
+        {{"demo", "now"}, "takes no arguments"},
+    };
+    for (const auto& [args, why] : usageErrors) {
+        const Outcome usage = zyrstd({args[0], "--help"});
+        EXPECT_TRUE(usage.exitCode == 0 && usage.err.empty() &&
+                    zyrtest::startsWith(usage.out, "usage: zyrstd " + args[0]))
+            << args[0];
+        EXPECT_EQ(zyrstd({args[0], "-x", "-h"}).out, usage.out);
+        EXPECT_NE(help.out.find("\n  " + usage.out.substr(14, usage.out.find('\n') - 14) + "\n"),
+                  std::string::npos)
+            << args[0];
+        expectFailure(zyrstd(args), 2, "zyrstd: " + args[0] + ": " + why + "\n" + usage.out);
     }
+    EXPECT_EQ(zyrstd({"encode", "asciihex", "--prefix", "-h"}, file("a", "A")).out, "-h41>\r\n")
+        << "an option's value is not a request for help";
+    expectFailure(zyrstd({"md5", "--", "-h"}), 1, "zyrstd: md5: -h: No such file or directory");
     expectFailure(zyrstd({"no-such-command"}), 2, "'no-such-command'");
     expectFailure(zyrstd({}), 2, "\nTry 'zyrstd --help'.\n");
 
@@ -163,7 +191,6 @@ TEST_F(ZyrstdToolTest, ConfigPrintsTheEffectiveOptions) {
          1,
          "zyrstd: config: cannot read '/dev/zero': not a regular file\n"},
         {{"config", huge}, 1, "zyrstd: config: cannot read '" + huge + "': larger than 64 MiB\n"},
-        {{"config"}, 2, "zyrstd: config: no setup file given\nTry 'zyrstd --help'.\n"},
     };
     for (const auto& [args, exitCode, err] : cases) {
         const Outcome failed = zyrstd(args);
@@ -204,13 +231,6 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
     };
     for (const auto& [args, err] : failures)
         expectFailure(zyrstd(args), 1, err);
-    for (const Args& args :
-         {Args{"encode"}, Args{"encode", "base64"}, Args{"encode", "asciihex", "--no-z"},
-          Args{"encode", "ascii85", "--prefix", "abc"},
-          Args{"encode", "ascii85", "--eod", "123456789012345"},
-          Args{"decode", "ascii85", "--prefix", "a"}, Args{"decode", "ascii85", "a", "b", "c"},
-          Args{"hwinfo", "--root"}})
-        expectFailure(zyrstd(args), 2, "usage: zyrstd");
     EXPECT_EQ(listing(), (Args{"back.bin", "bad.a85", "bad.hex", "in.bin", "in.txt"}))
         << "no output, no temporary file";
     zyrtest::writeFile(out, "precious");
@@ -219,57 +239,50 @@ TEST_F(ZyrstdToolTest, EncodeAndDecodeWriteWholeFilesOrNone) {
 }
 
 // The demo's logs and session live in a folder of its own: names planted in the shared
-// temporary folder are neither followed nor removed, and nothing is left behind.
+// temporary folder are neither followed nor removed, and nothing is left behind. The folder's
+// path is bytes: UTF-8 or not, the logs land inside it.
 TEST_F(ZyrstdToolTest, DemoKeepsToAFolderOfItsOwn) {
     const std::string precious = file("precious", "keep");
-    for (const char* name : {"zyrstd-demo-dmm.log", "zyrstd-demo-trace.log"})
-        fs::create_symlink(precious, dir_.file(name));
     const char* saved = std::getenv("TMPDIR");
     const std::string savedText = saved ? saved : "";
-    ::setenv("TMPDIR", dir_.path().c_str(), 1);
-    const Outcome o = zyrstd({"demo"});
-    saved ? ::setenv("TMPDIR", savedText.c_str(), 1) : ::unsetenv("TMPDIR");
-    EXPECT_EQ(o.exitCode, 0) << o.err;
-    for (const char* line : {R"("key":"SurfaceCount","time":)", R"("type":"session_close")"})
-        EXPECT_NE(o.out.find(line), std::string::npos) << "the session file holds " << line;
+    for (const std::string tmp : {"plain", "d\xc3\xa9j\xc3\xa0-\xd0\xb2\xd1\x8e", "\xff\xfe"}) {
+        const std::string folder = dir_.file(tmp);
+        fs::create_directory(folder);
+        for (const char* name : {"zyrstd-demo-dmm.log", "zyrstd-demo-trace.log"})
+            fs::create_symlink(precious, folder + "/" + name);
+        ::setenv("TMPDIR", folder.c_str(), 1);
+        const Outcome o = zyrstd({"demo"});
+        saved ? ::setenv("TMPDIR", savedText.c_str(), 1) : ::unsetenv("TMPDIR");
+        EXPECT_EQ(o.exitCode, 0) << o.err;
+        for (const std::string& line :
+             {"the trace log (" + folder + "/zyrstd-demo-", std::string("/trace.log):\n   | "),
+              "session file: " + folder + "/zyrstd-demo-",
+              std::string(R"("key":"SurfaceCount","time":)"),
+              std::string(R"("type":"session_close")")})
+            EXPECT_NE(o.out.find(line), std::string::npos) << tmp << ": no " << line;
+        EXPECT_EQ(std::distance(fs::directory_iterator(folder), {}), 2) << tmp;
+    }
     EXPECT_EQ(readFile(precious), "keep");
-    EXPECT_EQ(listing(), (Args{"precious", "zyrstd-demo-dmm.log", "zyrstd-demo-trace.log"}));
 }
 
+// The library's reports, whose texts its own tests pin, in UTF-8 and followed by the timing
+// lines; a report that cannot be read is named on standard error and fails the command.
 TEST_F(ZyrstdToolTest, HwinfoPrintsTheReportsInUtf8) {
     const std::string root = dir_.file("root");
-    file("root/proc/cpuinfo",
-         "processor\t: 0\nmodel name\t: Intel(R) Xeon(R) Gold 6230 \xe2\x84\xa2\n");
+    file("root/proc/cpuinfo", "processor\t: 0\nmodel name\t: Xeon \xe2\x84\xa2 \xf0\x9f\x98\x80\n");
     file("root/etc/os-release", "PRETTY_NAME='Debian 12'\n");
-    file("root/proc/meminfo", "MemTotal:        8388608 kB\nCommitLimit:     1000000 kB\n"
-                              "Committed_AS:     250000 kB\n");
-    file("root/proc/stat", "cpu  1 1 1 1 0 0 0 0\ncpu0 1 1 1 1 0 0 0 0\n");
-    file("root/sys/block/sda/device/model", "Disk One\n");
+    file("root/proc/meminfo", "MemTotal:        1048576 kB\n");
     const Outcome o = zyrstd({"hwinfo", "--root", root});
-    EXPECT_TRUE(o.exitCode == 0 && o.err.empty() && o.out.back() == '\n') << o.err;
-    EXPECT_TRUE(zyrtest::startsWith(o.out, "\tMemory 1\n\t\tCapacity: 8192 MB\n")) << o.out;
+    EXPECT_EQ(o.exitCode, 1);
     size_t at = 0;
     for (const char* part :
-         {"\tOperating System \n\t\tCaption: Debian 12\n", "\tProcessor 1\n",
-          "\t\tName: Intel(R) Xeon(R) Gold 6230 \xe2\x84\xa2\n", "\tDisk 1\n",
-          "\tMemory Performance\n\t\tMEM: 256000000 bytes of1024000000 bytes = 25 % in use\n",
-          "\tCPU Performance\n\t\tCPU: 0% busy\n\t\tCore 1 : 0 % busy\n\nTimer Accuracy -- ",
-          "\nClocks Per Second -- ", "\nMeasured Bus Speed (using SIMD 'movntps') -- ",
+         {"\tMemory 1\n\t\tCapacity: 1024 MB\n", "\tOperating System \n",
+          "\t\tName: Xeon \xe2\x84\xa2 \xf0\x9f\x98\x80\n", "\nTimer Accuracy -- ",
           "\nMeasured Cache Memory Speed (using \"C\" loop) -- "}) {
         EXPECT_NE(at = o.out.find(part, at), std::string::npos) << part << " in order";
         at = at == std::string::npos ? 0 : at;
     }
-
-    fs::remove_all(root);
-    file("root/proc/meminfo", "MemTotal:        1048576 kB\n");
-    const Outcome partial = zyrstd({"hwinfo", "--root", root});
-    EXPECT_EQ(partial.exitCode, 1);
-    EXPECT_TRUE(partial.out.find("\tMemory 1\n\t\tCapacity: 1024 MB\n") != std::string::npos &&
-                partial.out.find("\nTimer Accuracy -- ") != std::string::npos);
-    std::string err;
-    for (const char* what : {"processors and operating system", "disks", "memory performance",
-                             "processor performance"})
-        err += "zyrstd: hwinfo: cannot read the " + std::string(what) + "\n";
-    EXPECT_EQ(partial.err, err);
-    expectFailure(zyrstd({"hwinfo", "--bogus"}), 2, "usage: zyrstd hwinfo [--root DIR]");
+    EXPECT_EQ(o.out.back(), '\n');
+    EXPECT_EQ(o.err, "zyrstd: hwinfo: cannot read the disks\nzyrstd: hwinfo: cannot read the "
+                     "memory performance\nzyrstd: hwinfo: cannot read the processor performance\n");
 }

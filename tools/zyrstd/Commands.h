@@ -1,6 +1,10 @@
 // The zyrstd sub-commands; each returns the process exit code.
 #pragma once
 
+#include <cstdio>
+#include <string>
+#include <string_view>
+
 namespace zyrtool {
 
 // Every sub-command gets argv[0] = its own name, then its arguments.
@@ -16,5 +20,11 @@ int runDecode(int argc, char** argv);
 int runConfig(int argc, char** argv);
 // hwinfo [--root DIR]: the hardware reports and the timing lines, in UTF-8.
 int runHwinfo(int argc, char** argv);
+
+// Prints the usage of the command `name`: its synopsis and what it does.
+void printCommandUsage(std::FILE* out, std::string_view name);
+// Prints "zyrstd: COMMAND: WHY" and the command's usage to standard error; returns the exit
+// code of a usage error.
+int usageError(std::string_view command, const std::string& why);
 
 } // namespace zyrtool

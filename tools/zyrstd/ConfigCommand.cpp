@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "Commands.h"
+#include "ToolSupport.h"
 #include "ZYRHostKit.h"
 #include "ZYRStd.h"
 #include "zyr/std/config/internal/ZYRStartupOptionKeys.h"
@@ -18,8 +19,6 @@
 namespace zyrtool {
 
 namespace {
-
-constexpr int kUsageError = 2;
 
 struct Pair {
     std::string key;
@@ -121,12 +120,22 @@ void printOptions() {
 } // namespace
 
 int runConfig(int argc, char** argv) {
-    const std::vector<const char*> files(argv + 1, argv + argc);
-    const bool defaults = files.size() == 1 && std::string_view(files[0]) == "--defaults";
-    if (files.empty()) {
-        std::fputs("zyrstd: config: no setup file given\nTry 'zyrstd --help'.\n", stderr);
-        return kUsageError;
+    std::vector<const char*> files;
+    bool defaults = false, optionsDone = false;
+    for (int i = 1; i < argc; ++i) {
+        const std::string_view arg = argv[i];
+        if (!optionsDone && arg == "--")
+            optionsDone = true;
+        else if (!optionsDone && arg == "--defaults")
+            defaults = true;
+        else if (!optionsDone && arg.size() > 1 && arg[0] == '-')
+            return usageError("config", "unknown option '" + std::string(arg) + "'");
+        else
+            files.push_back(argv[i]);
     }
+    if (files.empty() == !defaults)
+        return usageError("config",
+                          defaults ? "--defaults takes no setup file" : "no setup file given");
 
     // Everything is parsed before anything is set, so that a bad file leaves no output.
     std::vector<Pair> pairs;

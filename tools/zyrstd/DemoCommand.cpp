@@ -179,7 +179,9 @@ void tracedJob(const WorkFolder& work) {
     {
         // The job's trace configuration: where the log goes and how much each area says.
         CZYRDict config;
-        config.set(CZYRUniString("Path"), CZYRUniString(logPath.c_str()));
+        // The path's bytes as UTF-16, which the library turns back into the same bytes.
+        config.set(CZYRUniString("Path"),
+                   CZYRUniString(ZYRHostKit::utf8ToUTF16(logPath.c_str()).c_str()));
         config.set(CZYRUniString("Render"), areaLevel("All", 3));
         config.set(CZYRUniString("Memory"), areaLevel("All", 4));
         CZYRDict params;
@@ -230,7 +232,7 @@ void analyticsSession(const WorkFolder& work) {
     }
     InitCommonUniStrings();
     InitDynamicUniStringCache();
-    const std::u16string folder16(folder.begin(), folder.end());
+    const CZYRWString folder16 = ZYRHostKit::utf8ToUTF16(folder.c_str());
     ZYRSetAnalyticsActive(true);
     ZYRSetAnalyticsLogFolder(folder16.c_str());
     ZYRAnalyticsManagerInit();
@@ -286,10 +288,8 @@ void analyticsSession(const WorkFolder& work) {
 } // namespace
 
 int runDemo(int argc, char**) {
-    if (argc > 1) {
-        std::fputs("zyrstd: demo takes no arguments\n", stderr);
-        return 2;
-    }
+    if (argc > 1)
+        return usageError("demo", "takes no arguments");
     section("Start-up");
     // Level 2 keeps every block with its allocation number, so that leaks can be named.
     ::setenv("ZYR_MEMORY_STAT", "2", 1);

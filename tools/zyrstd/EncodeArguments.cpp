@@ -1,23 +1,17 @@
 // The arguments of zyrstd encode and decode.
 #include "EncodeArguments.h"
 
-#include <cstdio>
 #include <cstring>
 #include <string_view>
 #include <vector>
 
-#include "ToolSupport.h"
+#include "Commands.h"
 
 namespace zyrtool {
 
 int parseEncodeArguments(int argc, char** argv, bool encoding, EncodeArguments& args) {
-    const char* command = encoding ? "encode" : "decode";
-    auto usage = [&](const std::string& why) {
-        std::fprintf(stderr, "zyrstd: %s: %s\nusage: %s\n", command, why.c_str(),
-                     encoding ? "zyrstd encode ascii85|asciihex [--prefix P] [--eod E] [--no-z] "
-                                "[IN [OUT]]"
-                              : "zyrstd decode ascii85|asciihex [IN [OUT]]");
-        return kUsageError;
+    const auto usage = [&](const std::string& why) {
+        return usageError(encoding ? "encode" : "decode", why);
     };
     std::vector<std::string> positional;
     bool optionsDone = false;

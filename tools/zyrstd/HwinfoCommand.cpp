@@ -30,15 +30,11 @@ void emit(const std::string& text) {
 int runHwinfo(int argc, char** argv) {
     const char* root = "/";
     for (int i = 1; i < argc; ++i) {
-        if (std::strcmp(argv[i], "--root") == 0 && i + 1 < argc) {
-            root = argv[++i];
-        } else {
-            std::fprintf(stderr,
-                         "zyrstd: hwinfo: unexpected argument '%s'\n"
-                         "usage: zyrstd hwinfo [--root DIR]\n",
-                         argv[i]);
-            return kUsageError;
-        }
+        if (std::strcmp(argv[i], "--root") != 0)
+            return usageError("hwinfo", std::string("unexpected argument '") + argv[i] + "'");
+        if (i + 1 >= argc)
+            return usageError("hwinfo", "--root needs a folder");
+        root = argv[++i];
     }
     std::unique_ptr<ZYRStd::IHardwareInfo> info(ZYRStd::createHardwareInfo(root));
     if (!info)

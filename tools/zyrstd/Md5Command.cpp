@@ -92,7 +92,17 @@ std::string formatLine(const ZYRStd::ZYRDigest& digest, std::string_view name) {
 } // namespace
 
 int runMd5(int argc, char** argv) {
-    std::vector<std::string_view> names(argv + 1, argv + argc);
+    std::vector<std::string_view> names;
+    bool optionsDone = false;
+    for (int i = 1; i < argc; ++i) {
+        const std::string_view arg = argv[i];
+        if (!optionsDone && arg == "--")
+            optionsDone = true;
+        else if (!optionsDone && arg.size() > 1 && arg[0] == '-')
+            return usageError("md5", "unknown option '" + std::string(arg) + "'");
+        else
+            names.push_back(arg);
+    }
     if (names.empty())
         names.emplace_back("-");
 
