@@ -288,11 +288,12 @@ void CZYRMaskCache::freeBlock(RecordBlock* block) const {
     ZYRFree(block);
 }
 
-ZYR_MaskRec* CZYRMaskCache::allocateRecord(unsigned int bytes, bool zeroFill) {
+ZYR_MaskRec* CZYRMaskCache::allocateRecord(unsigned int bytes, bool zeroFill, bool despiteStatus) {
     if (!currentBlock_->freeList) {
         tZYRVirtualMemoryInfo info{};
         VirtualMemStatus(&info);
-        if (info.availableForAllocation < uint64_t{recordArrayBytes_} + sizeof(RecordBlock))
+        if (!despiteStatus &&
+            info.availableForAllocation < uint64_t{recordArrayBytes_} + sizeof(RecordBlock))
             return nullptr;
         RecordBlock* const block = makeBlock();
         if (!block)
@@ -312,11 +313,20 @@ ZYR_MaskRec* CZYRMaskCache::allocateRecord(unsigned int bytes, bool zeroFill) {
     return rec;
 }
 
-ZYR_MaskRec* CZYRMaskCache::reservedRecord(unsigned int bytes, bool zeroFill) {
+ZYR_MaskRec* CZYRMaskCache::fallbackRecord(unsigned int bytes, bool zeroFill) {
+    if (reservedInUse_) {
+        // The memory status may report no room where there is some (a large address-space
+        // reservation): only a real failure to get storage ends the request.
+        ZYR_MaskRec* const rec = allocateRecord(bytes, zeroFill, true);
+        if (!rec)
+            throwNoStorage(__LINE__);
+        return rec;
+    }
     if (bytes > RESERVED_MASK_BYTES)
         throwAssertionFailed(kSource, __LINE__);
     if (zeroFill)
         std::memset(reserved_.data, 0, bytes);
+    reservedInUse_ = true;
     return &reserved_;
 }
 
@@ -331,7 +341,7 @@ ZYR_MaskRec* CZYRMaskCache::GetMaskRec(unsigned int width, unsigned int height) 
     const unsigned int bytes = maskRowBytes(width) * height;
     ZYR_MaskRec* rec = allocateRecord(bytes, true);
     if (!rec)
-        rec = reservedRecord(bytes, true);
+        rec = fallbackRecord(bytes, true);
     rec->width = static_cast<unsigned short>(width);
     rec->height = static_cast<unsigned short>(height);
     rec->flag = 0;
@@ -349,7 +359,7 @@ ZYR_MaskRec* CZYRMaskCache::CreateBitmapMask(unsigned char* const src, unsigned 
     if (!useReserved && size <= (fourBit ? MAX_ALLOCATED_4BIT_MASK : MAX_ALLOCATED_1BIT_MASK))
         rec = allocateRecord(size, false);
     if (!rec)
-        rec = reservedRecord(size, false);
+        rec = fallbackRecord(size, false);
     rec->flag = 0;
     if (size == 0) {
         rec->width = rec->height = 0;
@@ -370,13 +380,14 @@ ZYR_MaskRec* CZYRMaskCache::CreateBitmapMask(unsigned char* const src, unsigned 
 }
 
 void CZYRMaskCache::DeleteBitmapMask(ZYR_MaskRec* rec) {
-    if (!rec || rec == &reserved_)
-        return;
-    releaseRecord(rec);
+    if (rec == &reserved_)
+        reservedInUse_ = false;
+    else if (rec)
+        releaseRecord(rec);
 }
 
 ZYR_MaskRec* CZYRMaskCache::FallbackToReservedMask(ZYR_MaskRec* rec, unsigned int size) {
-    if (rec == &reserved_)
+    if (rec == &reserved_ || (rec && reservedInUse_))
         return rec;
     // Copying more than either buffer holds would run past it.
     if (!rec || size > RESERVED_MASK_BYTES || size > allocator_->GetPtrSize(rec->data))

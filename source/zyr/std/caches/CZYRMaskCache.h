@@ -52,16 +52,19 @@ public:
 
     // A zeroed 1-bit mask. Falls back to the reserved mask when no storage can be had; a
     // mask larger than the reserved buffer then raises kZYRErrorAssertionFailed, as does a
-    // width or height above MAX_MASK_EXTENT.
+    // width or height above MAX_MASK_EXTENT. Two live masks never share storage: while the
+    // reserved mask is in use a request that gets no storage, whatever the memory status
+    // said, throws kZYRErrorOutOfMemory "failed to allocate mask cache storage".
     ZYR_MaskRec* GetMaskRec(unsigned int width, unsigned int height);
     // A mask filled from `src` (rows srcRowBytes apart): bit order reversed for 1-bit
     // sources, nibbles swapped for 4-bit ones. `size` receives the mask's bytes.
     ZYR_MaskRec* CreateBitmapMask(unsigned char* const src, unsigned int width,
                                   unsigned int srcRowBytes, unsigned int height, unsigned int& size,
                                   bool fourBit, bool useReserved);
-    // Null and the reserved mask are left alone.
+    // Null is left alone; the reserved mask becomes free for the next fallback.
     void DeleteBitmapMask(ZYR_MaskRec* rec);
-    // Moves the first `size` bytes of a mask into the reserved mask and frees the mask.
+    // Moves the first `size` bytes of a mask into the reserved mask and frees the mask; while
+    // another mask holds the reserved one, `rec` stays as it is and is returned.
     ZYR_MaskRec* FallbackToReservedMask(ZYR_MaskRec* rec, unsigned int size);
     bool isReservedMask(const ZYR_MaskRec* rec) const { return rec == &reserved_; }
     // The allocator's bytes now held and at their peak.
@@ -76,10 +79,12 @@ private:
 
     RecordBlock* makeBlock() const;
     void freeBlock(RecordBlock* block) const;
-    // A record with `bytes` of storage, zero-filled when asked, or null.
-    ZYR_MaskRec* allocateRecord(unsigned int bytes, bool zeroFill);
-    // The reserved record for a mask of `bytes`; too large is an assertion.
-    ZYR_MaskRec* reservedRecord(unsigned int bytes, bool zeroFill);
+    // A record with `bytes` of storage, zero-filled when asked, or null. A new record block
+    // is made only when the memory status reports room for it, unless `despiteStatus`.
+    ZYR_MaskRec* allocateRecord(unsigned int bytes, bool zeroFill, bool despiteStatus = false);
+    // The reserved record for a mask of `bytes` (too large is an assertion); while it is in
+    // use, storage of its own for the mask or the out-of-memory error.
+    ZYR_MaskRec* fallbackRecord(unsigned int bytes, bool zeroFill);
     void releaseRecord(ZYR_MaskRec* rec);
     void releaseAll();
 
@@ -88,6 +93,7 @@ private:
     unsigned int recordArrayBytes_;
     unsigned int recordsPerBlock_;
     ZYR_MaskRec reserved_{};
+    bool reservedInUse_ = false;
     ChunkLink* chunks_ = nullptr;
     std::unique_ptr<VariableSizeAllocator> allocator_;
 };

@@ -121,6 +121,11 @@ _t_Nlink* IZYRCache::hcGetEntry(void* key, bool force) {
         }
     }
     void* memory = pool_->Alloc();
+    if (!memory && recycler_) {
+        // Entries dropped one by one still wait in the recycler: they are free to take.
+        hcEmptyRecycler();
+        memory = pool_->Alloc();
+    }
     if (!memory) {
         int32_t dropped = hcScavenger(howManyToRelease_, key);
         if (dropped == 0)

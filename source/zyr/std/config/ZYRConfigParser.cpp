@@ -7,7 +7,9 @@
 #include <cmath>
 #include <cstdlib>
 #include <cstring>
+#include <exception>
 #include <limits>
+#include <utility>
 
 #include "zyr/std/config/internal/ZYRConfigValues.h"
 #include "zyr/std/core/CZYRError.h"
@@ -61,6 +63,7 @@ public:
     ConfigScanner(CZYRBaseStream& stream, IZYRConfigParserCBProc& cb)
         : stream_(stream), cb_(cb), lineCb_(dynamic_cast<IZYRConfigParserLineCBProc*>(&cb)) {
         block_.grow(kBlockBytes + 1); // one spare byte for a terminating zero
+        std::memset(block_.data(), 0, kBlockBytes);
     }
 
     void run() {
@@ -117,12 +120,32 @@ public:
 
 private:
     bool refill() {
+        if (failure_)
+            std::rethrow_exception(std::exchange(failure_, nullptr));
         if (atEnd_)
             return false;
         pos_ = 0;
-        end_ = stream_.read(block_.data(), 1, kBlockBytes);
-        atEnd_ = end_ == 0;
-        return !atEnd_;
+        unsigned char* const block = block_.data();
+        // A read may fill part of the block and then throw (a decoding filter meeting a bad
+        // byte). The whole lines it delivered are parsed before the error goes on, as a
+        // byte-by-byte reader would have: on a cleared block they end at its last line end.
+        // Bytes beyond a successful read's count were never written, so clearing what the
+        // last read delivered clears the block.
+        std::memset(block, 0, end_);
+        try {
+            end_ = stream_.read(block, 1, kBlockBytes);
+        } catch (...) {
+            unsigned int delivered = kBlockBytes;
+            while (delivered > 0 && !is(block[delivered - 1], kLineEnd))
+                --delivered;
+            if (delivered == 0)
+                throw;
+            failure_ = std::current_exception();
+            end_ = delivered;
+            atEnd_ = true;
+        }
+        atEnd_ = atEnd_ || end_ == 0;
+        return end_ > 0;
     }
 
     // LF, CR and CR LF each end one line.
@@ -174,6 +197,7 @@ private:
     unsigned int pos_ = 0;
     unsigned int end_ = 0;
     bool atEnd_ = false;
+    std::exception_ptr failure_; // a failed read's error, raised once its lines are parsed
     unsigned int physicalLine_ = 1;
     bool afterCR_ = false;
     unsigned char line_[kMaxLineBytes + 1];

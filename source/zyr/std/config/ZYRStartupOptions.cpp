@@ -101,7 +101,7 @@ unsigned long long roundUpToPage(unsigned long long bytes) {
 unsigned long long defaultDLCacheRAM() {
     tZYRVirtualMemoryInfo info{};
     VirtualMemStatus(&info);
-    return roundUpToPage(std::min(info.totalPhysical, info.totalVirtual) / kDLCacheRAMDivisor);
+    return std::min(info.totalPhysical, info.totalVirtual) / kDLCacheRAMDivisor;
 }
 
 struct NamedValue {
@@ -225,8 +225,9 @@ void ruleRecord_maxRAM(sDLCacheOptions* options, const char* value) {
     // A negative value, or none at all, gives the default budget.
     bool found = false;
     const long long bytes = detail::readInt64(value, &found);
-    options->maxRAM = found && bytes >= 0 ? roundUpToPage(static_cast<unsigned long long>(bytes))
-                                          : defaultDLCacheRAM();
+    // Only the key rounds to whole pages; the record's default stays as computed.
+    options->maxRAM = roundUpToPage(found && bytes >= 0 ? static_cast<unsigned long long>(bytes)
+                                                        : defaultDLCacheRAM());
 }
 
 void ruleRecord_maxDisk(sDLCacheOptions* options, const char* value) {

@@ -22,7 +22,7 @@ struct sMTOptions {
 };
 
 struct sDLCacheOptions {
-    unsigned long long maxRAM;    // "XObjDLCacheMaxRAM": bytes, a whole number of pages
+    unsigned long long maxRAM;    // "XObjDLCacheMaxRAM": bytes; whole pages once the key is set
     long long maxDisk;            // "XObjDLCacheMaxDisk": bytes
     unsigned char reserved[16];   // the engine's own fields; no key sets them
     bool vdpThroughFlattener;     // "VDPThroughFlattener"

@@ -19,11 +19,12 @@ constexpr int kMissingProgressLine = 65;
 // The registered value of `id` as an interface with a new reference, or null.
 template <class Interface>
 C_SmartPtr<Interface> registered(const CZYRInterfaceRegistry& interfaces, int id) {
-    CZYRRegisterItemBase* item = interfaces.queryInterface(id);
+    // A host may have registered an item of another type under the identifier: treated as
+    // missing rather than read as the wrong type.
+    auto* item = dynamic_cast<CZYRCRegisterItem<Interface*>*>(interfaces.queryInterface(id));
     if (!item)
         return {};
-    return C_SmartPtr<Interface>(*static_cast<CZYRCRegisterItem<Interface*>*>(item)->getInterface(),
-                                 true);
+    return C_SmartPtr<Interface>(*item->getInterface(), true);
 }
 
 int pixels(double extent, double resolution) {

@@ -27,7 +27,10 @@ C_SmartPtr<Interface> getFromJob(const C_SmartPtr<I_Job>& job, Getter<Interface>
                         kNoInterfaceSetLine);
     Interface* raw = nullptr;
     const bool found = (set.get()->*getter)(&raw, err);
-    C_SmartPtr<Interface> result(found ? raw : nullptr, false);
+    // What the getter handed out is ours even when it says "not found": released then.
+    C_SmartPtr<Interface> result(raw, false);
+    if (!found)
+        result.reset();
     // A getter that says "found" but hands out nothing has not found it either.
     if (!result && required)
         err.setError(kZYRErrorBadParam, "Required OEM interface not found", kSource,

@@ -19,6 +19,7 @@
 #include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/values/CZYRCommonUniStrings.h"
 #include "zyr/std/values/CZYRString.h"
+#include "zyr/std/values/internal/ZYRDictChanges.h"
 
 namespace ZYRStd {
 
@@ -258,43 +259,6 @@ bool isEmptyDict(I_Dict* dict) {
     return dict->getSize(err) == 0;
 }
 
-// Copies every entry into `target`, replacing entries of the same key.
-class MergeInto final : public I_DictEnumProcs {
-public:
-    explicit MergeInto(I_Dict* target) : target_(target) {}
-    bool enumProc(I_UniString* key, I_DataBuffer* value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, I_Array* value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, I_Dict* value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, I_UniString* value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, bool value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, double value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, unsigned int value, I_Error& err) override {
-        return put(key, value, err);
-    }
-    bool enumProc(I_UniString* key, int32_t value, I_Error& err) override {
-        return put(key, value, err);
-    }
-
-private:
-    template <class T> bool put(I_UniString* key, T value, I_Error& err) {
-        target_->set(key, value, err);
-        return !err.errorOccurred();
-    }
-    I_Dict* target_;
-};
-
 // Lets a CZYRError through and turns anything else into the operation's unknown error.
 template <class Body> auto guarded(const char* unknownMessage, int line, Body&& body) {
     try {
@@ -445,24 +409,23 @@ void CZYRTraceMsg::internalInit() {
         if (!config && !global)
             return; // tracing is off for this job
 
-        if (global && isEmptyDict(config.get())) {
+        // Both are kept by reference and read only at the keys asked for: a copy or a walk of
+        // the whole would have to cope with cycles and deep nesting in the host's data.
+        if (global && isEmptyDict(config.get()))
             config = global;
-        } else {
-            // A copy of the job's configuration, merged into: the job's dictionary belongs
-            // to the host, may be finalised or read by other threads, and levels looked up
-            // once may be cached only while the configuration cannot change.
-            config = C_SmartPtr<I_Dict>(config->clone(err), false);
-            throwCZYRErrorIfErrorOccurred(err);
-            if (global) {
-                MergeInto merge(config.get());
-                global->enumerate(&merge, err);
-                throwCZYRErrorIfErrorOccurred(err);
-            }
-        }
+        else
+            global_ = global;
         config_ = CZYRDict(config);
-        configEmpty_ = isEmptyDict(config.get());
+        configEmpty_ = isEmptyDict(config.get()) && isEmptyDict(global_.get());
+        configChanges_ = dictChangeCount(config.get());
+        if (global_) {
+            globalChanges_ = dictChangeCount(global_.get());
+            if (!globalChanges_)
+                configChanges_ = nullptr;
+        }
 
-        const CZYRUniString path = readString(config.get(), CZYRUniString("Path").getImpl());
+        const CZYRUniString keyPath("Path");
+        const CZYRUniString path = readString(holderOf(keyPath.getImpl()), keyPath.getImpl());
         {
             TraceLog& log = traceLog();
             ZYRStd::mutex::scoped_lock lock(log.mutex);
@@ -477,11 +440,11 @@ void CZYRTraceMsg::internalInit() {
         }
 
         int32_t value = 0;
-        if (readNumber(config.get(), keyAll_.getImpl(), value)) {
+        if (readNumber(holderOf(keyAll_.getImpl()), keyAll_.getImpl(), value)) {
             fixedLevelSet_ = true;
             fixedLevel_ = mapToTraceMsgLevel(value);
         }
-        if (readNumber(config.get(), keyDefault_.getImpl(), value))
+        if (readNumber(holderOf(keyDefault_.getImpl()), keyDefault_.getImpl(), value))
             defaultLevel_ = mapToTraceMsgLevel(value);
     });
 }
@@ -494,25 +457,56 @@ int32_t CZYRTraceMsg::configuredLevel(const CZYRUniString& area,
         return fixedLevel_;
     if (area.isEmpty())
         return 0;
-    for (const CachedLevel& cached : levelCache_)
+    if (!configChanges_)
+        return lookUpLevel(areaDict(area).get(), category);
+
+    std::lock_guard<std::mutex> lock(levelCache_.mutex);
+    LevelCache& cache = levelCache_;
+    // Relaxed loads: a change made on this thread is seen in order anyway, and one made on
+    // another thread reaches this one only through the host's own synchronisation.
+    const uint32_t configNow = configChanges_->load(std::memory_order_relaxed);
+    const uint32_t globalNow = globalChanges_ ? globalChanges_->load(std::memory_order_relaxed) : 0;
+    if (!cache.valid || cache.configSeen != configNow || cache.globalSeen != globalNow) {
+        cache.entries = {};
+        cache.valid = true;
+        cache.configSeen = configNow;
+        cache.globalSeen = globalNow;
+    }
+    for (const CachedLevel& cached : cache.entries)
         if (cached.area.getImpl() == area.getImpl() &&
-            cached.category.getImpl() == category.getImpl())
+            cached.category.getImpl() == category.getImpl() &&
+            (!cached.areaChanges ||
+             cached.areaChanges->load(std::memory_order_relaxed) == cached.areaSeen))
             return cached.level;
-    const int32_t level = lookUpLevel(area, category);
+    C_SmartPtr<I_Dict> dict = areaDict(area);
+    const int32_t level = lookUpLevel(dict.get(), category);
+    const std::atomic<uint32_t>* changes = dict ? dictChangeCount(dict.get()) : nullptr;
+    if (dict && !changes)
+        return level; // another implementation's dictionary: its changes cannot be seen
     // The entry keeps both strings alive, so their addresses cannot be reused meanwhile.
-    levelCache_[nextCachedLevel_] = {area, category, level};
-    nextCachedLevel_ = (nextCachedLevel_ + 1) % kCachedLevels;
+    const uint32_t seen = changes ? changes->load(std::memory_order_relaxed) : 0;
+    cache.entries[cache.next] = {area, category, level, std::move(dict), changes, seen};
+    cache.next = (cache.next + 1) % kCachedLevels;
     return level;
 }
 
-int32_t CZYRTraceMsg::lookUpLevel(const CZYRUniString& area, const CZYRUniString& category) const {
-    const C_SmartPtr<I_Dict> areaDict = readDict(config_.getImpl(), area.getImpl());
+I_Dict* CZYRTraceMsg::holderOf(I_UniString* key) const {
+    if (global_ && global_->getType(key) != kZYRValTypeNone)
+        return global_.get();
+    return config_.getImpl();
+}
+
+C_SmartPtr<I_Dict> CZYRTraceMsg::areaDict(const CZYRUniString& area) const {
+    return readDict(holderOf(area.getImpl()), area.getImpl());
+}
+
+int32_t CZYRTraceMsg::lookUpLevel(I_Dict* areaDict, const CZYRUniString& category) const {
     if (!areaDict)
         return 0;
     int32_t value = 0;
-    if (readNumber(areaDict.get(), keyAll_.getImpl(), value) ||
-        (!category.isEmpty() && readNumber(areaDict.get(), category.getImpl(), value)) ||
-        readNumber(areaDict.get(), keyDefault_.getImpl(), value))
+    if (readNumber(areaDict, keyAll_.getImpl(), value) ||
+        (!category.isEmpty() && readNumber(areaDict, category.getImpl(), value)) ||
+        readNumber(areaDict, keyDefault_.getImpl(), value))
         return mapToTraceMsgLevel(value);
     return defaultLevel_;
 }

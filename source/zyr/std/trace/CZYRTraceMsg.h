@@ -3,7 +3,9 @@
 #pragma once
 
 #include <array>
+#include <atomic>
 #include <cstdint>
+#include <mutex>
 #include <string>
 
 #include "C_SmartPtr.h"
@@ -66,8 +68,9 @@ private:
     static C_SmartPtr<ZYRPublic::I_Dict> tracingDict;
 };
 
-// One thread at a time. Failures are thrown as CZYRError; anything else thrown inside
-// becomes kZYRErrorUnknown "Unknown exception in CZYRTraceMsg::<operation>".
+// One thread at a time, but for getTraceMsgLevel, which any number may ask. Failures are thrown as
+// CZYRError; anything else thrown inside becomes kZYRErrorUnknown "Unknown exception in
+// CZYRTraceMsg::<operation>".
 class ZYRSTD_API CZYRTraceMsg : public CZYRClientBase {
 public:
     // Throws the job look-up's error when the job has no progress interface.
@@ -115,20 +118,49 @@ private:
     void continuation(const sZYRTraceMsg& msg);
     bool routesToHost(const CZYRUniString& area, const CZYRUniString& category) const;
     int32_t configuredLevel(const CZYRUniString& area, const CZYRUniString& category) const;
-    int32_t lookUpLevel(const CZYRUniString& area, const CZYRUniString& category) const;
+    // The dictionary that answers for a top-level key: the process-wide one when it has the
+    // key, else the job's.
+    ZYRPublic::I_Dict* holderOf(ZYRPublic::I_UniString* key) const;
+    C_SmartPtr<ZYRPublic::I_Dict> areaDict(const CZYRUniString& area) const;
+    int32_t lookUpLevel(ZYRPublic::I_Dict* areaDict, const CZYRUniString& category) const;
 
-    // The levels of the latest (area, category) pairs, by string object: the configuration
-    // is this object's own and does not change, so a level once found stays right.
+    // The levels of the latest (area, category) pairs, by string object. A level stays
+    // right while neither the configuration nor the area's dictionary has changed, which
+    // their change counts tell; dictionaries of other implementations are never cached.
     struct CachedLevel {
         CZYRUniString area;
         CZYRUniString category;
         int32_t level = 0;
+        C_SmartPtr<ZYRPublic::I_Dict> areaDict; // null when the area has none
+        const std::atomic<uint32_t>* areaChanges = nullptr;
+        uint32_t areaSeen = 0;
     };
     static constexpr size_t kCachedLevels = 4;
+    // Guarded by its own lock, as getTraceMsgLevel is const and may be asked from several
+    // threads; a copy starts empty.
+    struct LevelCache {
+        LevelCache() = default;
+        LevelCache(const LevelCache&) {}
+        LevelCache& operator=(const LevelCache&) {
+            std::lock_guard<std::mutex> lock(mutex);
+            entries = {};
+            valid = false;
+            return *this;
+        }
+        std::mutex mutex;
+        std::array<CachedLevel, kCachedLevels> entries;
+        size_t next = 0;
+        bool valid = false; // the entries were made with the counts below
+        uint32_t configSeen = 0;
+        uint32_t globalSeen = 0;
+    };
 
     C_SmartPtr<I_Job> job_;
     C_SmartPtr<I_Surface> surface_;
-    CZYRDict config_;
+    CZYRDict config_; // the job's configuration, or the process-wide one when it has none
+    // The process-wide configuration over the job's: its keys replace the job's, read in
+    // place, as the job's dictionary is the host's and may be finalized.
+    C_SmartPtr<ZYRPublic::I_Dict> global_;
     C_SmartPtr<I_OEMProgressInterface> progress_;
     bool fixedLevelSet_ = false;
     int fixedLevel_ = 0;
@@ -142,8 +174,9 @@ private:
     bool sendToHost_ = false;
     bool configEmpty_ = true;
     int32_t jobNumber_ = 0; // "JPJobID" of the job's parameters, 0 without one
-    mutable std::array<CachedLevel, kCachedLevels> levelCache_;
-    mutable size_t nextCachedLevel_ = 0;
+    const std::atomic<uint32_t>* configChanges_ = nullptr; // null: levels are not cached
+    const std::atomic<uint32_t>* globalChanges_ = nullptr;
+    mutable LevelCache levelCache_;
 };
 
 // Closes the trace log; the next configuration that enables tracing opens one again.

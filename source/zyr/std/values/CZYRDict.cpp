@@ -11,6 +11,7 @@
 #include "zyr/std/memory/CZYRStdAllocator.h"
 #include "zyr/std/values/internal/CZYRValue.h"
 #include "zyr/std/values/internal/IImpDictEnumProcs.h"
+#include "zyr/std/values/internal/ZYRDictChanges.h"
 
 namespace ZYRStd {
 
@@ -102,6 +103,7 @@ public:
                 if (matches(*link, key, hash)) {
                     destroy(std::exchange(*link, (*link)->next));
                     --count_;
+                    counted();
                     return;
                 }
             }
@@ -161,7 +163,16 @@ public:
             });
     }
 
+    const std::atomic<uint32_t>& changes() const { return changes_; }
+
 private:
+    // Changes come from the dictionary's one writer at a time, so a load and a store do;
+    // relaxed is enough because the count only tells a reader that its answers may be stale,
+    // and the reader sees the change itself through whatever ordered it after the writer.
+    void counted() {
+        changes_.store(changes_.load(std::memory_order_relaxed) + 1, std::memory_order_relaxed);
+    }
+
     struct Node {
         Node(I_UniString* k, uint32_t h, const CZYRValue& v) noexcept : key(k), hash(h), value(v) {
             key->addRef();
@@ -298,6 +309,7 @@ private:
                 raise(kZYRErrorBadParam, "Bad argument to IImp_ZYRDict::set", __LINE__);
             refuseIfFinalized();
             insertOrAssign(key, CZYRValue::of(value));
+            counted();
         });
     }
 
@@ -318,9 +330,55 @@ private:
     Buckets buckets_;
     BucketIndex bucketOf_;
     unsigned int count_ = 0;
+    std::atomic<uint32_t> changes_{0};
 };
 
 } // namespace
+
+const std::atomic<uint32_t>* dictChangeCount(I_Dict* dict) {
+    const auto* ours = dynamic_cast<const IImp_ZYRDict*>(dict);
+    return ours ? &ours->changes() : nullptr;
+}
+
+namespace value_detail {
+
+namespace {
+using PendingContainers =
+    std::vector<std::pair<eZYRValType, void*>, CZYRStdAllocator<std::pair<eZYRValType, void*>>>;
+// The outermost release's list on this thread, null while no container is being released.
+thread_local constinit PendingContainers* pendingContainers = nullptr;
+
+void dropReference(eZYRValType tag, void* container) noexcept {
+    if (tag == kZYRValTypeDict)
+        static_cast<I_Dict*>(container)->release();
+    else
+        static_cast<I_Array*>(container)->release();
+}
+} // namespace
+
+void releaseContainer(eZYRValType tag, void* container) noexcept {
+    if (PendingContainers* pending = pendingContainers) {
+        try {
+            pending->emplace_back(tag, container);
+            return;
+        } catch (...) {
+            // No room to wait: released at once, one level deeper.
+        }
+        dropReference(tag, container);
+        return;
+    }
+    PendingContainers pending;
+    pendingContainers = &pending;
+    dropReference(tag, container);
+    while (!pending.empty()) {
+        const auto [nestedTag, nested] = pending.back();
+        pending.pop_back();
+        dropReference(nestedTag, nested);
+    }
+    pendingContainers = nullptr;
+}
+
+} // namespace value_detail
 
 I_Dict* createDict(ZYRPublic::I_Error& err) {
     return ZYRErrorBoundary<I_Dict*>(err, nullptr, "Error in ZYRStd::createDict", kSource, __LINE__,

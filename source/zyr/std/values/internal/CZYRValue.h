@@ -64,6 +64,11 @@ template <> struct ValueKind<I_DataBuffer*> {
     static constexpr const char* mismatch = "Value is not a data buffer";
 };
 
+// Drops one reference of a nested dictionary or array. A container whose last reference
+// goes while another one is being torn down on this thread waits until that one is done,
+// so a chain of nested containers is freed in a loop instead of one stack frame per level.
+void releaseContainer(eZYRValType tag, void* container) noexcept;
+
 // One stored value: a tag and the scalar or the owning object reference it names.
 class CZYRValue {
 public:
@@ -140,10 +145,8 @@ private:
             as<I_UniString*>()->release();
             break;
         case kZYRValTypeDict:
-            as<I_Dict*>()->release();
-            break;
         case kZYRValTypeArray:
-            as<I_Array*>()->release();
+            releaseContainer(tag_, data_.object);
             break;
         case kZYRValTypeDataBuffer:
             as<I_DataBuffer*>()->release();
