@@ -430,6 +430,14 @@ TEST(ZYRCacheTest, RandomRunExhaustedPoolAndEveryAllocationFailing) {
             ASSERT_TRUE(key != 4 || cache.add(5)) << "the last element freed by the sweep";
         }
         EXPECT_TRUE(cache.find(4) && cache.find(5) && cache.find(6));
+        cache.recycle = true; // the pool used up, a removed entry waits in the recycler
+        cache.kept = {4, 5, 6, 7, 8, 9};
+        uint64_t next = 7, removed = 6;
+        while (next < 9 && cache.add(next))
+            ++next;
+        cache.kept.erase(removed);
+        EXPECT_TRUE(next == 8 && cache.hcRemoveEntry(&removed, nullptr));
+        EXPECT_NE(cache.add(9, true), nullptr) << "the recycled entry serves before a refusal";
         host.failAll = false;
     }
     zyrtest::installFront(0);
@@ -537,10 +545,16 @@ TEST(CZYRMaskCacheTest, RecordsWhileMemoryLastsAndTheReservedMaskWithout) {
         ZYR_MaskRec* second = cache.GetMaskRec(100, 10);
         unsigned int size = 0;
         std::vector<unsigned char> src(100, 0x80);
+        // While the reserved mask is in use no other mask may share it.
+        expectError([&] { cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, true); },
+                    ZYRPublic::kZYRErrorOutOfMemory, "failed to allocate mask cache storage",
+                    kMaskSource);
+        EXPECT_EQ(cache.FallbackToReservedMask(second, 40), second);
+        cache.DeleteBitmapMask(large);
+        expectAssertion([&] { cache.GetMaskRec(2000, 2001); });
         ZYR_MaskRec* third = cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, false);
         EXPECT_TRUE(!cache.isReservedMask(second) && cache.isReservedMask(third) &&
                     third->data[0] == 0x01 && third->data[4 * 99] == 0x01);
-        expectAssertion([&] { cache.GetMaskRec(2000, 2001); });
         cache.DeleteBitmapMask(first);
         EXPECT_EQ(cache.GetMaskRec(50, 1), first) << "a freed record serves without new memory";
         cache.DeleteBitmapMask(first);

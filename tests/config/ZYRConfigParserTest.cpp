@@ -182,6 +182,24 @@ TEST_F(ZYRConfigParserTest, DataTypesFilesAndTheirErrors) {
     EXPECT_NE(failure(missing.data(), 2, 1), "no error");
 }
 
+TEST_F(ZYRConfigParserTest, AFailedReadDeliversTheWholeLinesBeforeItsError) {
+    struct Broken : TrickleStream { // fills the block, then fails
+        using TrickleStream::TrickleStream;
+        unsigned int read(void* buf, unsigned int size, unsigned int count) override {
+            TrickleStream::read(buf, size, count);
+            throw CZYRError(ZYRPublic::kZYRErrorTypeCheck, "read failed", "test", 1);
+        }
+    };
+    for (const auto& [text, pairs] : {std::pair{"A=1\nB=2\rC", "A=1|B=2"}, {"A=1", ""}}) {
+        Parsed out;
+        Collector collector(out);
+        CZYRBaseStream stream(CZYRSmartZYRRefPtr<ZYRStreams::IZYRStream>(new Broken(text, 99)));
+        EXPECT_EQ(zyrtest::thrown([&] { ParseConfigsBuffer(stream, collector); }),
+                  "14: read failed (test:1)");
+        EXPECT_EQ(out.pairs, pairs);
+    }
+}
+
 TEST(ZYRConfigValueTest, TrueOrFalseAndHighOrLow) {
     for (const char* yes : {"true", "True", "TRUE", "tRuE", "1", "7", "-1", " 12", "3abc",
                             "99999999999", "4294967296"})

@@ -134,6 +134,12 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
     };
     EXPECT_EQ(attempt(makeSurface(3, job), noProgress), invalid("missing interface", 65));
     EXPECT_EQ(attempt(makeSurface(3, job), noRaster), invalid("missing interface", 57));
+    for (const int id : {kZYRRasterInterfaceID, kZYRProgressInterfaceID}) {
+        Registry wrongType(raster.get(), progress.get()); // an item of another type there
+        registerItem<int>(wrongType.registry, id, nullptr);
+        EXPECT_EQ(attempt(makeSurface(3, job), wrongType),
+                  invalid("missing interface", id == kZYRRasterInterfaceID ? 57 : 65));
+    }
     EXPECT_EQ(attempt(makeSurface(3, C_SmartPtr<ZYRPublic::I_Job>()), full),
               invalid("miss job", 46));
     EXPECT_EQ(attempt(C_SmartPtr<ZYRPublic::I_Surface>(), full), invalid("miss job", 46));

@@ -39,6 +39,10 @@ void checkLookup(const char* name, C_SmartPtr<I> FakeInterfaceSet::*slot, bool r
     const std::string missing = required ? "6: Required OEM interface not found "
                                            "(source/zyr/std/ZYROEMInterfacesInternal:42)"
                                          : "none";
+    set->denyFound = true;
+    EXPECT_EQ(absent(), missing);
+    EXPECT_EQ(held->debugGetRefCount(), 2u) << "what came with \"not found\" was released";
+    set->denyFound = false;
     ((*set).*slot).reset();
     EXPECT_EQ(absent(), missing);
     set->claimFound = true;

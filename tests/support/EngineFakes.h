@@ -110,13 +110,14 @@ public:
     ZYRTEST_SLOT(CalibrationMgr, calibration)
 #undef ZYRTEST_SLOT
     bool claimFound = false; // getters answer "found" even when they hand out nothing
+    bool denyFound = false;  // getters answer "not found" even when they hand out an object
 
 private:
     template <class I> bool give(const C_SmartPtr<I>& held, I** out) {
         *out = held.get();
         if (*out)
             (*out)->addRef();
-        return *out != nullptr || claimFound;
+        return !denyFound && (*out != nullptr || claimFound);
     }
 };
 

@@ -210,8 +210,49 @@ TEST_F(CZYRTraceMsgTest, ProcessWideDictionaryMerges) {
                 merged.getTraceMsgLevel(text("Own"), text("X")) == 3 &&
                 merged.getTraceMsgLevel(text("Own"), text("Y")) == 1 && merged.isSendToHost() &&
                 own.getSize() == 2u);
+    // Changed in place through the process-wide reference, at the top and in an area.
+    CZYRDict live(ZYRTracingDict::getInstance().getTracingDict().get(), true), render;
+    live.get(text("Render"), render);
+    render.set(text("All"), 3);
+    live.set(text("Late"), levels({{"All", 5}}));
+    for (const CZYRTraceMsg* trace : {&alone, &merged})
+        EXPECT_TRUE(trace->getTraceMsgLevel(text("Render"), text("Render")) == 3 &&
+                    trace->getTraceMsgLevel(text("Late"), text("Render")) == 5);
     ZYRTracingDict::getInstance().setTracingDict(CZYRDict());
     EXPECT_FALSE(ZYRTracingDict::getInstance().getTracingDict());
+}
+
+TEST_F(CZYRTraceMsgTest, CyclicAndDeepConfigurationsAreReadOnlyWhereAsked) {
+    CZYRDict config = withPath("stdout", levels({{"X", 2}})), at = config;
+    config.set(text("Loop"), config);
+    for (int i = 0; i < 300; ++i) {
+        CZYRDict next;
+        at.set(text("In"), next);
+        at = next;
+    }
+    EXPECT_EQ(thrown([&] {
+                  const CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config)));
+                  EXPECT_EQ(trace.getTraceMsgLevel(text("Loop"), text("X")), 2);
+              }),
+              "no error");
+    config.remove(text("Loop")); // the cycle would leak
+}
+
+TEST_F(CZYRTraceMsgTest, OneObjectAskedFromTwoThreads) {
+    CZYRDict config = withPath("stdout");
+    const char* const areas[] = {"A", "B", "C", "D", "E", "F"};
+    for (int i = 0; i < 6; ++i)
+        config.set(text(areas[i]), levels({{"All", i}}));
+    const CZYRTraceMsg trace(zyrtest::makeJob(jobParams(config)));
+    auto ask = [&](int offset) { // more areas than remembered levels: the cache keeps changing
+        for (int n = 0; n < 20000; ++n) {
+            const int i = (n + offset) % 6;
+            ASSERT_EQ(trace.getTraceMsgLevel(text(areas[i]), CZYRUniString()), i);
+        }
+    };
+    std::thread first(ask, 0), second(ask, 3);
+    first.join();
+    second.join();
 }
 
 TEST_F(CZYRTraceMsgTest, TwoThreadsNeverMixHeadsAndTexts) {

@@ -338,4 +338,16 @@ TEST(CZYRDictTest, FinalizeCloneBucketsCyclesAndNesting) {
     expectError(cloneErr, kZYRErrorInvalidData, "Container nesting too deep");
     EXPECT_STREQ(finalizeErr.getMessage(), "Container nesting too deep");
     EXPECT_TRUE(!tooDeep.isFinalized() && deepest.isFinalized());
+    { // 200,000 levels go without a stack frame per level
+        const CZYRUniString in("in");
+        CZYRDict at;
+        const CZYRDict top = at;
+        for (int i = 0; i < 100000; ++i) {
+            CZYRArray list;
+            CZYRDict next;
+            list.set(0, next);
+            at.set(in, list);
+            at = next;
+        }
+    }
 }
