@@ -136,7 +136,8 @@ TEST(CZYRSurfaceRenderAttributesTest, SurfaceConstructorWalksLooksUpAndCompares)
     EXPECT_EQ(attempt(makeSurface(3, job), noRaster), invalid("missing interface", 57));
     for (const int id : {kZYRRasterInterfaceID, kZYRProgressInterfaceID}) {
         Registry wrongType(raster.get(), progress.get()); // an item of another type there
-        registerItem<int>(wrongType.registry, id, nullptr);
+        static int notAnInterface = 0;
+        registerItem<int>(wrongType.registry, id, &notAnInterface);
         EXPECT_EQ(attempt(makeSurface(3, job), wrongType),
                   invalid("missing interface", id == kZYRRasterInterfaceID ? 57 : 65));
     }
