@@ -4,10 +4,10 @@
 #include <array>
 #include <cstdint>
 #include <cstring>
+#include <map>
 #include <memory>
 #include <random>
 #include <set>
-#include <stdexcept>
 #include <string>
 #include <tuple>
 #include <vector>
@@ -38,32 +38,6 @@ void expectError(Call call, int type, const char* message, const char* source, i
 template <class Call>
 void expectAssertion(Call call, const char* source = kMaskSource, int line = 0) {
     expectError(call, ZYRPublic::kZYRErrorAssertionFailed, "assertion failed", source, line);
-}
-
-// Runs `workload` once, then with each of its allocations failing: no leak, no other error.
-template <class Workload> void failEachAllocation(Workload workload) {
-    zyrtest::FailingHost host;
-    tZYRMemMgr record = host.record();
-    zyrtest::installFront(0, &record);
-    const CZYRErrorStk notices; // refusals are noticed there; built before measuring
-    const unsigned long long before = GetMemUsage();
-    host.calls = 0;
-    workload();
-    const unsigned int callsPerRun = host.calls;
-    EXPECT_TRUE(callsPerRun > 3 && GetMemUsage() == before);
-    for (host.failAt = 1; host.failAt <= callsPerRun; ++host.failAt) {
-        host.calls = 0;
-        try {
-            workload();
-        } catch (const CZYRError& e) {
-            EXPECT_EQ(e.getError(), ZYRPublic::kZYRErrorOutOfMemory) << host.failAt;
-        } catch (const std::logic_error& e) {
-            ADD_FAILURE() << e.what() << " when allocation " << host.failAt << " failed";
-        }
-        ASSERT_EQ(GetMemUsage(), before) << "allocation " << host.failAt << " failed";
-    }
-    host.failAt = 0;
-    zyrtest::installFront(0);
 }
 
 struct Entry : _t_Nlink {
@@ -441,18 +415,6 @@ TEST(ZYRCacheTest, RandomRunExhaustedPoolAndEveryAllocationFailing) {
         host.failAll = false;
     }
     zyrtest::installFront(0);
-    failEachAllocation([] { // a cache's life: fill past capacity, look up, remove, tear down
-        TestCache cache(50, 5, 3, 8);
-        for (uint64_t k = 0; k < 200; ++k) {
-            cache.add(k * 7);
-            cache.find(k * 7 / 2);
-            uint64_t key = k * 3;
-            (void)(k % 5 == 0 && cache.hcRemoveEntry(&key, nullptr));
-            if (!cache.checkInvariants())
-                throw std::logic_error("invariants broken");
-        }
-        (void)cache.hcFreeCacheControl();
-    });
 }
 
 bool allZero(const unsigned char* p, unsigned int n) {
@@ -489,88 +451,87 @@ std::unique_ptr<void, void (*)(void*)> exhaustMemory() {
     return {filler, ZYRFree};
 }
 
-TEST(CZYRMaskCacheTest, RecordsWhileMemoryLastsAndTheReservedMaskWithout) {
+// Masks made, moved and freed at random, each checked against its bytes made pixel by pixel
+// after every step: no two live masks share storage, and at most one is the reserved mask.
+TEST(CZYRMaskCacheTest, RandomMasksAgainstAPerPixelModel) {
     const unsigned long long before = GetMemUsage();
+    {
+        CZYRMaskCache wide(2048); // a record array of 64 KiB: from virtual memory
+        wide.DeleteBitmapMask(wide.GetMaskRec(8, 1));
+        CZYRMaskCache cache(3); // small blocks: records come from many of them
+        std::map<ZYR_MaskRec*, std::vector<unsigned char>> live;
+        std::mt19937 random(77);
+        const auto reservedLive = [&] {
+            return std::any_of(live.begin(), live.end(),
+                               [&](const auto& m) { return cache.isReservedMask(m.first); });
+        };
+        for (int round = 0; round < 1200; ++round) {
+            const unsigned int action = random() % 8;
+            const bool reservedTaken = reservedLive();
+            if (action < 3 && !live.empty()) {
+                const auto it = std::next(live.begin(), random() % live.size());
+                // Scribbled over: whoever gets the storage next must write every byte.
+                std::memset(it->first->data, 0xFF, it->second.size());
+                cache.DeleteBitmapMask(it->first);
+                live.erase(it);
+            } else if (action == 3 && !live.empty()) {
+                auto node = live.extract(std::next(live.begin(), random() % live.size()));
+                ZYR_MaskRec* const moved = cache.FallbackToReservedMask(
+                    node.key(), static_cast<unsigned int>(node.mapped().size()));
+                ASSERT_EQ(moved == node.key(), reservedTaken) << "moved only into a free one";
+                ASSERT_TRUE((cache.isReservedMask(moved) && moved->flag == 0) ||
+                            moved == node.key());
+                live[moved] = std::move(node.mapped());
+            } else {
+                const bool fourBit = random() % 2, useReserved = random() % 4 == 0;
+                const unsigned int width = 1 + random() % (round % 3 ? 80 : 700);
+                const unsigned int height = 1 + random() % 24;
+                const unsigned int srcRowBytes = ((fourBit ? 4 : 1) * width + 7) / 8 + random() % 5;
+                std::vector<unsigned char> src(size_t{srcRowBytes} * height);
+                std::generate(src.begin(), src.end(), random);
+                unsigned int size = 0;
+                ZYR_MaskRec* const mask = cache.CreateBitmapMask(
+                    src.data(), width, srcRowBytes, height, size, fourBit, useReserved);
+                ASSERT_TRUE(!(reservedTaken && cache.isReservedMask(mask)) &&
+                            (!useReserved || cache.isReservedMask(mask) == !reservedTaken));
+                ASSERT_TRUE(mask->width == width && mask->height == height && mask->flag == 0);
+                live[mask] = referenceMask(src, width, srcRowBytes, height, fourBit);
+                ASSERT_EQ(size, live[mask].size());
+            }
+            for (const auto& [mask, bytes] : live)
+                ASSERT_TRUE(std::equal(bytes.begin(), bytes.end(), mask->data)) << round;
+        }
+        for (const auto& [mask, bytes] : live)
+            cache.DeleteBitmapMask(mask);
+    }
+    EXPECT_EQ(GetMemUsage(), before) << "the destructor returns every block and chunk";
+}
+
+TEST(CZYRMaskCacheTest, RecordsSizesLimitsAndTheReservedMaskWithoutMemory) {
     const unsigned long long page = CZYRMaskCache::VAR_ALLOC_PAGE_SIZE + 24ull;
     unsigned long long current = 0, peak = 0;
-    {
-        CZYRMaskCache cache(4);
-        ZYR_MaskRec* mask = cache.GetMaskRec(33, 2);
-        EXPECT_TRUE(!cache.isReservedMask(mask) && mask->width == 33 && allZero(mask->data, 16));
-        std::memset(mask->data, 0xA5, 16);
-        mask->flag = 9;
-        cache.DeleteBitmapMask(mask);
-        cache.DeleteBitmapMask(nullptr);
-        EXPECT_EQ(cache.GetMaskRec(33, 2), mask) << "the record freed last comes back first";
-        EXPECT_TRUE(allZero(mask->data, 16) && mask->flag == 0) << "reused storage is zeroed";
-        cache.DeleteBitmapMask(mask);
-        cache.DeleteBitmapMask(cache.GetMaskRec(2000, 600)); // above the page size
-        cache.GetStats(current, peak);
-        EXPECT_TRUE(current == page && peak >= page + 151200) << "one initial page";
-        // A new block needs the memory status to report room, which AddressSanitizer takes.
-        tZYRVirtualMemoryInfo info{};
-        VirtualMemStatus(&info);
-        CZYRMaskCache many(3000); // record arrays of 64 KiB and more: virtual memory
-        std::vector<ZYR_MaskRec*> masks;
-        for (int i = 0; i < 3001 && info.availableForAllocation >= (64u << 20); ++i) {
-            masks.push_back((i < 10 ? cache : many).GetMaskRec(64, 3));
-            ASSERT_FALSE(cache.isReservedMask(masks.back()) || many.isReservedMask(masks.back()));
-            std::memset(masks.back()->data, i, 24);
-        }
-        for (size_t i = 0; i < masks.size(); ++i) {
-            EXPECT_EQ(masks[i]->data[23], static_cast<unsigned char>(i)) << "storage shared";
-            (i < 10 ? cache : many).DeleteBitmapMask(masks[i]);
-        }
-    }
+    CZYRMaskCache cache(8);
+    ZYR_MaskRec* mask = cache.GetMaskRec(33, 2);
+    EXPECT_TRUE(!cache.isReservedMask(mask) && mask->width == 33 && allZero(mask->data, 16));
+    std::memset(mask->data, 0xA5, 16);
+    mask->flag = 9;
+    cache.DeleteBitmapMask(mask);
+    cache.DeleteBitmapMask(nullptr);
+    EXPECT_EQ(cache.GetMaskRec(33, 2), mask) << "the record freed last comes back first";
+    EXPECT_TRUE(allZero(mask->data, 16) && mask->flag == 0) << "reused storage is zeroed";
+    cache.DeleteBitmapMask(mask);
+    cache.DeleteBitmapMask(cache.GetMaskRec(2000, 600)); // above the page size
+    cache.GetStats(current, peak);
+    EXPECT_TRUE(current == page && peak >= page + 151200) << "one initial page";
     for (const auto& [records, bytes] : {std::pair{CZYRMaskCache::MIN_THRESHOLD + 1,
                                                    8ull * CZYRMaskCache::VAR_ALLOC_PAGE_SIZE + 24},
                                          std::pair{CZYRMaskCache::MIN_THRESHOLD + 0, page}}) {
-        CZYRMaskCache cache(records);
-        cache.GetStats(current, peak);
+        CZYRMaskCache sized(records);
+        sized.GetStats(current, peak);
         EXPECT_EQ(std::pair(current, peak), std::pair(bytes, bytes)) << records;
     }
-    EXPECT_EQ(GetMemUsage(), before) << "the destructor returns every block and chunk";
     expectAssertion([] { CZYRMaskCache none(0); });
-    zyrtest::installFront(0);
-    const CZYRErrorStk notices; // refusals are noticed there; built before measuring
-    const unsigned long long fronted = GetMemUsage();
-    {
-        CZYRMaskCache cache(2);
-        const auto exhausted = exhaustMemory();
-        ASSERT_TRUE(exhausted);
-        ZYR_MaskRec* first = cache.GetMaskRec(100, 10);   // the initial page still serves
-        ZYR_MaskRec* large = cache.GetMaskRec(2000, 700); // the supplier refuses the block
-        EXPECT_TRUE(!cache.isReservedMask(first) && cache.isReservedMask(large) &&
-                    large->width == 2000 && large->height == 700 && allZero(large->data, 176400));
-        ZYR_MaskRec* second = cache.GetMaskRec(100, 10);
-        unsigned int size = 0;
-        std::vector<unsigned char> src(100, 0x80);
-        // While the reserved mask is in use no other mask may share it.
-        expectError([&] { cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, true); },
-                    ZYRPublic::kZYRErrorOutOfMemory, "failed to allocate mask cache storage",
-                    kMaskSource);
-        EXPECT_EQ(cache.FallbackToReservedMask(second, 40), second);
-        cache.DeleteBitmapMask(large);
-        expectAssertion([&] { cache.GetMaskRec(2000, 2001); });
-        ZYR_MaskRec* third = cache.CreateBitmapMask(src.data(), 8, 1, 100, size, false, false);
-        EXPECT_TRUE(!cache.isReservedMask(second) && cache.isReservedMask(third) &&
-                    third->data[0] == 0x01 && third->data[4 * 99] == 0x01);
-        cache.DeleteBitmapMask(first);
-        EXPECT_EQ(cache.GetMaskRec(50, 1), first) << "a freed record serves without new memory";
-        cache.DeleteBitmapMask(first);
-        cache.DeleteBitmapMask(second);
-    }
-    EXPECT_EQ(GetMemUsage(), fronted);
-    {
-        const auto exhausted = exhaustMemory();
-        expectError([] { CZYRMaskCache refused(2); }, ZYRPublic::kZYRErrorOutOfMemory,
-                    "failed to allocate mask cache storage", kMaskSource);
-    }
-    EXPECT_EQ(GetMemUsage(), fronted) << "a refused construction keeps nothing";
-}
 
-TEST(CZYRMaskCacheTest, ReservedMaskLimitsAndAPerPixelReference) {
-    CZYRMaskCache cache(8);
     std::vector<unsigned char> src(size_t{512} * 2001, 0xC3);
     unsigned int size = 0;
     for (const auto& [width, height, fourBit, reserved, bytes] :
@@ -581,8 +542,7 @@ TEST(CZYRMaskCacheTest, ReservedMaskLimitsAndAPerPixelReference) {
           {1024u, 1024u, true, false, 524288u},
           {1000u, 1009u, true, false, 504500u}}) {
         const unsigned int srcRow = fourBit ? width / 2 : (width + 7) / 8;
-        ZYR_MaskRec* mask =
-            cache.CreateBitmapMask(src.data(), width, srcRow, height, size, fourBit, false);
+        mask = cache.CreateBitmapMask(src.data(), width, srcRow, height, size, fourBit, false);
         EXPECT_EQ(std::tuple(size, cache.isReservedMask(mask), mask->data[size - 1]),
                   std::tuple(bytes, reserved, fourBit ? 0x3C : (width % 32 ? 0 : 0xC3)));
         cache.DeleteBitmapMask(mask);
@@ -597,38 +557,49 @@ TEST(CZYRMaskCacheTest, ReservedMaskLimitsAndAPerPixelReference) {
         });
     expectAssertion([&] { cache.GetMaskRec(70000, 1); });
     expectAssertion([&] { cache.CreateBitmapMask(nullptr, 8, 1, 1, size, false, false); });
-    ZYR_MaskRec* mask = cache.CreateBitmapMask(src.data(), 40, 5, 3, size, false, false);
-    const std::vector<unsigned char> bytes(mask->data, mask->data + size);
-    ZYR_MaskRec* moved = cache.FallbackToReservedMask(mask, size);
-    EXPECT_TRUE(size == 24 && cache.isReservedMask(moved) && moved->width == 40 &&
-                moved->height == 3 && cache.FallbackToReservedMask(moved, 5) == moved);
-    EXPECT_EQ(std::vector<unsigned char>(moved->data, moved->data + size), bytes);
-    EXPECT_EQ(cache.GetMaskRec(8, 1), mask) << "the moved mask's record was freed";
+    mask = cache.CreateBitmapMask(src.data(), 40, 5, 3, size, false, false);
     expectAssertion([&] { cache.FallbackToReservedMask(mask, 4096); });
     expectAssertion([&] { cache.FallbackToReservedMask(nullptr, 4); });
     cache.DeleteBitmapMask(mask);
     mask = cache.CreateBitmapMask(nullptr, 0, 0, 5, size, false, false);
     EXPECT_EQ(size + mask->width + mask->height, 0u);
-    std::mt19937 random(77);
-    for (int round = 0; round < 400; ++round) {
-        const bool fourBit = random() % 2;
-        const unsigned int width = 1 + random() % (round < 200 ? 80 : 700);
-        const unsigned int height = 1 + random() % 24;
-        const unsigned int srcRowBytes = ((fourBit ? 4 : 1) * width + 7) / 8 + random() % 5;
-        const bool useReserved = random() % 4 == 0;
-        cache.DeleteBitmapMask(mask);
-        std::vector<unsigned char> src(size_t{srcRowBytes} * height);
-        std::generate(src.begin(), src.end(), random);
-        mask = cache.CreateBitmapMask(src.data(), width, srcRowBytes, height, size, fourBit,
-                                      useReserved);
-        ASSERT_EQ(std::vector<unsigned char>(mask->data, mask->data + size),
-                  referenceMask(src, width, srcRowBytes, height, fourBit))
-            << "width " << width << " height " << height << (fourBit ? " 4-bit" : " 1-bit");
-        ASSERT_TRUE(cache.isReservedMask(mask) == useReserved && mask->width == width &&
-                    mask->height == height && mask->flag == 0);
-        std::memset(mask->data, 0xFF, size); // the next mask's padding must still come out 0
-    }
     cache.DeleteBitmapMask(mask);
+
+    zyrtest::installFront(0);
+    const CZYRErrorStk notices; // refusals are noticed there; built before measuring
+    const unsigned long long fronted = GetMemUsage();
+    {
+        CZYRMaskCache small(2);
+        const auto exhausted = exhaustMemory();
+        ASSERT_TRUE(exhausted);
+        ZYR_MaskRec* first = small.GetMaskRec(100, 10);   // the initial page still serves
+        ZYR_MaskRec* large = small.GetMaskRec(2000, 700); // the supplier refuses the block
+        EXPECT_TRUE(!small.isReservedMask(first) && small.isReservedMask(large) &&
+                    large->width == 2000 && large->height == 700 && allZero(large->data, 176400));
+        ZYR_MaskRec* second = small.GetMaskRec(100, 10);
+        std::vector<unsigned char> ones(100, 0x80);
+        // While the reserved mask is in use no other mask may share it.
+        expectError([&] { small.CreateBitmapMask(ones.data(), 8, 1, 100, size, false, true); },
+                    ZYRPublic::kZYRErrorOutOfMemory, "failed to allocate mask cache storage",
+                    kMaskSource);
+        EXPECT_EQ(small.FallbackToReservedMask(second, 40), second);
+        small.DeleteBitmapMask(large);
+        expectAssertion([&] { small.GetMaskRec(2000, 2001); });
+        ZYR_MaskRec* third = small.CreateBitmapMask(ones.data(), 8, 1, 100, size, false, false);
+        EXPECT_TRUE(!small.isReservedMask(second) && small.isReservedMask(third) &&
+                    third->data[0] == 0x01 && third->data[4 * 99] == 0x01);
+        small.DeleteBitmapMask(first);
+        EXPECT_EQ(small.GetMaskRec(50, 1), first) << "a freed record serves without new memory";
+        small.DeleteBitmapMask(first);
+        small.DeleteBitmapMask(second);
+    }
+    EXPECT_EQ(GetMemUsage(), fronted);
+    {
+        const auto exhausted = exhaustMemory();
+        expectError([] { CZYRMaskCache refused(2); }, ZYRPublic::kZYRErrorOutOfMemory,
+                    "failed to allocate mask cache storage", kMaskSource);
+    }
+    EXPECT_EQ(GetMemUsage(), fronted) << "a refused construction keeps nothing";
 }
 
 } // namespace

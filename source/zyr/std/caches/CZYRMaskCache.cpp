@@ -397,6 +397,7 @@ ZYR_MaskRec* CZYRMaskCache::FallbackToReservedMask(ZYR_MaskRec* rec, unsigned in
     reserved_.flag = 0;
     std::memcpy(reserved_.data, rec->data, size);
     releaseRecord(rec);
+    reservedInUse_ = true;
     return &reserved_;
 }
 
