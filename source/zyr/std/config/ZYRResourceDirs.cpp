@@ -80,6 +80,7 @@ std::u16string numberText(unsigned int number) {
 }
 
 OwnedPath numberedCacheFile() {
+    // Relaxed: the increment alone makes each number unique; nothing else is published by it.
     const unsigned int number = nextCacheListNumber.fetch_add(1, std::memory_order_relaxed);
     return copyPath(dirs().fontCacheDir + kNumberedCacheFilePrefix + numberText(number) +
                     kCacheFileSuffix);

@@ -462,8 +462,9 @@ int32_t CZYRTraceMsg::configuredLevel(const CZYRUniString& area,
 
     std::lock_guard<std::mutex> lock(levelCache_.mutex);
     LevelCache& cache = levelCache_;
-    // Relaxed loads: a change made on this thread is seen in order anyway, and one made on
-    // another thread reaches this one only through the host's own synchronisation.
+    // Relaxed loads, here and below: a change made on this thread is seen in order anyway,
+    // and one made on another thread reaches this one only through the host's own
+    // synchronisation, which orders the count with the change itself.
     const uint32_t configNow = configChanges_->load(std::memory_order_relaxed);
     const uint32_t globalNow = globalChanges_ ? globalChanges_->load(std::memory_order_relaxed) : 0;
     if (!cache.valid || cache.configSeen != configNow || cache.globalSeen != globalNow) {
