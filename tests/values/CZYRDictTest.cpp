@@ -7,6 +7,7 @@
 #include <random>
 #include <set>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "zyr/std/core/ZYRMem.h"
@@ -226,6 +227,19 @@ TEST(CZYRDictTest, FinalizeCloneBucketsCyclesAndNesting) {
              [&] { list.insert(0); }, [&] { list.remove(0); }, [&] { list.set(3, 1u); }})
         expectThrow(change, kZYRErrorFinalized, "Finalized objects can't be modified");
     EXPECT_EQ(outer.getSize(), 3u) << "refused changes change nothing";
+    // Two threads read the finalized tree and intern texts at once.
+    auto read = [&] {
+        for (int n = 0; n < 500; ++n) {
+            CZYRDict got;
+            unsigned int v = 0;
+            EXPECT_TRUE(outer.get(CZYRUniString("inner"), got) && got.get(CZYRUniString("v"), &v));
+            EXPECT_EQ(v + list.getLength(), 2u);
+        }
+    };
+    std::thread first(read), second(read);
+    first.join();
+    second.join();
+
     CZYRDict copy = outer.clone(), copiedInner;
     CZYRUniString s1, s2;
     copy.set(CZYRUniString("x"), 2u);
