@@ -1,6 +1,7 @@
 // Trace messages: configuration, level rules, routing, and the trace log with its layout.
 #include "zyr/std/trace/CZYRTraceMsg.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -460,35 +461,85 @@ int32_t CZYRTraceMsg::configuredLevel(const CZYRUniString& area,
     if (!configChanges_)
         return lookUpLevel(areaDict(area).get(), category);
 
-    std::lock_guard<std::mutex> lock(levelCache_.mutex);
+    int32_t level = 0;
+    if (cachedLevel(area, category, level))
+        return level;
+    const C_SmartPtr<I_Dict> dict = areaDict(area);
+    level = lookUpLevel(dict.get(), category);
+    cacheLevel(area, category, level, dict.get());
+    return level;
+}
+
+// Relaxed loads and stores of the slots and counts, here and in cacheLevel: the sequence
+// number's acquire and release order them, and a dictionary change made on another thread
+// reaches this one only through the host's own synchronisation, which orders its count too.
+bool CZYRTraceMsg::cachedLevel(const CZYRUniString& area, const CZYRUniString& category,
+                               int32_t& level) const {
+    const LevelCache& cache = levelCache_;
+    const uint32_t begin = cache.sequence.load(std::memory_order_acquire);
+    if ((begin & 1) != 0 ||
+        cache.configSeen.load(std::memory_order_relaxed) !=
+            configChanges_->load(std::memory_order_relaxed) ||
+        (globalChanges_ && cache.globalSeen.load(std::memory_order_relaxed) !=
+                               globalChanges_->load(std::memory_order_relaxed)))
+        return false;
+    for (const LevelSlot& slot : cache.slots) {
+        if (slot.area.load(std::memory_order_relaxed) != area.getImpl() ||
+            slot.category.load(std::memory_order_relaxed) != category.getImpl())
+            continue;
+        level = slot.level.load(std::memory_order_relaxed);
+        const std::atomic<uint32_t>* changes = slot.areaChanges.load(std::memory_order_relaxed);
+        const uint32_t seen = slot.areaSeen.load(std::memory_order_relaxed);
+        std::atomic_thread_fence(std::memory_order_acquire);
+        // The dictionary of `changes` lives as long as this object, whatever the slot holds.
+        return cache.sequence.load(std::memory_order_relaxed) == begin &&
+               (!changes || changes->load(std::memory_order_relaxed) == seen);
+    }
+    return false;
+}
+
+void CZYRTraceMsg::cacheLevel(const CZYRUniString& area, const CZYRUniString& category,
+                              int32_t level, I_Dict* areaDict) const {
     LevelCache& cache = levelCache_;
-    // Relaxed loads, here and below: a change made on this thread is seen in order anyway,
-    // and one made on another thread reaches this one only through the host's own
-    // synchronisation, which orders the count with the change itself.
+    const std::atomic<uint32_t>* changes = areaDict ? dictChangeCount(areaDict) : nullptr;
+    if (areaDict && !changes)
+        return; // another implementation's dictionary: its changes cannot be seen
+    std::unique_lock<std::mutex> lock(cache.writer, std::try_to_lock);
+    if (!lock.owns_lock())
+        return;
+    if (areaDict) {
+        const auto kept =
+            cache.areaDicts.begin() + static_cast<std::ptrdiff_t>(cache.areaDictCount);
+        if (std::find_if(cache.areaDicts.begin(), kept,
+                         [&](const auto& d) { return d.get() == areaDict; }) == kept) {
+            if (cache.areaDictCount == kKeptAreaDicts)
+                return; // so many area dictionaries: the rest are looked up each time
+            cache.areaDicts[cache.areaDictCount++] = C_SmartPtr<I_Dict>(areaDict, true);
+        }
+    }
+    const uint32_t sequence = cache.sequence.load(std::memory_order_relaxed);
+    cache.sequence.store(sequence + 1, std::memory_order_relaxed);
+    std::atomic_thread_fence(std::memory_order_release);
     const uint32_t configNow = configChanges_->load(std::memory_order_relaxed);
     const uint32_t globalNow = globalChanges_ ? globalChanges_->load(std::memory_order_relaxed) : 0;
-    if (!cache.valid || cache.configSeen != configNow || cache.globalSeen != globalNow) {
-        cache.entries = {};
-        cache.valid = true;
-        cache.configSeen = configNow;
-        cache.globalSeen = globalNow;
+    if (cache.configSeen.load(std::memory_order_relaxed) != configNow ||
+        cache.globalSeen.load(std::memory_order_relaxed) != globalNow) {
+        for (LevelSlot& slot : cache.slots)
+            slot.area.store(nullptr, std::memory_order_relaxed);
+        cache.configSeen.store(configNow, std::memory_order_relaxed);
+        cache.globalSeen.store(globalNow, std::memory_order_relaxed);
     }
-    for (const CachedLevel& cached : cache.entries)
-        if (cached.area.getImpl() == area.getImpl() &&
-            cached.category.getImpl() == category.getImpl() &&
-            (!cached.areaChanges ||
-             cached.areaChanges->load(std::memory_order_relaxed) == cached.areaSeen))
-            return cached.level;
-    C_SmartPtr<I_Dict> dict = areaDict(area);
-    const int32_t level = lookUpLevel(dict.get(), category);
-    const std::atomic<uint32_t>* changes = dict ? dictChangeCount(dict.get()) : nullptr;
-    if (dict && !changes)
-        return level; // another implementation's dictionary: its changes cannot be seen
-    // The entry keeps both strings alive, so their addresses cannot be reused meanwhile.
-    const uint32_t seen = changes ? changes->load(std::memory_order_relaxed) : 0;
-    cache.entries[cache.next] = {area, category, level, std::move(dict), changes, seen};
+    LevelSlot& slot = cache.slots[cache.next];
+    slot.area.store(area.getImpl(), std::memory_order_relaxed);
+    slot.category.store(category.getImpl(), std::memory_order_relaxed);
+    slot.level.store(level, std::memory_order_relaxed);
+    slot.areaChanges.store(changes, std::memory_order_relaxed);
+    slot.areaSeen.store(changes ? changes->load(std::memory_order_relaxed) : 0,
+                        std::memory_order_relaxed);
+    cache.areas[cache.next] = area;
+    cache.categories[cache.next] = category;
     cache.next = (cache.next + 1) % kCachedLevels;
-    return level;
+    cache.sequence.store(sequence + 2, std::memory_order_release);
 }
 
 I_Dict* CZYRTraceMsg::holderOf(I_UniString* key) const {

@@ -127,33 +127,54 @@ private:
     // The levels of the latest (area, category) pairs, by string object. A level stays
     // right while neither the configuration nor the area's dictionary has changed, which
     // their change counts tell; dictionaries of other implementations are never cached.
-    struct CachedLevel {
-        CZYRUniString area;
-        CZYRUniString category;
-        int32_t level = 0;
-        C_SmartPtr<ZYRPublic::I_Dict> areaDict; // null when the area has none
-        const std::atomic<uint32_t>* areaChanges = nullptr;
-        uint32_t areaSeen = 0;
-    };
+    //
+    // getTraceMsgLevel is const and may be asked from several threads, and the filter must
+    // cost next to nothing: readers take no lock but read the slots between two readings of
+    // a sequence number that a writer makes odd while it changes them (a miss, or a reading
+    // that overlapped a change, looks the level up instead). Writers are serialised by a
+    // mutex they only try; a writer that would wait does not cache. A copy starts empty.
     static constexpr size_t kCachedLevels = 4;
-    // Guarded by its own lock, as getTraceMsgLevel is const and may be asked from several
-    // threads; a copy starts empty.
+    static constexpr size_t kKeptAreaDicts = 16;
+    struct LevelSlot {
+        std::atomic<const void*> area{nullptr};
+        std::atomic<const void*> category{nullptr};
+        std::atomic<int32_t> level{0};
+        std::atomic<const std::atomic<uint32_t>*> areaChanges{nullptr}; // null: no area dict
+        std::atomic<uint32_t> areaSeen{0};
+    };
     struct LevelCache {
         LevelCache() = default;
         LevelCache(const LevelCache&) {}
+        // The assigned object has another configuration: its answers go.
         LevelCache& operator=(const LevelCache&) {
-            std::lock_guard<std::mutex> lock(mutex);
-            entries = {};
-            valid = false;
+            std::lock_guard<std::mutex> lock(writer);
+            const uint32_t at = sequence.load(std::memory_order_relaxed);
+            sequence.store(at + 1, std::memory_order_relaxed);
+            std::atomic_thread_fence(std::memory_order_release);
+            for (LevelSlot& slot : slots)
+                slot.area.store(nullptr, std::memory_order_relaxed);
+            sequence.store(at + 2, std::memory_order_release);
             return *this;
         }
-        std::mutex mutex;
-        std::array<CachedLevel, kCachedLevels> entries;
+        std::atomic<uint32_t> sequence{0};
+        std::atomic<uint32_t> configSeen{0};
+        std::atomic<uint32_t> globalSeen{0};
+        std::array<LevelSlot, kCachedLevels> slots;
+        // The writer's side, under `writer`: the strings of the slots, kept alive so that
+        // their addresses cannot be reused by other strings, and every area dictionary whose
+        // change count a slot names, kept for the object's life, as a reader may still read
+        // that count after the slot has moved on.
+        std::mutex writer;
+        std::array<CZYRUniString, kCachedLevels> areas;
+        std::array<CZYRUniString, kCachedLevels> categories;
+        std::array<C_SmartPtr<ZYRPublic::I_Dict>, kKeptAreaDicts> areaDicts;
+        size_t areaDictCount = 0;
         size_t next = 0;
-        bool valid = false; // the entries were made with the counts below
-        uint32_t configSeen = 0;
-        uint32_t globalSeen = 0;
     };
+    bool cachedLevel(const CZYRUniString& area, const CZYRUniString& category,
+                     int32_t& level) const;
+    void cacheLevel(const CZYRUniString& area, const CZYRUniString& category, int32_t level,
+                    ZYRPublic::I_Dict* areaDict) const;
 
     C_SmartPtr<I_Job> job_;
     C_SmartPtr<I_Surface> surface_;
