@@ -256,9 +256,10 @@ TEST(CZYRDictTest, FinalizeCloneBucketsCyclesAndNesting) {
     holes.set(6, 6u);
     C_Error err;
     holes.getImpl()->set(9, static_cast<I_Dict*>(nullptr), err);
+    holes.getImpl()->set(8, static_cast<I_Array*>(nullptr), err);
     const CZYRArray holesCopy = holes.clone();
     EXPECT_TRUE(holesCopy.getLength() == 10 && holesCopy.getType(2) == kZYRValTypeNone &&
-                holesCopy.getType(3) == kZYRValTypeUInt)
+                holesCopy.getType(3) == kZYRValTypeUInt && holesCopy.getType(8) == kZYRValTypeArray)
         << "a null object is not a hole";
     CZYRArray trailing;
     trailing.set(0, 1u);
