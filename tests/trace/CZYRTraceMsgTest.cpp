@@ -1,10 +1,14 @@
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
 #include <thread>
+#include <unistd.h>
 
 #include "EngineFakes.h"
 #include "TestSupport.h"
+#include "zyr/std/config/ZYRResourceDirs.h"
 #include "zyr/std/core/ZYRStdInit.h"
+#include "zyr/std/io/internal/ZYRFileSys_helper.h"
 #include "zyr/std/trace/CZYRTraceMsg.h"
 
 using namespace ZYRStd;
@@ -191,6 +195,34 @@ TEST_F(CZYRTraceMsgTest, WithoutALogFile) {
     saved ? ::setenv("TMPDIR", savedText.c_str(), 1) : ::unsetenv("TMPDIR");
     const std::string tempDir = ZYRGetTempDirectory();
     EXPECT_EQ(ZYRGetTraceLogPath(), (tempDir.empty() ? dir.path() : tempDir) + "/traceLog.log");
+}
+
+// A log path is the file system's bytes, whatever the script, UTF-8 or not; and the log is
+// never opened through a link someone placed where it goes.
+TEST_F(CZYRTraceMsgTest, LogPathsAreBytesAndNeverALink) {
+    const std::string named = dir.file("d\xc3\xa9j\xc3\xa0-\xff.log");
+    CZYRDict config = levels({{"All", 8}});
+    config.set(CZYRUniString("Path"), ZYRFileSys::uniPathOf(named.c_str()));
+    CZYRTraceMsg(zyrtest::makeJob(jobParams(config)))
+        .traceMsg(text("Render"), text("Bands"), level(1), "written");
+    EXPECT_EQ(ZYRGetTraceLogPath(), named);
+    closeTraceLogPath();
+    EXPECT_NE(zyrtest::readFile(named).find("\nwritten\n"), std::string::npos);
+
+    const std::string folder = dir.file("\xce\xb4\xe9"); // Greek, then a Latin-1 byte
+    ASSERT_EQ(::mkdir(folder.c_str(), 0700), 0);
+    zyrtest::writeFile(dir.file("victim"), "keep");
+    ASSERT_EQ(::symlink(dir.file("victim").c_str(), (folder + "/traceLog.log").c_str()), 0);
+    ZYRSetTempDirectory(ZYRFileSys::uniPathOf(folder.c_str()));
+    ::testing::internal::CaptureStdout();
+    CZYRTraceMsg(zyrtest::makeJob(jobParams(levels({{"All", 8}}))))
+        .traceMsg(text("Render"), text("Bands"), level(1), "not through the link");
+    const std::string out = ::testing::internal::GetCapturedStdout();
+    EXPECT_EQ(ZYRGetTempDirectory(), folder);
+    ZYRSetTempDirectory(CZYRUniString(""));
+    EXPECT_TRUE(startsWith(out, "TRACE WARNING: File open failed") && ZYRGetTraceLogPath().empty())
+        << out;
+    EXPECT_EQ(zyrtest::readFile(dir.file("victim")), "keep");
 }
 
 TEST_F(CZYRTraceMsgTest, ProcessWideDictionaryMerges) {

@@ -47,8 +47,8 @@ constexpr const char* kOpenFailedWarning =
 
 struct TraceLog {
     ZYRStd::mutex mutex; // guards file and path: every write, the opening and the closing
-    FILE* file = nullptr;
-    std::string path;
+    FILE* file ZYR_GUARDED_BY(mutex) = nullptr;
+    std::string path ZYR_GUARDED_BY(mutex);
 };
 
 // Never destroyed: messages written during static destruction still find it.
@@ -58,7 +58,7 @@ TraceLog& traceLog() {
 }
 
 // Caller holds the log mutex.
-void openLogLocked(TraceLog& log, const std::string& path) {
+void openLogLocked(TraceLog& log, const std::string& path) ZYR_REQUIRES(log.mutex) {
     if (log.file) {
         std::fclose(log.file);
         log.file = nullptr;
