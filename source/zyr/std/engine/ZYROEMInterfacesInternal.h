@@ -1,4 +1,5 @@
-// The host interfaces of a job, fetched through its interface set, one function each.
+/// \file
+/// The host interfaces of a job, fetched through its interface set, one function each.
 #pragma once
 
 #include "C_SmartPtr.h"
@@ -11,12 +12,13 @@ namespace ZYRStd {
 using ZYRPublic::C_SmartPtr;
 using ZYRPublic::I_Job;
 
-// Each returns the interface with one reference, or null when the job has none. A job
-// without an interface set (or a null job) throws kZYRErrorInitFailed "Error getting OEM
-// Interface"; a missing interface that is required records kZYRErrorBadParam "Required OEM
-// interface not found" in `err`. Required: calibration manager, frame-marker factory,
-// progress interface, raster buffer manager, raster interface, and the screen manager when
-// `required` says so.
+/// Each returns the interface with one reference, or null when the job has none. A job
+/// without an interface set (or a null job) throws kZYRErrorInitFailed "Error getting OEM
+/// Interface"; a missing interface that is required records kZYRErrorBadParam "Required OEM
+/// interface not found" in `err`. Required: calibration manager, frame-marker factory,
+/// progress interface, raster buffer manager, raster interface, and the screen manager when
+/// `required` says so.
+///@{
 ZYRSTD_API C_SmartPtr<ZYRPublic::I_OEMCalibrationMgr>
 GetOEMCalibrationMgrInterfaceFromJob(const C_SmartPtr<I_Job>& job, ZYRPublic::I_Error& err);
 ZYRSTD_API C_SmartPtr<ZYRPublic::I_OEMCuttingInfoMgr>
@@ -42,5 +44,6 @@ ZYRSTD_API C_SmartPtr<ZYRPublic::I_OEMXObjMgr> GetOEMXObjMgrFromJob(const C_Smar
                                                                     ZYRPublic::I_Error& err);
 ZYRSTD_API C_SmartPtr<ZYRPublic::I_OEMXObjectResolver>
 GetOEMXObjectResolverFromJob(const C_SmartPtr<I_Job>& job, ZYRPublic::I_Error& err);
+///@}
 
 } // namespace ZYRStd
