@@ -504,9 +504,10 @@ void CZYRTraceMsg::cacheLevel(const CZYRUniString& area, const CZYRUniString& ca
     const std::atomic<uint32_t>* changes = areaDict ? dictChangeCount(areaDict) : nullptr;
     if (areaDict && !changes)
         return; // another implementation's dictionary: its changes cannot be seen
-    std::unique_lock<std::mutex> lock(cache.writer, std::try_to_lock);
+    std::unique_lock<std::mutex> lock(cache.writer.native(), std::try_to_lock);
     if (!lock.owns_lock())
         return;
+    cache.writer.assertHeld(); // by `lock`, until the return
     if (areaDict) {
         const auto kept =
             cache.areaDicts.begin() + static_cast<std::ptrdiff_t>(cache.areaDictCount);

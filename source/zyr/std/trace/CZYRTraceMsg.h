@@ -16,6 +16,7 @@
 #include "ZYRStdExport.h"
 #include "sZYRTraceMsg.h"
 #include "zyr/std/core/CZYRClientBase.h"
+#include "zyr/std/core/ZYRThreadSafety.h"
 #include "zyr/std/values/CZYRDict.h"
 #include "zyr/std/values/CZYRUniString.h"
 
@@ -172,7 +173,7 @@ private:
         LevelCache(const LevelCache&) {}
         /// The assigned object has another configuration: its answers go.
         LevelCache& operator=(const LevelCache&) {
-            std::lock_guard<std::mutex> lock(writer);
+            const detail::LockGuard lock(writer);
             const uint32_t at = sequence.load(std::memory_order_relaxed);
             sequence.store(at + 1, std::memory_order_relaxed);
             std::atomic_thread_fence(std::memory_order_release);
@@ -189,12 +190,12 @@ private:
         /// their addresses cannot be reused by other strings, and every area dictionary whose
         /// change count a slot names, kept for the object's life, as a reader may still read
         /// that count after the slot has moved on.
-        std::mutex writer;
-        std::array<CZYRUniString, kCachedLevels> areas;
-        std::array<CZYRUniString, kCachedLevels> categories;
-        std::array<C_SmartPtr<ZYRPublic::I_Dict>, kKeptAreaDicts> areaDicts;
-        size_t areaDictCount = 0;
-        size_t next = 0;
+        detail::Mutex writer;
+        std::array<CZYRUniString, kCachedLevels> areas ZYR_GUARDED_BY(writer);
+        std::array<CZYRUniString, kCachedLevels> categories ZYR_GUARDED_BY(writer);
+        std::array<C_SmartPtr<ZYRPublic::I_Dict>, kKeptAreaDicts> areaDicts ZYR_GUARDED_BY(writer);
+        size_t areaDictCount ZYR_GUARDED_BY(writer) = 0;
+        size_t next ZYR_GUARDED_BY(writer) = 0;
     };
     bool cachedLevel(const CZYRUniString& area, const CZYRUniString& category,
                      int32_t& level) const;
