@@ -69,7 +69,8 @@ ZYRStd::tZYRMemMgr crtMemMgr();
 /// deletes.
 template <class Interface> class Counted : public Interface {
 public:
-    /// Takes one more reference; any thread.
+    /// Takes one more reference; any thread. Relaxed: a caller already holds a reference,
+    /// so the object cannot go away meanwhile, and nothing is published with the count.
     void addRef() override { count_.fetch_add(1, std::memory_order_relaxed); }
     /// Drops one reference; the last one deletes the object.
     void release() override {

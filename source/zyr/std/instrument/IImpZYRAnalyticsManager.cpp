@@ -102,6 +102,8 @@ private:
 
     boost::thread worker_;
     // Written under lock_; the worker also reads it between records without the lock.
+    // Relaxed: a late reading only lets the worker take one more record, and the queue
+    // itself is read under lock_, which orders everything the record carries.
     std::atomic<bool> terminating_{false};
     detail::condition_impl wakeup_; // the queue got a record, or termination began
     mutex lock_;                    // guards queue_ and dropped_
