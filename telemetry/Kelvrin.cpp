@@ -18,13 +18,17 @@
 
 #include <nlohmann/json.hpp>
 
+// Header-only lock annotations shared with the library; nothing of the library is linked.
+#include "zyr/std/core/ZYRThreadSafety.h"
+
 struct Kelvrin {
-    std::mutex lock; // guards the fields below: any thread may log
-    int fd = -1;     // the session file, or -1 for a session that records nothing
-    std::string path;
-    int writeError = 0; // the first write that failed; reported at close
-    unsigned long long linesLost = 0;
-    int nextGroup = 0;
+    ZYRStd::detail::Mutex lock; // any thread may log
+    // The session file, or -1 for a session that records nothing.
+    int fd ZYR_GUARDED_BY(lock) = -1;
+    std::string path ZYR_GUARDED_BY(lock);
+    int writeError ZYR_GUARDED_BY(lock) = 0; // the first write that failed; reported at close
+    unsigned long long linesLost ZYR_GUARDED_BY(lock) = 0;
+    int nextGroup ZYR_GUARDED_BY(lock) = 0;
 };
 
 namespace {
@@ -35,8 +39,8 @@ using nlohmann::json;
 std::atomic<int> optInSetting{0};
 // Relaxed: only a source of distinct numbers for file names.
 std::atomic<unsigned> sessionsStarted{0};
-std::mutex productLock; // guards productName
-std::string productName = "unknown";
+ZYRStd::detail::Mutex productLock;
+std::string productName ZYR_GUARDED_BY(productLock) = "unknown";
 
 // A null text is recorded as JSON null, so that "" and "not given" stay apart.
 json text(const char* s) {
@@ -60,7 +64,7 @@ json bytes(const unsigned char* data, int size) {
 void write(Kelvrin* session, json object) {
     if (!session)
         return;
-    const std::lock_guard guard(session->lock);
+    const ZYRStd::detail::LockGuard guard(session->lock);
     if (session->fd < 0)
         return;
     object["time"] = nowMs();
@@ -111,7 +115,7 @@ int createSessionFile(const std::filesystem::path& folder, const std::string& pr
 extern "C" {
 
 void UTInitialize(const char* product, bool, const char*) {
-    const std::lock_guard guard(productLock);
+    const ZYRStd::detail::LockGuard guard(productLock);
     productName = product && *product ? product : "unknown";
 }
 
@@ -123,7 +127,7 @@ void UTStartSession(Kelvrin*& handle, const char* kind, const char* product, con
         if (optInSetting.load(std::memory_order_relaxed) != 0) {
             std::string name;
             {
-                const std::lock_guard guard(productLock);
+                const ZYRStd::detail::LockGuard guard(productLock);
                 name = product && *product ? product : productName;
             }
             const std::filesystem::path folder(folderUTF8 && *folderUTF8 ? folderUTF8 : ".");
@@ -131,9 +135,13 @@ void UTStartSession(Kelvrin*& handle, const char* kind, const char* product, con
             std::filesystem::create_directories(folder, ec);
             if (!plainComponent(name))
                 return; // a name that would leave the folder records nothing
-            session->fd = createSessionFile(folder, name, session->path);
-            if (session->fd < 0)
-                return; // a session that cannot record is no session
+            {
+                // Not shared yet; the lock only keeps the analysis exact.
+                const ZYRStd::detail::LockGuard guard(session->lock);
+                session->fd = createSessionFile(folder, name, session->path);
+                if (session->fd < 0)
+                    return; // a session that cannot record is no session
+            }
             write(session.get(), {{"type", "session_start"},
                                   {"kind", text(kind)},
                                   {"product", text(product)},
@@ -174,7 +182,7 @@ void UTNewDataGroup(Kelvrin* handle, const char* name, const char* subname, cons
         return;
     try {
         {
-            const std::lock_guard guard(handle->lock);
+            const ZYRStd::detail::LockGuard guard(handle->lock);
             groupID = handle->nextGroup++;
         }
         write(handle, {{"type", "group"},
@@ -202,13 +210,18 @@ void UTCloseSession(Kelvrin*& handle) {
         write(handle, {{"type", "session_close"}});
     } catch (...) {
     }
-    if (handle->fd >= 0) {
-        // A record that did not reach the disk (a full disk) is reported, not ignored.
-        if (::close(handle->fd) != 0 && handle->writeError == 0)
-            handle->writeError = errno;
-        if (handle->writeError != 0)
-            std::fprintf(stderr, "libKelvrin: %s: %s: %llu records lost\n", handle->path.c_str(),
-                         std::strerror(handle->writeError), handle->linesLost);
+    {
+        // The last user closes; the lock only keeps the analysis exact.
+        const ZYRStd::detail::LockGuard guard(handle->lock);
+        if (handle->fd >= 0) {
+            // A record that did not reach the disk (a full disk) is reported, not ignored.
+            if (::close(handle->fd) != 0 && handle->writeError == 0)
+                handle->writeError = errno;
+            if (handle->writeError != 0)
+                std::fprintf(stderr, "libKelvrin: %s: %s: %llu records lost\n",
+                             handle->path.c_str(), std::strerror(handle->writeError),
+                             handle->linesLost);
+        }
     }
     delete handle;
     handle = nullptr;
