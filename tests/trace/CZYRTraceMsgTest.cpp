@@ -83,7 +83,8 @@ TEST_F(CZYRTraceMsgTest, LogLayout) {
     parts.beginTraceMsg(text("Render"), text("Bands"), level(3), "first", false, "src.cpp", 40);
     parts.traceMsg("second");
     for (const char16_t* wide :
-         {u"\\\\server\\share\\a.pdf", u"C:\\dir\\f\u00e9", u"d:x \u20ac\U0001F600\xD800x\xDC00"})
+         {u"\\\\server\\share\\a.pdf", u"C:\\dir\\f\u00e9", u"d:x \u20ac\U0001F600\xD800x\xDC00",
+          u"Z:z", u"z:", u"[:", u"@:", u"`:", u"{:"}) // the letters' ends and their neighbours
         parts.traceMsg(wide);
     parts.endTraceMsg();
     parts.endTraceMsg();
@@ -91,9 +92,11 @@ TEST_F(CZYRTraceMsgTest, LogLayout) {
     const std::string got = log().substr(before);
     const size_t head = got.find(" sec] [C:Render/Bands] [F:src.cpp/40] \n");
     EXPECT_TRUE(startsWith(got, "<ZYRTrace> Job 12 L3 [") && head != std::string::npos) << got;
-    EXPECT_EQ(got.substr(head + 39),
-              "first\n<<\nsecond\nserver/share/a.pdf\n/C:/dir/f\xc3\xa9\n"
-              "/d:x \xe2\x82\xac\xf0\x9f\x98\x80\xef\xbf\xbdx\xef\xbf\xbd\n>>\n");
+    EXPECT_EQ(
+        got.substr(head + 39),
+        "first\n<<\nsecond\nserver/share/a.pdf\n/C:/dir/f\xc3\xa9\n"
+        "/d:x "
+        "\xe2\x82\xac\xf0\x9f\x98\x80\xef\xbf\xbdx\xef\xbf\xbd\n/Z:z\n/z:\n[:\n@:\n`:\n{:\n>>\n");
 }
 
 TEST_F(CZYRTraceMsgTest, LevelRulesAndMapping) {

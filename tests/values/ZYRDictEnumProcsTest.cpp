@@ -71,10 +71,14 @@ TEST(ZYRDictEnumProcsTest, PrintingTracingAndTheInterfaceRegistry) {
     CZYRDict source, target, nested, shared;
     source.set(CZYRUniString("a"), 1u);
     source.set(CZYRUniString("d"), nested);
+    source.set(CZYRUniString("i"), -2);
+    source.set(CZYRUniString("f"), 0.5);
+    source.set(CZYRUniString("b"), true);
+    source.set(CZYRUniString("s"), CZYRUniString("t"));
     TracingEnumProcs copier(target);
     source.enumerate(&copier);
-    EXPECT_TRUE(target.getSize() == 2 && target.get(CZYRUniString("d"), shared) &&
-                shared.getImpl() == nested.getImpl());
+    EXPECT_EQ(print(target, 2), print(source, 2)) << "every kind of value copied";
+    EXPECT_TRUE(target.get(CZYRUniString("d"), shared) && shared.getImpl() == nested.getImpl());
     CZYRDict self;
     self.set(CZYRUniString("me"), self);
     EXPECT_EQ(print(self, 1000000), "me  [ZYRDict]: \n"
