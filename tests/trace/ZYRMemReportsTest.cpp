@@ -2,6 +2,7 @@
 
 #include <cstdlib>
 #include <cstring>
+#include <sys/mman.h>
 
 #include "EngineFakes.h"
 #include "TestSupport.h"
@@ -104,8 +105,14 @@ TEST(ZYRMemReportsTest, UsageReportLevelsAndLayout) {
 
 TEST(ZYRMemReportsTest, AddressSpaceMap) {
     HostTrace low(3), totals(4), full(5);
+    // An anonymous reservation names no file: it must still count as reserved.
+    constexpr size_t kReservation = 64u << 20;
+    void* reservation = ::mmap(nullptr, kReservation, PROT_NONE,
+                               MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
+    ASSERT_NE(reservation, MAP_FAILED);
     for (HostTrace* t : {&low, &totals, &full})
         DumpVMStatistics(t->trace);
+    ::munmap(reservation, kReservation);
     EXPECT_TRUE(low.host->calls.empty());
     ASSERT_EQ(totals.host->calls.size(), 5u);
     EXPECT_TRUE(totals.host->calls[0] == "begin Memory/Performance L4: Virtual Memory Statistics" &&
@@ -145,6 +152,7 @@ TEST(ZYRMemReportsTest, AddressSpaceMap) {
               5);
     EXPECT_EQ(commit, image + mapped + priv);
     EXPECT_EQ(commit + reserved, committed) << "every region not free is committed or reserved";
+    EXPECT_GE(reserved, kReservation);
     unsigned long long largest = 0, big = 0, middle = 0, small = 0, units = 0;
     ASSERT_EQ(std::sscanf(calls[i + 1].c_str(),
                           "Free block: Largest: %llu #blks >=8MB: %llu >=4MB: %llu <4MB: %llu "
