@@ -79,6 +79,11 @@ TEST(ZYRDictEnumProcsTest, PrintingTracingAndTheInterfaceRegistry) {
     source.enumerate(&copier);
     EXPECT_EQ(print(target, 2), print(source, 2)) << "every kind of value copied";
     EXPECT_TRUE(target.get(CZYRUniString("d"), shared) && shared.getImpl() == nested.getImpl());
+    const CZYRUniString k("k");
+    EXPECT_TRUE(copier.enumProc(k, CZYRDataBuffer()) && copier.enumProc(k, CZYRArray()) &&
+                copier.enumProc(k, nested) && copier.enumProc(k, k) && copier.enumProc(k, true) &&
+                copier.enumProc(k, 0.5) && copier.enumProc(k, 1u) && copier.enumProc(k, -1))
+        << "a copier never stops the walk";
     CZYRDict self;
     self.set(CZYRUniString("me"), self);
     EXPECT_EQ(print(self, 1000000), "me  [ZYRDict]: \n"
