@@ -121,8 +121,11 @@ TEST(ZYRCacheTest, HeadTablesLongChainsRefusalsAndRelocation) {
                 unusable.hcTraverse(nullptr, nullptr) == kHCSuccess);
     EXPECT_THROW(unusable.hcGetEntry(&key, true), CZYRError) << "no table to look in";
     TestCache cache(100, 4, 4);
+    cache.add(36); // the last of 37 chains counts too
+    EXPECT_EQ(cache.hcGetMaxChainLength(), 1);
     for (uint64_t k = 0; k < 40; ++k)
-        cache.add(k);
+        if (k != 36)
+            cache.add(k);
     // Same values change nothing; a new chain length alone is a change.
     for (const auto& [n, l, limit] : {std::tuple{100, 4, 17}, {100, 5, 255}, {200, 5, 255}}) {
         EXPECT_EQ(cache.hcUpdateCacheSize(n, static_cast<unsigned char>(l)), kHCSuccess);

@@ -141,7 +141,7 @@ TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
     cpu = {{}, 1200, 100, 512, 0, 8192, 0, {}, 4000, {}, 4, 8, {}};
     setText(cpu.caption, u"\U0001F600 Family 6");
     setText(cpu.manufacturer, u"GenuineIntel");
-    setText(cpu.name, u"Xeon \u00e9 \U0001F600\U0010FFFF");
+    setText(cpu.name, u"Xeon \u00e9 \U0001F600\U0010FFFF\U00010000");
     *perf = {37, {12, 100}, {}, 12641974272ull, 4214091776ull, 33, {}, 2, 0};
     EXPECT_EQ(printAll(*info, rec.get(), perf.get()),
               L"\tMemory 1\n\t\tCapacity: 8192 MB\n\t\tSpeed: 3200 MHz\n"
@@ -151,7 +151,7 @@ TEST(IHardwareInfoTest, ReportsPrintTheirExactTexts) {
               L"\t\tCurrentClockSpeed: 1200 Mhz\n\t\tExtClock: 100 MHz\n"
               L"\t\tL2CacheSize: 512 KB\n\t\tL3CacheSize: 8192 KB\n"
               L"\t\tManufacturer: GenuineIntel\n\t\tMaxClockSpeed: 4000 MHz\n"
-              L"\t\tName: Xeon \u00e9 \U0001F600\U0010FFFF\n\t\tNumberOfCores: 4\n"
+              L"\t\tName: Xeon \u00e9 \U0001F600\U0010FFFF\U00010000\n\t\tNumberOfCores: 4\n"
               L"\t\tNumberOfLogicalProcessors: 8\n"
               L"\tDisk 1\n\t\tInterfaceType: SCSI\n\t\tModel: Samsung SSD 860\n\t\tSize: 931 GB\n"
               L"\tMemory Performance\n"
