@@ -552,6 +552,13 @@ bool Farlamp::LoggingEnabled() {
 namespace {
 
 // Writes one analytics record; runs on the writer.
+// The session's one group of `name`, opened the first time it is asked for.
+int openedOnce(int& id, const char* name) ZYR_REQUIRES(state.lock) {
+    if (id == -1)
+        state.entry.newDataGroup(state.logHandle, name, "", name, id, nullptr, 0);
+    return id;
+}
+
 void logRecord(I_AnalyticsData* source) ZYR_REQUIRES(state.lock) {
     const auto groupName = readValue<I_UniString*>(source, "DataGroupName");
     if (!groupName || !*groupName || !state.logHandle)
@@ -568,18 +575,12 @@ void logRecord(I_AnalyticsData* source) ZYR_REQUIRES(state.lock) {
             state.entry.newDataGroup(state.logHandle, rule.name, "", rule.name, group, nullptr, 0);
             break;
         case Into::ProductInfoGroup:
-            if (state.ProductInfoGroupID == -1)
-                state.entry.newDataGroup(state.logHandle, "ProductInfo", "", "ProductInfo",
-                                         state.ProductInfoGroupID, nullptr, 0);
-            group = state.ProductInfoGroupID;
+            group = openedOnce(state.ProductInfoGroupID, "ProductInfo");
             if (const auto mode = readValue<unsigned int>(source, "xobjMode"))
                 state.xobjmode = static_cast<int>(*mode);
             break;
         case Into::JobInfoGroup:
-            if (state.JobInfoGroupID == -1)
-                state.entry.newDataGroup(state.logHandle, "JobInfo", "", "JobInfo",
-                                         state.JobInfoGroupID, nullptr, 0);
-            group = state.JobInfoGroupID;
+            group = openedOnce(state.JobInfoGroupID, "JobInfo");
             if (const auto start = readValue<double>(source, "StartTime"))
                 state.jobStartTime = *start;
             break;
